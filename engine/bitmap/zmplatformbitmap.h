@@ -1,0 +1,41 @@
+#pragma once
+
+#include <cstdint>
+#include <vector>
+
+#include "engine/foundation/zmdefs.h"
+
+namespace zm {
+
+/// Pixel layouts that a platform bitmap can hold.
+enum TBitmapPixelFormat : std::uint8_t { pfNone, pf1bit, pf8bit, pf24bit, pf32bit };
+
+/// The platform bitmap behind the place `zmTBitmap`: an object with a size, one of four layouts,
+/// row pointers and a colour table. This one lives in plain memory, rows bottom-up and aligned to
+/// 32 bits like a device-independent bitmap.
+class TBitmap {
+public:
+    /// Changes layout and size; pixels become 0. False without room, and the size is then 0.
+    [[nodiscard]] bool SetSize(std::int32_t width, std::int32_t height,
+                               TBitmapPixelFormat format);
+    std::int32_t GetWidth() const { return width_; }
+    std::int32_t GetHeight() const { return height_; }
+    TBitmapPixelFormat GetPixelFormat() const { return format_; }
+    /// Address of a row, top row 0; stable until SetSize.
+    std::uint8_t* GetScanLine(std::int32_t row);
+    /// 256 entries; used by pf8bit (and the first two by pf1bit).
+    std::vector<TRGB>& ColorTable() { return color_table_; }
+    bool GetModified() const { return modified_; }
+    void SetModified(bool modified) { modified_ = modified; }
+
+private:
+    std::int32_t width_ = 0;
+    std::int32_t height_ = 0;
+    std::int64_t row_len_ = 0;
+    TBitmapPixelFormat format_ = pfNone;
+    bool modified_ = false;
+    std::vector<std::uint8_t> pixels_;
+    std::vector<TRGB> color_table_ = std::vector<TRGB>(256);
+};
+
+}  // namespace zm

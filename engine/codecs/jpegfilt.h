@@ -1,0 +1,38 @@
+#pragma once
+
+#include <cstdint>
+#include <stdexcept>
+
+#include "engine/io/zmprogress.h"
+
+namespace zm {
+
+class TIOParams;
+class TStream;
+class TZmBitmap;
+
+/// A fatal error of the JPEG library, with the library's text of the message number.
+class EZmJpegException : public std::runtime_error {
+public:
+    using std::runtime_error::runtime_error;
+};
+
+struct TJpegReadOptions {
+    std::int64_t byte_limit = -1;     ///< bytes that belong to the image; -1 for no limit
+    bool native_format = false;       ///< keep grey and CMYK pixels as they are
+    bool params_only = false;         ///< fill the parameters and leave the bitmap alone
+    bool read_metadata = true;        ///< parse EXIF, IPTC, XMP and profile markers
+};
+
+/// Reads a JPEG; up to 149 bytes of junk before it are skipped. Bad data, also data that end
+/// before the last row: `*progress.Aborting` true; nothing is raised.
+void ReadJPEGStream(TStream& stream, TZmBitmap& bitmap, const TJpegReadOptions& options,
+                    TProgressRec& progress, TIOParams& params);
+
+/// Writes `bitmap` as `params` tells. An empty bitmap is not written. A failing write sets
+/// `*progress.Aborting`; errors of the library raise EZmJpegException. The bitmap is left as it
+/// was.
+void WriteJPEGStream(TStream& stream, TZmBitmap& bitmap, TIOParams& params,
+                     TProgressRec& progress);
+
+}  // namespace zm

@@ -1,0 +1,107 @@
+#pragma once
+
+#include <array>
+#include <cstdint>
+#include <vector>
+
+#include "engine/foundation/zmdefs.h"
+
+/// The two palette methods behind TZmQuantizer.
+namespace zm {
+
+class TZmBitmap;
+
+/// How many pixels stand for one in the training of the network: 1 (all) to 30. `quality` is 0
+/// to 100, or -1 for a value that follows the number of pixels.
+std::int32_t NeuralSamplingFactor(std::int32_t quality, std::int64_t pixel_count);
+
+/// Distance in pixels between samples, prime to 3 * pixel_count.
+std::int32_t NeuralStep(std::int64_t pixel_count);
+
+/// A one-dimensional self-organising map trained with samples of the image, in integer
+/// arithmetic: channels have 4 fractional bits, the learning rate 10, radius 6.
+class TNeuralPalette {
+public:
+    /// Trains the network at once. `color_count` is 2 to 1024; the image is not empty.
+    TNeuralPalette(TZmBitmap& source, std::int32_t color_count, std::int32_t quality);
+    /// Entry i is neuron i.
+    void WritePalette(std::vector<TRGB>& color_map) const;
+    /// Neuron nearest to a colour by the sum of absolute differences.
+    std::int32_t FindIndex(TRGB color) const;
+
+private:
+    struct TEntry {
+        std::int32_t b = 0;
+        std::int32_t g = 0;
+        std::int32_t r = 0;
+        std::int32_t index = 0;
+    };
+
+    void Train(TZmBitmap& source, std::int32_t sampling_factor);
+    std::int32_t Contest(std::int32_t b, std::int32_t g, std::int32_t r);
+    void MoveWinner(std::int32_t neuron, const TEntry& sample);
+    void MoveNeighbours(std::int32_t neuron, const TEntry& sample);
+    void MoveNeighbour(std::int32_t neuron, std::int32_t power, const TEntry& sample);
+    void RebuildRadiusPower();
+    void Finish();
+    void BuildGreenIndex();
+
+    std::int32_t count_;
+    // One array per channel lets the contest run over whole vectors of neurons.
+    std::vector<std::int32_t> blue_;
+    std::vector<std::int32_t> green_;
+    std::vector<std::int32_t> red_;
+    std::vector<std::int32_t> freq_;
+    std::vector<std::int32_t> bias_;
+    std::vector<std::int32_t> radius_power_;
+    std::int32_t alpha_ = 0;
+    std::int32_t radius_ = 0;  // in neurons; 0 moves the winner only
+    std::vector<TEntry> sorted_;  // by green
+    std::array<std::int32_t, 256> green_index_{};
+};
+
+/// Splits the colour cube, at 5 bits a channel, into boxes of small variance.
+class TBoxPalette {
+public:
+    /// Counts and splits at once. `color_count` is 2 to 1024; the image is not empty.
+    TBoxPalette(TZmBitmap& source, std::int32_t color_count);
+    std::int32_t GetBoxCount() const { return static_cast<std::int32_t>(boxes_.size()); }
+    /// Entry i is the mean colour of box i; entries behind the last box are left alone.
+    void WritePalette(std::vector<TRGB>& color_map) const;
+    /// Box that the colour lies in.
+    std::int32_t FindIndex(TRGB color) const;
+
+private:
+    static constexpr std::int32_t kLevels = 32;
+
+    struct TBox {
+        std::array<std::int32_t, 3> low{};                          // inclusive
+        std::array<std::int32_t, 3> high{kLevels, kLevels, kLevels};  // exclusive
+        std::int64_t count = 0;
+        std::array<double, 3> mean{};
+        std::array<std::array<std::int64_t, kLevels>, 3> bins{};
+        double variance = 0;
+    };
+    struct TSplit {
+        TBox lower;
+        TBox upper;
+        double variance_sum = 0;
+    };
+
+    void CountPixels(TZmBitmap& source);
+    TBox MakeWholeBox() const;
+    void AddCells(TBox& box) const;
+    void UpdateStatistics(TBox& box) const;
+    static std::int32_t FindCut(const TBox& box, std::size_t channel);
+    TSplit TrySplit(const TBox& box, std::size_t channel) const;
+    bool SplitBox(std::size_t index);
+    void SplitBoxes(std::int32_t color_count);
+    void FillTable();
+
+    std::int64_t pixel_count_ = 0;
+    std::vector<std::int64_t> histogram_;  // freed when the table is filled
+    std::vector<TBox> boxes_;
+    std::vector<std::uint16_t> table_;  // cell to box
+};
+
+}  // namespace zm

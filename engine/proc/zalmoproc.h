@@ -1,0 +1,194 @@
+#pragma once
+
+#include <cstdint>
+#include <functional>
+#include <memory>
+#include <string>
+#include <vector>
+
+#include "engine/bitmap/zmxBitmaps.h"
+#include "engine/foundation/zmdefs.h"
+#include "engine/proc/zmoperations.h"
+
+namespace zm {
+
+/// What an undo item holds.
+enum TZmUndoSource : std::uint8_t {
+    zmuUnknown,
+    zmuImage,
+    zmuSelection,
+    zmuObject,
+    zmuLayer,
+    zmuFullLayer,
+    zmuObjectsAndLayers,
+};
+
+/// What is known of a saved state.
+struct TZmUndoStoreInfo {
+    std::u16string Caption;
+    TZmUndoSource Source = zmuUnknown;
+    std::int32_t Operation = kOperationNone;
+    std::int32_t MViewIndex = -1;
+    std::int32_t LayerIndex = -1;
+};
+
+/// Saved images with what is known of each, oldest first; owns them. Indexes count from 0, the
+/// oldest, and have to be inside the list unless said otherwise.
+class TZmUndoStore {
+public:
+    /// Appends an item with an empty caption and no layer.
+    void Add(std::unique_ptr<TZmBitmap> object, TZmUndoSource source, std::int32_t operation,
+             std::int32_t mview_index);
+    /// Removes an item; with `free_undo_image` false the image is returned instead of freed.
+    std::unique_ptr<TZmBitmap> ClearAt(std::int32_t index, bool free_undo_image);
+    void ClearAll();
+    std::int32_t Count() const { return static_cast<std::int32_t>(fObjectList.size()); }
+    /// Nil outside the list.
+    TZmBitmap* GetObject(std::int32_t index) const;
+    TZmUndoStoreInfo& GetInfo(std::int32_t index);
+
+private:
+    std::vector<std::unique_ptr<TZmBitmap>> fObjectList;
+    std::vector<TZmUndoStoreInfo> fInfoList;
+};
+
+/// The driver of all image processing, attached to one bitmap. It makes the bitmap ready,
+/// records an undo state, hands the region to a pixel routine and tells that the image changed.
+/// Operations do not report: an empty bitmap or an unfitting format ends the call silently.
+/// Works on the caller's thread; kernel filters report progress from a worker thread.
+///
+/// A bitmap is the only source of undo states here: sources other than zmuImage belong to viewers
+/// and save nothing.
+class TZalmoProc {
+public:
+    /// `has_owner`: components with an owner save undo states by default.
+    explicit TZalmoProc(bool has_owner);
+    /// Attached to a bitmap that the caller keeps, without undo.
+    explicit TZalmoProc(TZmBitmap* bitmap);
+    /// The same over a platform bitmap, which takes every change and has no alpha.
+    explicit TZalmoProc(TBitmap* bitmap);
+    ~TZalmoProc();
+    TZalmoProc(const TZalmoProc&) = delete;
+    TZalmoProc& operator=(const TZalmoProc&) = delete;
+
+    /// The bitmap worked on; never nil unless nil was attached.
+    TZmBitmap* GetAttachedZmBitmap() const { return fZmBitmap; }
+    /// Attaches a bitmap that the caller keeps; the processor's own one is freed. Nil detaches.
+    void SetAttachedZmBitmap(TZmBitmap* bitmap);
+    /// Tells that the bitmap changed. A platform bitmap loses its alpha, against white, and is
+    /// marked as modified.
+    void Update();
+
+    bool GetAutoUndo() const { return fAutoUndo; }
+    void SetAutoUndo(bool auto_undo) { fAutoUndo = auto_undo; }
+    bool GetAutoConvertFormat() const { return fAutoConvertFormat; }
+    /// With False a format that an operation does not take ends it, instead of a conversion.
+    void SetAutoConvertFormat(bool auto_convert) { fAutoConvertFormat = auto_convert; }
+    void SetOnProgress(TZmBitmapProgressEvent event) { fOnProgress = std::move(event); }
+    void SetOnFinishWork(TZmNotifyEvent event) { fOnFinishWork = std::move(event); }
+
+    // Selection of a bitmap without a view, by rectangle (right and bottom exclusive).
+    void Select(const TRect& rect);
+    void Deselect() { fSelected = false; }
+    /// Region to work on, x2 and y2 exclusive: the whole bitmap, and False, without a selection
+    /// or with an empty one. A selection beside the bitmap gives an empty region, and True.
+    bool GetReSel(std::int32_t& x1, std::int32_t& y1, std::int32_t& x2, std::int32_t& y2);
+
+    // Frame of an operation.
+    /// True when the operation may run; x2, y2 are exclusive limits. Saves undo first when that
+    /// is on. A missing bitmap raises EZmException.
+    bool BeginImageProcessing(const TZmPixelFormatSet& allowed, std::int32_t& x1,
+                              std::int32_t& y1, std::int32_t& x2, std::int32_t& y2,
+                              const std::u16string& op_name, TZmBitmap*& proc_bitmap,
+                              std::int32_t operation);
+    void EndImageProcessing(TZmBitmap* proc_bitmap);
+    /// For operations that only read: no undo is saved and nothing goes back.
+    bool BeginImageAnalysis(const TZmPixelFormatSet& allowed, std::int32_t& x1, std::int32_t& y1,
+                            std::int32_t& x2, std::int32_t& y2, TZmBitmap*& proc_bitmap);
+    void EndImageAnalysis(TZmBitmap* proc_bitmap);
+
+    // Undo. Positions count back from the latest item (0); one outside does nothing.
+    /// States kept per list, 1 at first; 0 keeps none.
+    std::int32_t GetUndoLimit() const { return fUndoLimit; }
+    void SetUndoLimit(std::int32_t limit) { fUndoLimit = limit; }
+    TZmLocation GetUndoLocation() const { return fUndoLocation; }
+    /// Where states are kept: zmMemory, or a temporary file each (zmFile, at first).
+    void SetUndoLocation(TZmLocation location) { fUndoLocation = location; }
+    /// Saves a copy of the bitmap, dropping the oldest states beyond the limit. An image of one
+    /// row or one column is not saved.
+    void SaveUndo(TZmUndoSource source, bool clear_redo);
+    void SaveUndo(const std::u16string& caption, TZmUndoSource source, bool clear_redo,
+                  std::int32_t operation);
+    void SaveUndoCaptioned(const std::u16string& caption, TZmUndoSource source);
+    void Undo(bool auto_redo) { UndoAt(0, auto_redo); }
+    /// Brings a saved state back. With `auto_redo` the present state and all states newer than
+    /// the wanted one go to the redo list, and the wanted item leaves this list, so that repeated
+    /// calls walk back in time. Otherwise the lists stay as they are, until ClearUndo.
+    void UndoAt(std::int32_t position, bool auto_redo);
+    /// Restores an inclusive rectangle from the newest item.
+    void UndoRect(std::int32_t x1, std::int32_t y1, std::int32_t x2, std::int32_t y2);
+    void ClearUndo();
+    void ClearUndoAt(std::int32_t position);
+    void ClearAllUndo() { fUndoList.ClearAll(); }
+    std::int32_t GetUndoCount() const { return fUndoList.Count(); }
+    /// Item by position from the latest; nil outside.
+    const TZmUndoStoreInfo* GetUndoInfo(std::int32_t position);
+    // The same for the redo list.
+    void SaveRedo(const std::u16string& caption, TZmUndoSource source, std::int32_t operation);
+    void Redo(bool auto_undo) { RedoAt(0, auto_undo); }
+    void RedoAt(std::int32_t position, bool auto_undo);
+    void ClearRedo();
+    void ClearRedoAt(std::int32_t position);
+    void ClearAllRedo() { fRedoList.ClearAll(); }
+    std::int32_t GetRedoCount() const { return fRedoList.Count(); }
+    const TZmUndoStoreInfo* GetRedoInfo(std::int32_t position);
+    void SetOnSaveUndo(std::function<void(void* sender, TZmUndoSource source)> event) {
+        fOnSaveUndo = std::move(event);
+    }
+    /// Fires after a state was brought back.
+    void SetOnUndoRedoEvent(TZmNotifyEvent event) { fOnUndoRedoEvent = std::move(event); }
+
+    // Size; the sizing rule is CalcResampleSize. Selections are ignored.
+    /// Resizes the attached bitmap in place: the image and its alpha plane, not its file
+    /// parameters, events and place settings. Exactly the present size, two negative sizes or a
+    /// size without room: nothing happens.
+    void Resample(std::int32_t new_width, std::int32_t new_height, TResampleFilter filter,
+                  bool maintain_aspect_ratio);
+    /// Both sides times `scale_by`, rounded; a factor that is not above 0 does nothing.
+    void Resample(double scale_by, TResampleFilter filter);
+    /// Writes the resized image to `target` and leaves the attached bitmap as it is. A size
+    /// without room leaves `target` empty.
+    void ResampleTo(TZmBitmap* target, std::int32_t new_width, std::int32_t new_height,
+                    TResampleFilter filter, bool maintain_aspect_ratio);
+
+private:
+    bool MakeConsistent(const TZmPixelFormatSet& allowed, bool check_view);
+    void RequireBitmap() const;
+    std::unique_ptr<TZmBitmap> CopyState(TZmUndoSource source);
+    void StoreItem(TZmUndoStore& store, std::unique_ptr<TZmBitmap> item,
+                   const TZmUndoStoreInfo& info);
+    void AddUndoItem(TZmUndoStore& store, const std::u16string& caption, TZmUndoSource source,
+                     std::int32_t operation);
+    void MoveState(TZmUndoStore& from, TZmUndoStore& to, std::int32_t position, bool record);
+    void RecordStates(TZmUndoStore& from, TZmUndoStore& to, std::int32_t index);
+
+    bool fAutoUndo = false;
+    TColor fBackground = 0;
+    TZmBitmap* fZmBitmap = nullptr;
+    std::unique_ptr<TZmBitmap> fOwnedBitmap;
+    bool fAutoConvertFormat = true;
+    bool fSelected = false;
+    TRect fSelectedRect;
+    TZmUndoStore fUndoList;
+    TZmUndoStore fRedoList;
+    TZmLocation fUndoLocation = zmFile;
+    std::int32_t fUndoLimit = 1;
+    std::function<void(void*, TZmUndoSource)> fOnSaveUndo;
+    TBitmap* fBitmap = nullptr;
+    TZmBitmapProgressEvent fOnProgress;
+    TZmNotifyEvent fOnFinishWork;
+    std::int32_t fMViewIndex = -1;
+    TZmNotifyEvent fOnUndoRedoEvent;
+};
+
+}  // namespace zm

@@ -1,0 +1,35 @@
+// The one table of operation captions.
+
+#include "engine/proc/zmoperations.h"
+
+#include <array>
+
+namespace zm {
+namespace {
+
+struct TOperationRow {
+    std::int32_t operation;
+    const char16_t* caption;
+};
+
+constexpr std::array<TOperationRow, 6> kOperations{{
+    {kOperationFlipHorizontal, u"Flip Horizontal"},
+    {kOperationFlipVertical, u"Flip Vertical"},
+    {kOperationNegative, u"Negative"},
+    {kOperationResample, u"Resize Image"},
+    {kOperationRotate, u"Rotate"},
+    {kOperationText, u"Insert Text"},
+}};
+
+}  // namespace
+
+std::u16string OperationCaption(std::int32_t operation) {
+    for (const TOperationRow& row : kOperations) {
+        if (row.operation == operation) {
+            return row.caption;
+        }
+    }
+    return {};
+}
+
+}  // namespace zm

@@ -1,0 +1,252 @@
+// Fast linear engine: integer samples, filtered first horizontally, then vertically. Shrinking
+// takes plain means; enlarging interpolates between two samples.
+//
+// Columns and rows are aligned differently: a column's left neighbour is rounded, a row's upper
+// neighbour truncated.
+// Required: the fraction of a column that rounds up is negative and extrapolates, so that an
+// enlarged ramp is not monotone; existing jobs depend on it.
+//
+// The horizontally filtered rows are needed in rising order, two at a time: they are made on
+// demand instead of as a whole plane.
+
+#include <algorithm>
+#include <array>
+#include <cstring>
+#include <vector>
+
+#include "engine/proc/zmresample_p.h"
+
+namespace zm {
+namespace {
+
+/// Where one target column comes from.
+struct TColumnSpan {
+    std::int32_t left = 0;
+    std::int32_t right = 0;  ///< shrinking: the last column of the mean
+    double frac = 0;         ///< enlarging: distance from `left`, -0.5 to 0.5
+};
+
+/// The part of the target to compute, inclusive.
+TRect LimitRect(const TRect* rect, std::int32_t width, std::int32_t height) {
+    if (rect == nullptr || (rect->right == -1 && rect->bottom == -1)) {
+        return TRect{0, 0, width - 1, height - 1};
+    }
+    return TRect{std::clamp(rect->left, 0, width - 1), std::clamp(rect->top, 0, height - 1),
+                 std::clamp(rect->right, 0, width - 1), std::clamp(rect->bottom, 0, height - 1)};
+}
+
+TColumnSpan MakeSpan(std::int32_t x, double scale, std::int32_t source_width,
+                     std::int32_t target_width) {
+    const double position = x / scale;
+    const std::int32_t next = std::min(x == kMaxInt32 ? x : x + 1, target_width - 1);
+    TColumnSpan span;
+    span.left = std::min(RoundHalfEven(position), source_width - 1);
+    span.frac = position - span.left;
+    span.right = std::clamp(RoundHalfEven(next / scale + 1e-10), span.left, source_width - 1);
+    return span;
+}
+
+template <typename Sample, std::size_t kChannels>
+class TFastLinear {
+public:
+    TFastLinear(TZmBitmap& source, TZmBitmap& target, const TRect* rect,
+                const TResampleListener& listener);
+    void Run();
+
+private:
+    /// A horizontally filtered source row.
+    struct TFilteredRow {
+        std::int32_t index = -1;
+        std::vector<std::int32_t> samples;
+    };
+
+    const std::vector<std::int32_t>& FilteredRow(std::int32_t index);
+    void ShrinkRow(const Sample* in, std::int32_t* out) const;
+    void EnlargeRow(const Sample* in, std::int32_t* out) const;
+    void MeanRow(std::int32_t y);
+    void BlendRow(std::int32_t y);
+    void WriteRow(std::int32_t y);
+
+    TZmBitmap& source_;
+    TZmBitmap& target_;
+    std::int32_t source_height_;
+    std::int32_t source_width_;
+    std::int32_t target_height_;
+    TRect rect_;
+    double scale_x_;
+    double scale_y_;
+    std::vector<TColumnSpan> spans_;
+    std::array<TFilteredRow, 2> rows_;
+    std::vector<std::int64_t> sums_;
+    std::vector<Sample> output_;
+    TPercentReporter reporter_;
+    std::int64_t units_done_ = 0;
+};
+
+template <typename Sample, std::size_t kChannels>
+TFastLinear<Sample, kChannels>::TFastLinear(TZmBitmap& source, TZmBitmap& target,
+                                            const TRect* rect, const TResampleListener& listener)
+    : source_(source),
+      target_(target),
+      source_height_(source.GetHeight()),
+      source_width_(source.GetWidth()),
+      target_height_(target.GetHeight()),
+      rect_(LimitRect(rect, target.GetWidth(), target.GetHeight())),
+      scale_x_(static_cast<double>(target.GetWidth()) / source.GetWidth()),
+      scale_y_(static_cast<double>(target.GetHeight()) / source.GetHeight()),
+      reporter_(listener,
+                100 / (static_cast<double>(source.GetHeight()) + target.GetHeight() + 0.5)) {
+    const std::int64_t columns = std::max<std::int64_t>(
+        static_cast<std::int64_t>(rect_.right) - rect_.left + 1, 0);
+    const auto samples = columns * static_cast<std::int64_t>(kChannels);
+    spans_ = MakeWorkBuffer<TColumnSpan>(columns);
+    for (std::size_t i = 0; i < spans_.size(); ++i) {
+        spans_[i] = MakeSpan(rect_.left + static_cast<std::int32_t>(i), scale_x_, source_width_,
+                             target.GetWidth());
+    }
+    for (TFilteredRow& row : rows_) {
+        row.samples = MakeWorkBuffer<std::int32_t>(samples);
+    }
+    sums_ = MakeWorkBuffer<std::int64_t>(scale_y_ > 1 ? 0 : samples);
+    output_ = MakeWorkBuffer<Sample>(samples);
+}
+
+/// Each channel becomes the truncating mean of its span.
+template <typename Sample, std::size_t kChannels>
+void TFastLinear<Sample, kChannels>::ShrinkRow(const Sample* in, std::int32_t* out) const {
+    for (const TColumnSpan& span : spans_) {
+        std::array<std::int64_t, kChannels> sums{};
+        const Sample* pixel = in + static_cast<std::size_t>(span.left) * kChannels;
+        for (std::int32_t column = span.left; column <= span.right; ++column) {
+            for (std::size_t c = 0; c < kChannels; ++c) {
+                sums[c] += *pixel++;
+            }
+        }
+        const std::int64_t count = static_cast<std::int64_t>(span.right) - span.left + 1;
+        for (const std::int64_t sum : sums) {
+            *out++ = static_cast<std::int32_t>(sum / count);
+        }
+    }
+}
+
+template <typename Sample, std::size_t kChannels>
+void TFastLinear<Sample, kChannels>::EnlargeRow(const Sample* in, std::int32_t* out) const {
+    for (const TColumnSpan& span : spans_) {
+        const std::int32_t next = std::min(span.left + 1, source_width_ - 1);
+        const Sample* a = in + static_cast<std::size_t>(span.left) * kChannels;
+        const Sample* b = in + static_cast<std::size_t>(next) * kChannels;
+        for (std::size_t c = 0; c < kChannels; ++c) {
+            *out++ = RoundHalfEven(a[c] + (b[c] - a[c]) * span.frac);
+        }
+    }
+}
+
+template <typename Sample, std::size_t kChannels>
+const std::vector<std::int32_t>& TFastLinear<Sample, kChannels>::FilteredRow(std::int32_t index) {
+    for (const TFilteredRow& row : rows_) {
+        if (row.index == index) {
+            return row.samples;
+        }
+    }
+    TFilteredRow& row = rows_[0].index < rows_[1].index ? rows_[0] : rows_[1];
+    row.index = index;
+    const auto* in = reinterpret_cast<const Sample*>(source_.GetScanLine(index));
+    if (in != nullptr) {
+        if (scale_x_ > 1) {
+            EnlargeRow(in, row.samples.data());
+        } else {
+            ShrinkRow(in, row.samples.data());
+        }
+    }
+    reporter_.Report(++units_done_);
+    return row.samples;
+}
+
+/// Vertical shrinking: truncating means over filtered rows.
+template <typename Sample, std::size_t kChannels>
+void TFastLinear<Sample, kChannels>::MeanRow(std::int32_t y) {
+    const double next = std::min<double>(static_cast<double>(y) + 1, target_height_ - 1);
+    const std::int32_t top = std::min(RoundHalfEven(y / scale_y_), source_height_ - 1);
+    const std::int32_t bottom =
+        std::clamp(RoundHalfEven(next / scale_y_), top, source_height_ - 1);
+    std::fill(sums_.begin(), sums_.end(), 0);
+    for (std::int32_t row = top; row <= bottom; ++row) {
+        const std::vector<std::int32_t>& samples = FilteredRow(row);
+        for (std::size_t i = 0; i < sums_.size(); ++i) {
+            sums_[i] += samples[i];
+        }
+    }
+    const std::int64_t count = static_cast<std::int64_t>(bottom) - top + 1;
+    for (std::size_t i = 0; i < sums_.size(); ++i) {
+        output_[i] = ClampSample<Sample>(static_cast<std::int32_t>(sums_[i] / count));
+    }
+}
+
+/// Vertical enlarging: a blend of two filtered rows.
+template <typename Sample, std::size_t kChannels>
+void TFastLinear<Sample, kChannels>::BlendRow(std::int32_t y) {
+    const double position = y / scale_y_;
+    const std::int32_t top = std::min(TruncToInt(position), source_height_ - 1);
+    const double f = position - top;
+    const std::vector<std::int32_t>& a = FilteredRow(top);
+    const std::vector<std::int32_t>& b = FilteredRow(std::min(top + 1, source_height_ - 1));
+    for (std::size_t i = 0; i < output_.size(); ++i) {
+        output_[i] = ClampSample<Sample>(RoundHalfEven(a[i] + (b[i] - a[i]) * f));
+    }
+}
+
+template <typename Sample, std::size_t kChannels>
+void TFastLinear<Sample, kChannels>::WriteRow(std::int32_t y) {
+    if (std::uint8_t* row = target_.GetScanLine(y); row != nullptr) {
+        const std::size_t pixel_bytes = kChannels * sizeof(Sample);
+        std::memcpy(row + static_cast<std::size_t>(rect_.left) * pixel_bytes, output_.data(),
+                    output_.size() * sizeof(Sample));
+    }
+    reporter_.Report(++units_done_);
+}
+
+template <typename Sample, std::size_t kChannels>
+void TFastLinear<Sample, kChannels>::Run() {
+    for (std::int32_t y = rect_.top; y <= rect_.bottom; ++y) {
+        if (scale_y_ > 1) {
+            BlendRow(y);
+        } else {
+            MeanRow(y);
+        }
+        WriteRow(y);
+    }
+    // Rows that nothing asked for count as done.
+    const std::int64_t all_units = static_cast<std::int64_t>(source_height_) + target_height_;
+    while (units_done_ < all_units) {
+        reporter_.Report(++units_done_);
+    }
+}
+
+}  // namespace
+
+bool ResampleFastLinear(TZmBitmap& source, TZmBitmap& target, const TRect* inclusive_rect,
+                        const TResampleListener& listener) {
+    if (source.IsEmpty() || target.IsEmpty()) {
+        return false;
+    }
+    const TZmPixelFormat format = source.GetPixelFormat();
+    if (format == zm1g) {
+        return ResampleBitsFastLinear(source, target);
+    }
+    if ((format != zm24RGB && format != zm8g && format != zm16g) ||
+        !FitTargetFormat(target, format)) {
+        return false;
+    }
+    if (source.GetWidth() == target.GetWidth() && source.GetHeight() == target.GetHeight()) {
+        target.AssignEx(&source, /*with_params=*/false);
+    } else if (format == zm24RGB) {
+        TFastLinear<std::uint8_t, 3>(source, target, inclusive_rect, listener).Run();
+    } else if (format == zm16g) {
+        TFastLinear<std::uint16_t, 1>(source, target, inclusive_rect, listener).Run();
+    } else {
+        TFastLinear<std::uint8_t, 1>(source, target, inclusive_rect, listener).Run();
+    }
+    return true;
+}
+
+}  // namespace zm

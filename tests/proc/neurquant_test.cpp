@@ -1,0 +1,341 @@
+// Palettes worked out by hand, and the rules by which a palette's kind is chosen.
+
+#include <gtest/gtest.h>
+
+#include <cstdlib>
+#include <limits>
+#include <vector>
+
+#include "engine/bitmap/zmquantizer.h"
+#include "engine/bitmap/zmxBitmaps.h"
+#include "engine/foundation/zmsettings.h"
+#include "engine/proc/neurquant_p.h"
+#include "tests/support/testimages.h"
+
+namespace zm {
+namespace {
+
+// Sets the method and quality for one test.
+class TReductionSettings {
+public:
+    TReductionSettings(std::int32_t algorithm, std::int32_t quality) {
+        ZmGlobalSettings().fColorReductionAlgorithm = algorithm;
+        ZmGlobalSettings().fColorReductionQuality = quality;
+    }
+    ~TReductionSettings() {
+        ZmGlobalSettings().fColorReductionAlgorithm = -1;
+        ZmGlobalSettings().fColorReductionQuality = -1;
+    }
+};
+
+constexpr std::int32_t kNeural = 0;
+constexpr std::int32_t kBoxes = 1;
+
+TRGB Color(std::uint8_t red, std::uint8_t green, std::uint8_t blue) {
+    return TRGB{blue, green, red};
+}
+
+// One row of colours.
+void MakeRow(TZmBitmap& bitmap, const std::vector<TRGB>& colors,
+             TZmPixelFormat format = zm24RGB) {
+    ASSERT_TRUE(bitmap.Allocate(static_cast<std::int32_t>(colors.size()), 1, format));
+    for (std::size_t x = 0; x < colors.size(); ++x) {
+        bitmap.SetPixels(static_cast<std::int32_t>(x), 0, colors[x]);
+    }
+}
+
+std::int32_t Distance(TRGB a, TRGB b) {
+    return std::abs(a.r - b.r) + std::abs(a.g - b.g) + std::abs(a.b - b.b);
+}
+
+TEST(Quantizer, KeepsFewColoursExactly) {
+    TZmBitmap bitmap;
+    MakeRow(bitmap, {Color(9, 1, 1), Color(5, 6, 7), Color(9, 1, 1), Color(200, 0, 3)});
+    std::vector<TRGB> map;
+    TZmQuantizer quantizer(bitmap, map, 16);
+    ASSERT_EQ(map.size(), 16u);
+    EXPECT_EQ(quantizer.GetFoundColors(), 3);
+    EXPECT_FALSE(quantizer.GetGrayScale());
+    EXPECT_EQ(map[0], Color(9, 1, 1));
+    EXPECT_EQ(map[1], Color(5, 6, 7));
+    EXPECT_EQ(map[2], Color(200, 0, 3));
+    EXPECT_EQ(map[3], TRGB{});
+    EXPECT_EQ(quantizer.GetRGBIndex(Color(5, 6, 7)), 1);
+    EXPECT_EQ(quantizer.GetRGBIndex(Color(200, 0, 3)), 2);
+    EXPECT_EQ(quantizer.GetRGBIndex(Color(199, 0, 0)), 2);  // none such: the nearest
+}
+
+// As many colours as entries are exact, one more is not.
+TEST(Quantizer, CountsColoursUpToTheLimit) {
+    TZmBitmap bitmap;
+    ASSERT_TRUE(bitmap.Allocate(32, 32, zm24RGB));
+    for (std::int32_t i = 0; i < 1024; ++i) {
+        bitmap.SetPixels_zm24RGB(i % 32, i / 32,
+                                 TRGB{static_cast<std::uint8_t>(i),
+                                      static_cast<std::uint8_t>(i / 256), 99});
+    }
+    std::vector<TRGB> map;
+    TZmQuantizer exact(bitmap, map, 1024);
+    EXPECT_EQ(exact.GetFoundColors(), 1024);
+    for (std::int32_t i = 0; i < 1024; ++i) {
+        const TRGB color = bitmap.GetPixels_zm24RGB(i % 32, i / 32);
+        EXPECT_EQ(exact.GetRGBIndex(color), i);
+        EXPECT_EQ(map[static_cast<std::size_t>(i)], color);
+    }
+    const TReductionSettings settings(kBoxes, -1);
+    TZmQuantizer split(bitmap, map, 1023);
+    EXPECT_LT(split.GetFoundColors(), 1023);  // only 128 cells of the cube are in use
+}
+
+TEST(Quantizer, GreyImagesGetAnEvenRamp) {
+    TZmBitmap gray;
+    ASSERT_TRUE(gray.Allocate(2, 2, zm8g));
+    std::vector<TRGB> map;
+    TZmQuantizer three(gray, map, 3);
+    EXPECT_TRUE(three.GetGrayScale());
+    EXPECT_EQ(map, (std::vector<TRGB>{Color(0, 0, 0), Color(85, 85, 85), Color(170, 170, 170)}));
+    EXPECT_EQ(three.GetRGBIndex(Color(85, 0, 0)), 0);
+    EXPECT_EQ(three.GetRGBIndex(Color(86, 0, 0)), 1);
+    EXPECT_EQ(three.GetRGBIndex(Color(255, 0, 0)), 2);
+    TZmQuantizer all(gray, map, 256);
+    TZmQuantizer many(gray, map, 1024);
+    EXPECT_EQ(all.GetRGBIndex(Color(77, 77, 77)), 77);
+    EXPECT_EQ(many.GetRGBIndex(Color(255, 255, 255)), 1020);
+    EXPECT_EQ(map[1023], Color(255, 255, 255));
+    // Grey pixels in a colour format count as grey.
+    TZmBitmap colors;
+    MakeRow(colors, {Color(3, 3, 3), Color(250, 250, 250)});
+    TZmQuantizer from_colors(colors, map, 16);
+    EXPECT_TRUE(from_colors.GetGrayScale());
+    EXPECT_EQ(map[1], Color(16, 16, 16));
+}
+
+TEST(Quantizer, PaletteImagesKeepTheirPalette) {
+    TZmBitmap bitmap;
+    ASSERT_TRUE(bitmap.Allocate(1, 1, zm8p));
+    for (std::int32_t i = 0; i < 256; ++i) {
+        bitmap.SetPalette(i, Color(static_cast<std::uint8_t>(i), 7, 9));
+    }
+    bitmap.SetPixels_zm8(0, 0, 3);
+    std::vector<TRGB> map;
+    TZmQuantizer quantizer(bitmap, map, 16);
+    EXPECT_EQ(map[15], Color(15, 7, 9));
+    EXPECT_EQ(quantizer.GetRGBIndex(Color(200, 7, 9)), 200);
+    EXPECT_EQ(quantizer.GetRGBIndex(Color(200, 7, 10)), 256);  // missing: the palette's size
+}
+
+TEST(Quantizer, LimitsTheColourCountAndTakesDegenerateImages) {
+    TZmBitmap bitmap;
+    MakeRow(bitmap, {Color(1, 2, 3)}, zm32RGB);
+    TZmBitmap empty;
+    for (const std::int32_t algorithm : {kNeural, kBoxes}) {
+        const TReductionSettings settings(algorithm, -1);
+        for (const std::int32_t count : {std::numeric_limits<std::int32_t>::min(), 0, 1, 2, 256,
+                                         1024, std::numeric_limits<std::int32_t>::max()}) {
+            std::vector<TRGB> map;
+            TZmQuantizer quantizer(bitmap, map, count);
+            EXPECT_EQ(map.size(), count < 2 ? 2u : count > 1024 ? 1024u : std::size_t(count));
+            const std::int32_t index = quantizer.GetRGBIndex(Color(1, 2, 3));
+            EXPECT_GE(index, 0);
+            EXPECT_LT(index, static_cast<std::int32_t>(map.size()));
+            TZmQuantizer nothing(empty, map, count);
+            EXPECT_EQ(nothing.GetFoundColors(), 0);
+            EXPECT_EQ(nothing.GetRGBIndex(Color(1, 2, 3)), 0);
+        }
+    }
+}
+
+// Box means are multiples of 8, which neurons almost never all are.
+TEST(Quantizer, ChoosesTheMethod) {
+    auto noise = test::MakeNoise(zm24RGB, 60, 40, 3);
+    const auto is_boxes = [&](std::int32_t count) {
+        std::vector<TRGB> map;
+        TZmQuantizer quantizer(*noise, map, count);
+        for (const TRGB& entry : map) {
+            if ((entry.r | entry.g | entry.b) % 8 != 0) {
+                return false;
+            }
+        }
+        return true;
+    };
+    EXPECT_TRUE(is_boxes(100));
+    EXPECT_TRUE(is_boxes(127));
+    EXPECT_FALSE(is_boxes(128));
+    EXPECT_FALSE(is_boxes(200));
+    const TReductionSettings boxes(kBoxes, -1);
+    EXPECT_TRUE(is_boxes(200));
+    const TReductionSettings other(7, -1);
+    EXPECT_FALSE(is_boxes(100));
+}
+
+TEST(Quantizer, BoxSplitByHand) {
+    const TReductionSettings settings(kBoxes, -1);
+    // Red levels 0, 1 and 31. Mean 10.67, cuts from level 5 (middle of 0 and the mean) on all
+    // score alike: the first wins. Halves 0 to 5, of mean 0.5, which rounds to 0, and 6 to 31.
+    TZmBitmap bitmap;
+    MakeRow(bitmap, {Color(0, 0, 0), Color(8, 0, 0), Color(248, 0, 0)});
+    std::vector<TRGB> map;
+    TZmQuantizer quantizer(bitmap, map, 2);
+    EXPECT_EQ(quantizer.GetFoundColors(), 2);
+    EXPECT_EQ(map, (std::vector<TRGB>{Color(0, 0, 0), Color(248, 0, 0)}));
+    EXPECT_EQ(quantizer.GetRGBIndex(Color(8, 0, 0)), 0);
+    EXPECT_EQ(quantizer.GetRGBIndex(Color(47, 255, 255)), 0);  // level 5
+    EXPECT_EQ(quantizer.GetRGBIndex(Color(48, 0, 0)), 1);      // level 6
+    EXPECT_EQ(quantizer.GetRGBIndex(Color(248, 0, 0)), 1);
+}
+
+TEST(Quantizer, BoxSplitPrefersRedOnATieAndStopsAtOneCell) {
+    const TReductionSettings settings(kBoxes, -1);
+    TZmBitmap bitmap;
+    std::vector<TRGB> map;
+    // Red and green part the image equally well; the third colour shares the second's cell.
+    MakeRow(bitmap, {Color(0, 0, 0), Color(248, 248, 0), Color(249, 248, 0)});
+    TZmQuantizer tie(bitmap, map, 2);
+    EXPECT_EQ(tie.GetRGBIndex(Color(0, 255, 0)), 0);
+    EXPECT_EQ(tie.GetRGBIndex(Color(255, 0, 0)), 1);
+    MakeRow(bitmap, {Color(17, 0, 0), Color(18, 0, 0), Color(19, 0, 0)});
+    TZmQuantizer one_cell(bitmap, map, 2);
+    EXPECT_EQ(one_cell.GetFoundColors(), 1);
+    EXPECT_EQ(map[0], Color(16, 0, 0));
+}
+
+TEST(Quantizer, EveryBoxColourLiesNearItsPixels) {
+    const TReductionSettings settings(kBoxes, -1);
+    for (const TZmPixelFormat format : {zm24RGB, zm32RGB, zm48RGB, zmCMYK}) {
+        auto noise = test::MakeNoise(format, 64, 64, 11);
+        std::vector<TRGB> map;
+        TZmQuantizer quantizer(*noise, map, 256);
+        EXPECT_EQ(quantizer.GetFoundColors(), 256);
+        std::int64_t total = 0;
+        for (std::int32_t i = 0; i < 4096; ++i) {
+            const TRGB color = noise->GetPixels(i % 64, i / 64);
+            const auto index = static_cast<std::size_t>(quantizer.GetRGBIndex(color));
+            total += Distance(color, map[index]);
+        }
+        // 256 boxes over the cube have sides of about 40: mean error near 3 * 10.
+        EXPECT_LT(total / 4096, 45);
+        EXPECT_GT(total, 0);
+    }
+}
+
+// Two neurons at 0 and 2048, three samples of red 160, 320, 3200 (times 16) at alpha 1024, 990,
+// 957: neuron 0 wins all, and goes to 160, 314, 3011, that is 188.
+TEST(Quantizer, NeuralTrainingByHand) {
+    const TReductionSettings settings(kNeural, 100);
+    TZmBitmap bitmap;
+    MakeRow(bitmap, {Color(10, 0, 0), Color(20, 0, 0), Color(200, 0, 0)});
+    std::vector<TRGB> map;
+    TZmQuantizer quantizer(bitmap, map, 2);
+    EXPECT_EQ(map, (std::vector<TRGB>{Color(188, 0, 0), Color(128, 128, 128)}));
+    EXPECT_EQ(quantizer.GetFoundColors(), 2);
+    EXPECT_EQ(quantizer.GetRGBIndex(Color(10, 0, 0)), 0);
+    EXPECT_EQ(quantizer.GetRGBIndex(Color(120, 130, 140)), 1);
+}
+
+// Sixteen neurons have radius 2: the neighbour of the winner moves by 192 / 256 of the way. The
+// sample is red 256; neuron 1 stands at 256 in all channels, its green and blue go to 64.
+TEST(Quantizer, NeuralNeighboursFollowByHand) {
+    const TReductionSettings settings(kNeural, 100);
+    TZmBitmap bitmap;
+    MakeRow(bitmap, {Color(16, 0, 0)}, zm32RGB);
+    std::vector<TRGB> map;
+    TZmQuantizer quantizer(bitmap, map, 16);
+    EXPECT_EQ(map[0], Color(16, 0, 0));
+    EXPECT_EQ(map[1], Color(16, 4, 4));
+    EXPECT_EQ(map[2], Color(32, 32, 32));
+    EXPECT_EQ(map[15], Color(240, 240, 240));
+}
+
+TEST(Quantizer, NeuralLookupFindsTheNearestEntry) {
+    auto noise = test::MakeNoise(zm24RGB, 80, 60, 21);
+    std::vector<TRGB> map;
+    TZmQuantizer quantizer(*noise, map, 200);
+    auto queries = test::MakeNoise(zm24RGB, 64, 32, 22);
+    for (std::int32_t i = 0; i < 64 * 32; ++i) {
+        TRGB color = queries->GetPixels_zm24RGB(i % 64, i / 64);
+        color.g = static_cast<std::uint8_t>(i);  // every green value, with its ends
+        std::int32_t nearest = 1000;
+        for (const TRGB& entry : map) {
+            nearest = std::min(nearest, Distance(entry, color));
+        }
+        const auto index = static_cast<std::size_t>(quantizer.GetRGBIndex(color));
+        ASSERT_EQ(Distance(map[index], color), nearest) << i;
+    }
+}
+
+TEST(Quantizer, NeuralPaletteCoversTheImage) {
+    auto gradient = test::MakeGradient(zm24RGB, 200, 150);
+    std::vector<TRGB> map;
+    TZmQuantizer quantizer(*gradient, map, 256);
+    std::int64_t total = 0;
+    for (std::int32_t i = 0; i < 30000; ++i) {
+        const TRGB color = gradient->GetPixels_zm24RGB(i % 200, i / 200);
+        const auto index = static_cast<std::size_t>(quantizer.GetRGBIndex(color));
+        total += Distance(color, map[index]);
+    }
+    EXPECT_LT(total / 30000, 24);
+}
+
+TEST(Quantizer, SamplingFactor) {
+    const struct {
+        std::int32_t quality;
+        std::int64_t pixels;
+        std::int32_t factor;
+    } cases[] = {{100, 5000, 1},    {0, 5000, 30},      {50, 5000, 15},     {99, 5000, 1},
+                 {96, 5000, 2},     {200, 5000, 1},     {-1000, 5000, 30},  {-1, 0, 1},
+                 {-1, 1000, 1},     {-1, 1999, 1},      {-1, 2000, 2},      {-1, 150000, 15},
+                 {-1, 320769, 30},  {-1, 12000000, 30}};
+    for (const auto& c : cases) {
+        EXPECT_EQ(NeuralSamplingFactor(c.quality, c.pixels), c.factor)
+            << c.quality << ", " << c.pixels;
+    }
+}
+
+TEST(Quantizer, StepSharesNoFactorWithTheImage) {
+    EXPECT_EQ(NeuralStep(1000), 499);
+    EXPECT_EQ(NeuralStep(499), 491);
+    EXPECT_EQ(NeuralStep(499 * 491), 487);
+    EXPECT_EQ(NeuralStep(499LL * 491 * 487), 503);
+    for (std::int64_t pixels = 1; pixels < 600000; ++pixels) {
+        ASSERT_NE(pixels * 3 % NeuralStep(pixels), 0) << pixels;
+    }
+}
+
+TEST(ReduceToTwoColors, FindsTheTwoAndTheirOrder) {
+    TZmBitmap source;
+    MakeRow(source, {Color(250, 250, 0), Color(0, 0, 90), Color(250, 250, 0)});
+    TZmBitmap bits;
+    TRGB dark;
+    TRGB light;
+    ASSERT_TRUE(ReduceToTwoColors(source, bits, dark, light));
+    EXPECT_EQ(dark, Color(0, 0, 90));
+    EXPECT_EQ(light, Color(250, 250, 0));
+    ASSERT_EQ(bits.GetPixelFormat(), zm1g);
+    EXPECT_TRUE(bits.GetPixels_zm1g(0, 0));
+    EXPECT_FALSE(bits.GetPixels_zm1g(1, 0));
+    EXPECT_TRUE(bits.GetPixels_zm1g(2, 0));
+    EXPECT_EQ(source.GetPixelFormat(), zm24RGB);
+}
+
+TEST(ReduceToTwoColors, SingleColoursAndRefusals) {
+    TZmBitmap source;
+    TZmBitmap bits;
+    TRGB dark;
+    TRGB light;
+    EXPECT_FALSE(ReduceToTwoColors(source, bits, dark, light));
+    MakeRow(source, {Color(255, 255, 255), Color(255, 255, 255)});
+    ASSERT_TRUE(ReduceToTwoColors(source, bits, dark, light));
+    EXPECT_TRUE(bits.GetPixels_zm1g(1, 0));
+    EXPECT_EQ(dark, TRGB{});
+    MakeRow(source, {Color(9, 0, 0)});
+    ASSERT_TRUE(ReduceToTwoColors(source, bits, dark, light));
+    EXPECT_FALSE(bits.GetPixels_zm1g(0, 0));
+    EXPECT_EQ(dark, Color(9, 0, 0));
+    EXPECT_EQ(light, Color(255, 255, 255));
+    MakeRow(source, {Color(1, 0, 0), Color(2, 0, 0), Color(3, 0, 0)});
+    EXPECT_FALSE(ReduceToTwoColors(source, bits, dark, light));
+    EXPECT_TRUE(bits.IsEmpty());
+}
+
+}  // namespace
+}  // namespace zm
