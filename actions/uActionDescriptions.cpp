@@ -32,12 +32,9 @@ TSides ReadSides(const IStepParams& params) {
 std::u16string PlaceText(const IStepParams& params, std::u16string_view place_key,
                          const std::u16string& prefix) {
     switch (params.GetInteger(place_key)) {
-        case 0:
-            return prefix + QuotedString(params.GetStringDef(u"image_file", u"<empty>"));
-        case 1:
-            return prefix + u"Clipboard";
-        default:
-            return {};
+        case 0: return prefix + QuotedString(params.GetStringDef(u"image_file", u"<empty>"));
+        case 1: return prefix + u"Clipboard";
+        default: return {};
     }
 }
 
@@ -75,12 +72,8 @@ void DescribeCropImage(const IStepParams& params, std::u16string& Descr) {
 
 void DescribeRotateImage(const IStepParams& params, std::u16string& Descr) {
     switch (params.GetInteger(u"action")) {
-        case 1:
-            Descr = u"Flip image horizontally";
-            break;
-        case 2:
-            Descr = u"Flip image vertically";
-            break;
+        case 1: Descr = u"Flip image horizontally"; break;
+        case 2: Descr = u"Flip image vertically"; break;
         default:
             Descr = u"Rotate image by " + params.GetStringDef(u"angle", u"?") + u" degrees";
             break;

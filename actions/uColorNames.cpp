@@ -91,7 +91,7 @@ std::u16string ColorToText(TColor color) {
 }
 
 std::u16string ColorDescription(TColor color) {
-    const std::u16string name = ColorToText(color);
+    std::u16string name = ColorToText(color);
     if (name.starts_with(u"cl")) {
         return AsciiLower(std::u16string_view(name).substr(2));
     }

@@ -92,12 +92,12 @@ std::unique_ptr<TZmBitmap> TQVImageList::TakeBitmap(std::int32_t job_id) {
 bool TQVImageList::OpenFromFile(const IStepParams& params, TZmBitmap& bitmap) {
     const std::u16string name = ExpandVariables(params.GetString(u"image_file"));
     if (!platform::FileExists(name)) {
-        ReportJobError(params.GetTaskId(), kErrorFileMissing,
-                       u"File \"" + name + u"\" not exists");
+        ReportJobError(params.GetTaskId(), kErrorFileMissing, u"File \"" + name + u"\" not exists");
         return false;
     }
     bitmap.SetParamsEnabled(true);
-    if (!bitmap.Read(name, nullptr, /*check_unknown=*/true)) {
+    // A file may tell of an image without pixels, and reads well; there is nothing to open in it.
+    if (!bitmap.Read(name, nullptr, /*check_unknown=*/true) || bitmap.IsEmpty()) {
         ReportJobError(params.GetTaskId(), kErrorNotReadable,
                        u"Cannot read image file \"" + name + u"\"");
         return false;

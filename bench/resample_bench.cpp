@@ -1,0 +1,108 @@
+// Resampling of a 12-megapixel picture, against a memcpy of the same bytes in the same run.
+// `items` are target pixels.
+
+#include <benchmark/benchmark.h>
+
+#include <cstdint>
+#include <cstring>
+#include <memory>
+#include <vector>
+
+#include "engine/bitmap/zmxBitmaps.h"
+#include "engine/proc/zmresample.h"
+#include "engine/proc/zmresample_p.h"
+
+namespace zm {
+namespace {
+
+constexpr std::int32_t kLargeWidth = 4000;
+constexpr std::int32_t kLargeHeight = 3000;
+constexpr std::int32_t kSmallWidth = 1000;
+constexpr std::int32_t kSmallHeight = 750;
+
+/// A picture as cameras make it: smooth shapes under some noise.
+std::unique_ptr<TZmBitmap> MakePicture(std::int32_t width, std::int32_t height) {
+    auto bitmap = std::make_unique<TZmBitmap>(width, height, zm24RGB);
+    std::uint32_t noise = 1;
+    for (std::int32_t y = 0; y < height; ++y) {
+        std::uint8_t* row = bitmap->GetScanLine(y);
+        for (std::int32_t i = 0; i < width * 3; ++i) {
+            noise = noise * 1664525u + 1013904223u;
+            row[i] = static_cast<std::uint8_t>((i * 255 / (width * 3) + y / 8 + (noise >> 28)) &
+                                               255);
+        }
+    }
+    return bitmap;
+}
+
+void BM_MemcpyLarge(benchmark::State& state) {
+    const std::size_t bytes = std::size_t{kLargeWidth} * kLargeHeight * 3;
+    std::vector<std::uint8_t> from(bytes, 1);
+    std::vector<std::uint8_t> to(bytes);
+    for (auto _ : state) {
+        std::memcpy(to.data(), from.data(), bytes);
+        benchmark::DoNotOptimize(to.data());
+        benchmark::ClobberMemory();
+    }
+}
+BENCHMARK(BM_MemcpyLarge)->Unit(benchmark::kMillisecond);
+
+void Resample(benchmark::State& state, TZmImageSize from, TZmImageSize to,
+              TResampleFilter filter) {
+    const auto source = MakePicture(from.width, from.height);
+    TZmBitmap target(to.width, to.height, zm24RGB);
+    for (auto _ : state) {
+        if (!ResampleBitmapInto(*source, target, filter, nullptr, {})) {
+            state.SkipWithError("no result");
+        }
+        benchmark::ClobberMemory();
+    }
+    state.SetItemsProcessed(state.iterations() * to.width * to.height);
+}
+
+constexpr TZmImageSize kLarge{kLargeWidth, kLargeHeight};
+constexpr TZmImageSize kSmall{kSmallWidth, kSmallHeight};
+constexpr TZmImageSize kDyadic{1024, 768};
+constexpr TZmImageSize kUneven{1111, 833};
+constexpr TZmImageSize kUnevenLarge{3777, 2833};
+
+BENCHMARK_CAPTURE(Resample, BilinearShrink, kLarge, kSmall, rfBilinear)
+    ->Unit(benchmark::kMillisecond);
+BENCHMARK_CAPTURE(Resample, BilinearShrink1024, kLarge, kDyadic, rfBilinear)
+    ->Unit(benchmark::kMillisecond);
+BENCHMARK_CAPTURE(Resample, BilinearShrinkUneven, kLarge, kUneven, rfBilinear)
+    ->Unit(benchmark::kMillisecond);
+BENCHMARK_CAPTURE(Resample, BilinearEnlarge, kSmall, kLarge, rfBilinear)
+    ->Unit(benchmark::kMillisecond);
+BENCHMARK_CAPTURE(Resample, BilinearEnlargeUneven, kSmall, kUnevenLarge, rfBilinear)
+    ->Unit(benchmark::kMillisecond);
+BENCHMARK_CAPTURE(Resample, BicubicEnlarge, kSmall, kLarge, rfBicubic)
+    ->Unit(benchmark::kMillisecond);
+BENCHMARK_CAPTURE(Resample, NearestShrink, kLarge, kSmall, rfNone)
+    ->Unit(benchmark::kMillisecond);
+BENCHMARK_CAPTURE(Resample, NearestEnlarge, kSmall, kLarge, rfNone)
+    ->Unit(benchmark::kMillisecond);
+BENCHMARK_CAPTURE(Resample, FastLinearShrink, kLarge, kSmall, rfFastLinear)
+    ->Unit(benchmark::kMillisecond);
+BENCHMARK_CAPTURE(Resample, FastLinearEnlarge, kSmall, kLarge, rfFastLinear)
+    ->Unit(benchmark::kMillisecond);
+BENCHMARK_CAPTURE(Resample, Lanczos3Shrink, kLarge, kSmall, rfLanczos3)
+    ->Unit(benchmark::kMillisecond);
+
+/// The plain form, for the gain of the fast one.
+void BM_BilinearPlain(benchmark::State& state) {
+    const bool shrink = state.range(0) != 0;
+    const auto source = shrink ? MakePicture(kLargeWidth, kLargeHeight)
+                               : MakePicture(kSmallWidth, kSmallHeight);
+    const TZmImageSize to = shrink ? kSmall : kLarge;
+    TZmBitmap target(to.width, to.height, zm24RGB);
+    for (auto _ : state) {
+        if (!ResampleAreaPlain(*source, target, nullptr, TAreaInterpolation::kLinear, {})) {
+            state.SkipWithError("no result");
+        }
+    }
+}
+BENCHMARK(BM_BilinearPlain)->ArgName("shrink")->Arg(1)->Arg(0)->Unit(benchmark::kMillisecond);
+
+}  // namespace
+}  // namespace zm

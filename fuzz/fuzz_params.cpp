@@ -66,7 +66,9 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size
         return 0;
     }
     std::u16string text(size / 2, u'\0');
-    std::memcpy(text.data(), data, text.size() * sizeof(char16_t));
+    if (!text.empty()) {
+        std::memcpy(text.data(), data, text.size() * sizeof(char16_t));
+    }
     zm::TAFActionParams params{};
     params.PPtr = text.data();
     StartedPlugin();

@@ -238,6 +238,7 @@ void DeclareRunOptions(CLI::App& run, TOptions& options) {
 int Main(const std::vector<std::string>& arguments) {
     CLI::App app{"Runs job files through the graphics plug-in, once per picture.", "qvrun"};
     TOptions options;
+    app.allow_windows_style_options(false);  // a path that starts with a slash is no option
     app.require_subcommand(1);
     CLI::App* run = app.add_subcommand("run", "Run a job file over pictures");
     CLI::App* actions = app.add_subcommand("actions", "List the plug-in's actions and their ids");

@@ -58,6 +58,8 @@ std::intptr_t AskHost(const TAFPlugin& plugin, THostQuery query) {
 }
 
 std::u16string AskHostText(const TAFPlugin& plugin, THostQuery query) {
+    // A message's answer is a number; the contract has it stand for an address here.
+    // NOLINTNEXTLINE(performance-no-int-to-ptr)
     const auto* text = reinterpret_cast<const char16_t*>(AskHost(plugin, query));
     return text == nullptr ? std::u16string() : std::u16string(text);
 }
@@ -199,9 +201,8 @@ std::u16string IncludeTrailingSlash(const std::u16string& text) {
     if (text.empty() || text.back() == u'\\') {
         return text;
     }
-    const bool is_drive_letter =
-        text.size() == 1 && ((text[0] >= u'A' && text[0] <= u'Z') ||
-                             (text[0] >= u'a' && text[0] <= u'z'));
+    const bool is_drive_letter = text.size() == 1 && ((text[0] >= u'A' && text[0] <= u'Z') ||
+                                                      (text[0] >= u'a' && text[0] <= u'z'));
     return text + (is_drive_letter ? u":\\" : u"\\");
 }
 
@@ -215,8 +216,8 @@ void ReadPluginSettings(TQVPluginSettings& settings, const TAFPlugin& plugin) {
     settings.RegRoot = AskHost(plugin, hqRegRoot);
     settings.RegKey = AskHostText(plugin, hqRegKey);
     if (!settings.RegKey.empty()) {
-        settings.RegKey = IncludeTrailingSlash(settings.RegKey) +
-                          RemoveChar(plugin.GetDescription(), u' ');
+        settings.RegKey =
+            IncludeTrailingSlash(settings.RegKey) + RemoveChar(plugin.GetDescription(), u' ');
     }
     settings.AppPath = AskHostText(plugin, hqAppPath);
 }

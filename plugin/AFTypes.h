@@ -210,7 +210,7 @@ struct TAFPluginInfo {
     std::int32_t ID;
     void* Icon;
     const char16_t* Descr;
-    TAFSimpleProc PluginConfig;    ///< nil without a handler, as the two below
+    TAFSimpleProc PluginConfig;  ///< nil without a handler, as the two below
     TAFSimpleProc About;
     TAFSimpleProc ShutdownPlugin;
     TLongBool IsActions;
@@ -236,7 +236,7 @@ constexpr std::size_t ByPointerSize(std::size_t on_32_bits, std::size_t on_64_bi
     return sizeof(void*) == 4 ? on_32_bits : on_64_bits;
 }
 
-#define ZM_FIELD_AT(record, field, on_32_bits, on_64_bits)                       \
+#define ZM_FIELD_AT(record, field, on_32_bits, on_64_bits)                          \
     static_assert(offsetof(record, field) == ByPointerSize(on_32_bits, on_64_bits), \
                   #record "." #field)
 #define ZM_SIZE_IS(record, on_32_bits, on_64_bits) \

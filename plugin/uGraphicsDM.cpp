@@ -36,8 +36,7 @@ public:
     void InfoOut(std::int32_t kind, const std::u16string& line) override {
         HostInfoOut(kind, line.c_str());
     }
-    void SetLastError(std::int32_t job_id, std::int32_t code,
-                      const std::u16string& text) override {
+    void SetLastError(std::int32_t job_id, std::int32_t code, const std::u16string& text) override {
         HostSetLastError(job_id, code, text.c_str());
     }
 };
@@ -63,10 +62,10 @@ constexpr std::array<TActionRow, kGraphicsActionCount> kActionRows{{
      &DescribeRotateImage},
     {u"Draw Text on Image", u"A_GRAPHICS_DRAW_TEXT_ON_IMAGE", igText, &TQVImageList::TextOut,
      &DescribeTextOnImage},
-    {u"Draw Image on Image", u"A_GRAPHICS_DRAW_IMAGE_ON_IMAGE", igImage,
-     &TQVImageList::DrawImage, &DescribeImageOnImage},
-    {u"Add Border to Image", u"A_GRAPHICS_ADD_BORDER_TO_IMAGE", igBorder,
-     &TQVImageList::AddBorder, &DescribeAddBorder},
+    {u"Draw Image on Image", u"A_GRAPHICS_DRAW_IMAGE_ON_IMAGE", igImage, &TQVImageList::DrawImage,
+     &DescribeImageOnImage},
+    {u"Add Border to Image", u"A_GRAPHICS_ADD_BORDER_TO_IMAGE", igBorder, &TQVImageList::AddBorder,
+     &DescribeAddBorder},
 }};
 
 /// Row of an item of the collection; nil for an index outside the table.

@@ -1,6 +1,8 @@
 #include "plugin/uIcons.h"
 
+#include <algorithm>
 #include <array>
+#include <iterator>
 #include <string_view>
 #include <utility>
 
@@ -23,14 +25,14 @@ struct TInk {
     std::uint8_t red;
 };
 constexpr TInk kInks[] = {
-    {'.', 0, 0, 0},         // see-through
-    {'#', 64, 48, 40},      // outline
-    {'w', 255, 255, 255},   // paper
-    {'b', 214, 142, 58},    // sky, arrows
-    {'g', 76, 160, 72},     // hills
-    {'y', 64, 200, 248},    // sun, folder
-    {'r', 52, 60, 214},     // marks
-    {'s', 176, 168, 160},   // metal, shade
+    {'.', 0, 0, 0},        // see-through
+    {'#', 64, 48, 40},     // outline
+    {'w', 255, 255, 255},  // paper
+    {'b', 214, 142, 58},   // sky, arrows
+    {'g', 76, 160, 72},    // hills
+    {'y', 64, 200, 248},   // sun, folder
+    {'r', 52, 60, 214},    // marks
+    {'s', 176, 168, 160},  // metal, shade
 };
 
 using TDrawing = std::array<std::string_view, kSide>;
@@ -91,12 +93,12 @@ private:
     std::vector<std::uint8_t>& bytes_;
 };
 
+/// Palette index of a letter.
 std::uint8_t InkOf(char letter) {
-    std::uint8_t ink = kTransparent;
-    for (std::uint8_t index = 0; index < std::size(kInks); ++index) {
-        ink = kInks[index].letter == letter ? index : ink;
-    }
-    return ink;
+    const TInk* const found = std::find_if(std::begin(kInks), std::end(kInks),
+                                           [letter](TInk ink) { return ink.letter == letter; });
+    ZM_ASSERT(found != std::end(kInks));
+    return static_cast<std::uint8_t>(found - std::begin(kInks));
 }
 
 void WriteHeaders(TByteWriter& out) {

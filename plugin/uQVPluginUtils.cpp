@@ -29,8 +29,7 @@ bool HasKey(std::u16string_view line, std::u16string_view key) {
 
 /// Number after `prefix` in a key such as name_12: no sign, no leading zeros; -1 for other keys.
 std::int32_t ListIndex(std::u16string_view key, std::u16string_view prefix) {
-    if (key.size() <= prefix.size() ||
-        !KeysEqualNoCase(key.substr(0, prefix.size()), prefix)) {
+    if (key.size() <= prefix.size() || !KeysEqualNoCase(key.substr(0, prefix.size()), prefix)) {
         return -1;
     }
     const std::u16string_view digits = key.substr(prefix.size());

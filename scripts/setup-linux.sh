@@ -15,7 +15,7 @@ PackagesFor() {
                 libcli11-dev ;;
         # ImageMagick is the independent eye that opens what the module wrote.
         test) PackagesFor build; echo libgtest-dev libgmock-dev googletest python3 imagemagick ;;
-        bench) PackagesFor build; echo libbenchmark-dev ;;
+        bench) PackagesFor build; echo libbenchmark-dev python3 ;;
         fuzz) PackagesFor build; echo clang libclang-rt-dev ;;
         check) PackagesFor test; echo clang-format clang-tidy ;;
         windows)

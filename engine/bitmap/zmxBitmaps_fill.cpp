@@ -94,10 +94,13 @@ private:
 /// Fills an inclusive rectangle that lies inside the bitmap.
 void FillRows(TZmBitmap& bitmap, const TRect& rect, const TPixelPattern& pattern) {
     const std::int32_t width = rect.right - rect.left + 1;
+    const bool is_whole_rows = width == bitmap.GetWidth();
     const bool is_one_bit = bitmap.GetPixelFormat() == zm1g;
     const bool is_one_byte = !is_one_bit && pattern.HasEqualBytes();
     const std::size_t offset = static_cast<std::size_t>(rect.left) * pattern.size;
     const std::size_t count = static_cast<std::size_t>(width) * pattern.size;
+    // Whole rows take the unused bits of their last byte along.
+    const std::int64_t bit_count = is_whole_rows ? (std::int64_t{width} + 7) / 8 * 8 : width;
     std::vector<std::uint8_t> row;
     if (!is_one_bit && !is_one_byte) {
         row = MakePatternRow(pattern, static_cast<std::size_t>(width));
@@ -105,7 +108,7 @@ void FillRows(TZmBitmap& bitmap, const TRect& rect, const TPixelPattern& pattern
     for (std::int32_t y = rect.top; y <= rect.bottom; ++y) {
         std::uint8_t* const line = bitmap.GetScanLine(y);
         if (is_one_bit) {
-            FillBits(line, rect.left, width, pattern.bytes[0] != 0);
+            FillBits(line, rect.left, bit_count, pattern.bytes[0] != 0);
         } else if (is_one_byte) {
             std::memset(line + offset, pattern.bytes[0], count);
         } else {

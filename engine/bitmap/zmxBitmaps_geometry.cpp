@@ -249,13 +249,11 @@ void TZmBitmap::CropPixelsFrom(TZmBitmap& source, std::int32_t x1, std::int32_t 
     const bool is_filled = fill_color != kCropNoFill;
     const TOverlap columns = FindOverlap(x1, fWidth, source.fWidth);
     const TOverlap lines = FindOverlap(y1, fHeight, source.fHeight);
-    if (columns.length < 1 || lines.length < 1) {
-        if (is_filled) {
-            Fill(static_cast<double>(fill_color));
-        }
-        return;
-    }
-    if (is_filled) {
+    const bool is_overlapping = columns.length > 0 && lines.length > 0;
+    if (is_filled && (!is_overlapping || fPixelFormat == zm1g)) {
+        // One bit a pixel is filled whole, which gives the unused bits of the rows a value too.
+        Fill(static_cast<double>(fill_color));
+    } else if (is_filled) {
         FillAround(*this,
                    TRect{columns.dest, lines.dest, columns.dest + columns.length - 1,
                          lines.dest + lines.length - 1},

@@ -13,6 +13,7 @@
 #include <optional>
 
 #include "engine/bitmap/zmmask.h"
+#include "engine/bitmap/zmpixelformats.h"
 #include "engine/bitmap/zmxBitmaps.h"
 #include "engine/codecs/bmpfilt_p.h"
 #include "engine/foundation/zmnumbers.h"

@@ -59,7 +59,8 @@ bool TRleDecoder::Take(std::uint8_t& value) {
     return true;
 }
 
-// Pixels past the end of a row overwrite the last one instead of running over.
+// Required: pixels past the end of a row overwrite the last one instead of being dropped. Files
+// whose runs are a pixel too long are common, and jobs compare their last column.
 void TRleDecoder::PutPixel(std::uint8_t index) {
     indices_[column_] = index;
     column_ = std::min(column_ + 1, last_column_);

@@ -58,7 +58,9 @@ TMessageTable MakeMessageTable() {
         const int code = LibraryCode(number);
         const char* format =
             code <= manager.last_jpeg_message ? manager.jpeg_message_table[code] : nullptr;
-        table[static_cast<std::size_t>(number)] = format != nullptr ? WithoutParameters(format) : "";
+        if (format != nullptr) {
+            table[static_cast<std::size_t>(number)] = WithoutParameters(format);
+        }
     }
     return table;
 }

@@ -80,7 +80,8 @@ void TStream::WriteBuffer(const void* buffer, std::size_t count) {
 }
 
 std::int32_t TMemoryStream::Read(void* buffer, std::int32_t count) {
-    return ReadFrom(bytes_.data(), GetSize(), position_, buffer, count);
+    const auto size = static_cast<std::int64_t>(bytes_.size());
+    return ReadFrom(bytes_.data(), size, position_, buffer, count);
 }
 
 std::int32_t TMemoryStream::Write(const void* buffer, std::int32_t count) {

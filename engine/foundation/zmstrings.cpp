@@ -272,6 +272,10 @@ bool KeysEqualNoCase(std::u16string_view a, std::u16string_view b) {
                       [](char16_t x, char16_t y) { return FoldCase(x) == FoldCase(y); });
 }
 
+std::u16string FoldKeyCase(std::u16string_view text) {
+    return Mapped(std::u16string(text), FoldCase);
+}
+
 std::vector<std::u16string> SplitLines(std::u16string_view text) {
     std::vector<std::u16string> lines;
     while (!text.empty()) {

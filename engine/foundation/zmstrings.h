@@ -36,6 +36,8 @@ bool AsciiEqualNoCase(std::u16string_view a, std::u16string_view b);
 /// Case folding of key names: simple folding of ASCII, Latin-1, Greek and Cyrillic letters,
 /// independent of the locale. Used where the host compares keys without case.
 bool KeysEqualNoCase(std::u16string_view a, std::u16string_view b);
+/// The text with that folding done: two keys are equal without case when their foldings are.
+std::u16string FoldKeyCase(std::u16string_view text);
 
 /// Lines of a text, split at CR LF, CR or LF; a final line end adds no empty line.
 std::vector<std::u16string> SplitLines(std::u16string_view text);

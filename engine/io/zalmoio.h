@@ -146,8 +146,7 @@ private:
     bool BeginRowLoad(const TZmFileFormatInfo& row);
     bool LoadFileByRow(const TZmFileFormatInfo& row, const std::u16string& file_name);
     bool LoadStreamByRow(const TZmFileFormatInfo& row, TStream& stream);
-    bool RunRowLoad(const TZmFileFormatInfo& row, TStream& stream,
-                    const std::u16string& file_name);
+    bool RunRowLoad(const TZmFileFormatInfo& row, TStream& stream, const std::u16string& file_name);
 
     TSaveCodec SaveCodecBMP();
     TSaveCodec SaveCodecPNG();

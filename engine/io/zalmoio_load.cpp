@@ -61,14 +61,10 @@ TZalmoIO::TLoadCodec TZalmoIO::LoadCodecJpeg() {
 
 std::optional<TZalmoIO::TLoadCodec> TZalmoIO::InternalLoadCodec(std::int32_t file_type) {
     switch (file_type) {
-        case ioBMP:
-            return LoadCodecBMP();
-        case ioPNG:
-            return LoadCodecPNG();
-        case ioJPEG:
-            return LoadCodecJpeg();
-        default:
-            return std::nullopt;
+        case ioBMP: return LoadCodecBMP();
+        case ioPNG: return LoadCodecPNG();
+        case ioJPEG: return LoadCodecJpeg();
+        default: return std::nullopt;
     }
 }
 
@@ -79,8 +75,7 @@ bool TZalmoIO::RunLoadFile(const TLoadCodec& codec, const std::u16string& file_n
     return RunLoad(codec, stream, file_name);
 }
 
-bool TZalmoIO::RunLoad(const TLoadCodec& codec, TStream& stream,
-                       const std::u16string& file_name) {
+bool TZalmoIO::RunLoad(const TLoadCodec& codec, TStream& stream, const std::u16string& file_name) {
     CheckAttachedBitmap();
     return RunToNotice([&] { LoadSteps(codec, stream, file_name); });
 }
@@ -239,8 +234,7 @@ bool TZalmoIO::LoadFromStream(TStream& stream, std::int32_t file_type) {
     return LoadStreamByRow(*row, stream);
 }
 
-bool TZalmoIO::LoadFromBuffer(const void* buffer, std::int64_t size_bytes,
-                              std::int32_t file_type) {
+bool TZalmoIO::LoadFromBuffer(const void* buffer, std::int64_t size_bytes, std::int32_t file_type) {
     if (buffer == nullptr || size_bytes < 1) {
         return Fail();
     }

@@ -49,14 +49,10 @@ TZalmoIO::TSaveCodec TZalmoIO::SaveCodecJpeg() {
 
 std::optional<TZalmoIO::TSaveCodec> TZalmoIO::InternalSaveCodec(std::int32_t file_type) {
     switch (file_type) {
-        case ioBMP:
-            return SaveCodecBMP();
-        case ioPNG:
-            return SaveCodecPNG();
-        case ioJPEG:
-            return SaveCodecJpeg();
-        default:
-            return std::nullopt;
+        case ioBMP: return SaveCodecBMP();
+        case ioPNG: return SaveCodecPNG();
+        case ioJPEG: return SaveCodecJpeg();
+        default: return std::nullopt;
     }
 }
 
@@ -140,9 +136,9 @@ bool TZalmoIO::SaveToFile(const std::u16string& file_name, std::int32_t file_typ
     if (const auto codec = InternalSaveCodec(file_type)) {
         return RunSaveFile(*codec, file_name);
     }
-    const auto row_codec = RowSaveCodec(is_by_name
-                                            ? FindFormatInfoByExtension(FileExtension(file_name))
-                                            : FindFormatInfo(file_type));
+    const auto row_codec =
+        RowSaveCodec(is_by_name ? FindFormatInfoByExtension(FileExtension(file_name))
+                                : FindFormatInfo(file_type));
     return row_codec ? RunSaveFile(*row_codec, file_name) : Fail();
 }
 

@@ -115,12 +115,8 @@ std::int64_t TZmBufferedReadStream::Seek(std::int64_t offset, TSeekOrigin origin
     }
     std::int64_t target = 0;
     switch (origin) {
-        case soBeginning:
-            target = AddSaturated(fRelativePosition, offset);
-            break;
-        case soCurrent:
-            target = AddSaturated(fPosition, offset);
-            break;
+        case soBeginning: target = AddSaturated(fRelativePosition, offset); break;
+        case soCurrent: target = AddSaturated(fPosition, offset); break;
         case soEnd:
             // Required: both signs count backwards; callers rely on either.
             target = AddSaturated(fSize, NegativeMagnitude(offset));

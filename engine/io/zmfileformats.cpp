@@ -34,8 +34,7 @@ const std::array kInternalRows{
     TInternalRow{ioTIFF, "TIFF Image", "TIFF;TIF;FAX;G3N;G3F;XIF", kReadWrite,
                  TPreviewParams(ppTIFF)},
     TInternalRow{ioGIF, "GIF Image", "GIF", kReadWrite, TPreviewParams(ppGIF)},
-    TInternalRow{ioJPEG, "JPEG Image", "JPEG;JPG;JPE;JIF;JFIF", kReadWrite,
-                 TPreviewParams(ppJPEG)},
+    TInternalRow{ioJPEG, "JPEG Image", "JPEG;JPG;JPE;JIF;JFIF", kReadWrite, TPreviewParams(ppJPEG)},
     TInternalRow{ioPCX, "PaintBrush", "PCX", kReadWrite, TPreviewParams(ppPCX)},
     TInternalRow{ioBMP, "Windows Bitmap", "BMP;DIB;RLE", kReadWrite, TPreviewParams(ppBMP)},
     TInternalRow{ioBMPRAW, "Raw Bitmap", "", kReadWrite, {}},
@@ -50,8 +49,7 @@ const std::array kInternalRows{
     TInternalRow{ioPXM, "Portable Pixmap", "PXM;PPM;PGM;PBM", kReadWrite, {}},
     TInternalRow{ioWBMP, "Wireless Bitmap", "WBMP", kReadWrite, {}},
     TInternalRow{ioJP2, "JPEG2000", "JP2", kReadWrite, TPreviewParams(ppJ2000)},
-    TInternalRow{ioJ2K, "JPEG2000 Code Stream", "J2K;JPC;J2C", kReadWrite,
-                 TPreviewParams(ppJ2000)},
+    TInternalRow{ioJ2K, "JPEG2000 Code Stream", "J2K;JPC;J2C", kReadWrite, TPreviewParams(ppJ2000)},
     TInternalRow{ioPS, "PostScript", "PS;EPS", kWriteOnly, {}},
     TInternalRow{ioPDF, "Adobe PDF", "PDF", kWriteOnly, {}},
     TInternalRow{ioDCX, "Multipage PCX", "DCX", kReadWrite, {}},
@@ -63,8 +61,11 @@ const std::array kInternalRows{
     TInternalRow{ioHDP, "Microsoft HD Photo", "WDP;HDP;JXR", kReadWrite | kNeedsPlatform, {}},
     TInternalRow{ioSVG, "Scalable Vector Graphics", "SVG", kWriteOnly, {}},
     TInternalRow{ioDDS, "DirectDraw Surface", "DDS", kReadWrite | kNeedsPlatform, {}},
-    TInternalRow{ioHEIF, "High Efficiency Image File", "HEIC;HEIF;HEICS;AVCS;HEIFS",
-                 kReadOnly | kNeedsPlatform, {}},
+    TInternalRow{ioHEIF,
+                 "High Efficiency Image File",
+                 "HEIC;HEIF;HEICS;AVCS;HEIFS",
+                 kReadOnly | kNeedsPlatform,
+                 {}},
     TInternalRow{ioWEBP, "WebP", "WEBP", kReadOnly | kNeedsPlatform, {}},
     TInternalRow{ioOtherWIC, "Other Windows Images", "", kReadOnly | kNeedsPlatform, {}},
 };
@@ -324,9 +325,9 @@ std::string FileFormatDefaultExtension(const TZmFileFormatInfo& row) {
 }
 
 const char* FileTypeName(std::int32_t file_type) {
-    static constexpr std::array kNames{"Unknown", "TIFF", "GIF", "JPEG", "PCX",       "BMP", "ICO",
-                                       "CUR",     "PNG",  "WMF", "EMF",  "TGA",       "PXM",
-                                       "JPEG 2000", "J2K", "AVI", "WBMP", "PS",       "PDF"};
+    static constexpr std::array kNames{"Unknown", "TIFF", "GIF",  "JPEG", "PCX", "BMP", "ICO",
+                                       "CUR",     "PNG",  "WMF",  "EMF",  "TGA", "PXM", "JPEG 2000",
+                                       "J2K",     "AVI",  "WBMP", "PS",   "PDF"};
     if (file_type < 0 || static_cast<std::size_t>(file_type) >= kNames.size()) {
         return kNames[0];
     }

@@ -53,8 +53,7 @@ constexpr TDetectTest kTests[] = {
 
 std::int32_t TypeBySignature(TDetectSource& source) {
     for (const TDetectTest& test : kTests) {
-        const bool size_fits =
-            test.size_above == kNoLimit || source.LimitSize() > test.size_above;
+        const bool size_fits = test.size_above == kNoLimit || source.LimitSize() > test.size_above;
         if (size_fits && test.holds(source)) {
             return test.type;
         }

@@ -15,9 +15,8 @@ namespace {
 
 bool StartsWith(std::span<const std::uint8_t> bytes, std::string_view text) {
     return bytes.size() >= text.size() &&
-           std::equal(text.begin(), text.end(), bytes.begin(), [](char a, std::uint8_t b) {
-               return static_cast<std::uint8_t>(a) == b;
-           });
+           std::equal(text.begin(), text.end(), bytes.begin(),
+                      [](char a, std::uint8_t b) { return static_cast<std::uint8_t>(a) == b; });
 }
 
 bool IsByteOrderMark(std::span<const std::uint8_t> bytes) {
@@ -27,7 +26,8 @@ bool IsByteOrderMark(std::span<const std::uint8_t> bytes) {
 }  // namespace
 
 TDetectSource::TDetectSource(TStream& stream)
-    : stream_(&stream), start_(stream.GetPosition()),
+    : stream_(&stream),
+      start_(stream.GetPosition()),
       size_(std::max<std::int64_t>(stream.GetSize() - start_, 0)) {}
 
 TDetectSource::~TDetectSource() {
@@ -150,10 +150,10 @@ bool IsTGA(TDetectSource& source) {
     const std::uint16_t width = header.U16LE();
     const std::uint16_t height = header.U16LE();
     const std::uint8_t depth = header.U8();
-    const bool known_type = (image_type >= 1 && image_type <= 3) ||
-                            (image_type >= 9 && image_type <= 11);
-    const bool known_depth = depth == 1 || depth == 4 || (depth % 8 == 0 && depth / 8 >= 1 &&
-                                                          depth / 8 <= 4);
+    const bool known_type =
+        (image_type >= 1 && image_type <= 3) || (image_type >= 9 && image_type <= 11);
+    const bool known_depth =
+        depth == 1 || depth == 4 || (depth % 8 == 0 && depth / 8 >= 1 && depth / 8 <= 4);
     if (header.HasFailed() || !known_type || !known_depth || color_map_type >= 2 || width == 0 ||
         height == 0) {
         return false;
@@ -329,8 +329,8 @@ bool IsPSD(TDetectSource& source) {
     header.Skip(8);
     const std::uint16_t depth = header.U16BE();
     const std::uint16_t mode = header.U16BE();
-    return !header.HasFailed() && (version == 1 || version == 2) && channels > 0 &&
-           channels < 25 && depth > 0 && depth < 17 && mode <= 9;
+    return !header.HasFailed() && (version == 1 || version == 2) && channels > 0 && channels < 25 &&
+           depth > 0 && depth < 17 && mode <= 9;
 }
 
 bool IsVectorObjects(TDetectSource& source, std::int64_t offset) {

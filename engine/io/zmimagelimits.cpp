@@ -28,8 +28,7 @@ TZmImageLimits& ZmImageLimits() {
 
 bool ImageSizeIsAcceptable(std::int64_t width, std::int64_t height, std::int32_t bits_per_pixel,
                            std::int64_t file_bytes) {
-    if (width < 1 || height < 1 || width > kMaxInt32 || height > kMaxInt32 ||
-        bits_per_pixel < 1) {
+    if (width < 1 || height < 1 || width > kMaxInt32 || height > kMaxInt32 || bits_per_pixel < 1) {
         return false;
     }
     const std::int64_t row_bytes = (width * bits_per_pixel + 7) / 8;

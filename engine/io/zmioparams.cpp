@@ -142,11 +142,11 @@ bool TIOParams::HasOtherTextMeta() const {
                            !fPNG_TextValues.empty() || !fPXM_Comments.empty();
     const bool has_wide = !fZMN_Description.empty() || !fWIC_CodecInfo.name.empty() ||
                           !fWIC_CodecInfo.author.empty() || !fWIC_CodecInfo.version.empty();
-    const std::array texts{&fTIFF_DocumentName, &fTIFF_ImageDescription, &fTIFF_PageName,
-                           &fTGA_Descriptor,    &fTGA_Author,            &fTGA_ImageName,
-                           &fPDF_Title,         &fPDF_Author,            &fPDF_Subject,
-                           &fPDF_Keywords,      &fPDF_Creator,           &fPDF_Producer,
-                           &fRAW_Camera};
+    const std::array texts{
+        &fTIFF_DocumentName, &fTIFF_ImageDescription, &fTIFF_PageName, &fTGA_Descriptor,
+        &fTGA_Author,        &fTGA_ImageName,         &fPDF_Title,     &fPDF_Author,
+        &fPDF_Subject,       &fPDF_Keywords,          &fPDF_Creator,   &fPDF_Producer,
+        &fRAW_Camera};
     const bool has_title = !fPS_Title.empty() && fPS_Title != DefaultPSTitle();
     return has_lists || has_wide || has_title ||
            std::any_of(texts.begin(), texts.end(),

@@ -89,8 +89,7 @@ bool TZmBitmap::Write(const std::u16string& file_name, TIOParams* params) {
     return Write(file_name, 0, params);
 }
 
-bool TZmBitmap::Write(const std::u16string& file_name, std::int32_t file_type,
-                      TIOParams* params) {
+bool TZmBitmap::Write(const std::u16string& file_name, std::int32_t file_type, TIOParams* params) {
     const auto driver = MakeWriter(*this, params);
     driver->SaveToFile(file_name, file_type);
     fFilename = file_name;

@@ -36,6 +36,12 @@ std::unique_ptr<TFileHandle> CreateTemporaryBeside(const std::u16string& target_
                                                    std::u16string& temporary_name,
                                                    std::string& error_text);
 
+/// Creates or empties a file that goes with its handle: where the system can do so even when
+/// the process dies. Others may read it meanwhile. Nil on failure, also when the name stands for
+/// anything but a plain file.
+std::unique_ptr<TFileHandle> CreateDeletingFile(const std::u16string& name,
+                                                std::string& error_text);
+
 /// What a name stands for; links are followed.
 enum TFileKind : std::uint8_t { fkNone, fkRegular, fkFolder, fkOther };
 TFileKind GetFileKind(const std::u16string& name);

@@ -152,7 +152,8 @@ std::int32_t TNeuralPalette::Contest(std::int32_t b, std::int32_t g, std::int32_
     const std::int32_t* __restrict red = red_.data();
     std::int32_t* __restrict freq = freq_.data();
     std::int32_t* __restrict bias = bias_.data();
-    for (std::int32_t i = 0; i < count_; ++i) {
+    const std::int32_t count = count_;  // a local, which the stores cannot touch
+    for (std::int32_t i = 0; i < count; ++i) {
         const std::int32_t distance =
             std::abs(blue[i] - b) + std::abs(green[i] - g) + std::abs(red[i] - r);
         closest = std::min(closest, distance * kIndexFactor + i);

@@ -156,7 +156,7 @@ public:
                   bool maintain_aspect_ratio);
     /// Both sides times `scale_by`, rounded; a factor that is not above 0 does nothing.
     void Resample(double scale_by, TResampleFilter filter);
-    /// Writes the resized image to `target` and leaves the attached bitmap as it is. A size
+    /// Writes the resized image to `target`, another bitmap, and leaves the attached one. A size
     /// without room leaves `target` empty.
     void ResampleTo(TZmBitmap* target, std::int32_t new_width, std::int32_t new_height,
                     TResampleFilter filter, bool maintain_aspect_ratio);

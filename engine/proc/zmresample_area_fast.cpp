@@ -143,7 +143,8 @@ void TFastAxis::AddTap(std::int32_t index, double weight) {
         return;
     }
     if (taps_.size() > tap_starts_.back() && taps_.back().index == index) {
-        taps_.back().weight = static_cast<float>(static_cast<double>(taps_.back().weight) + weight);
+        const double joined = static_cast<double>(taps_.back().weight) + weight;
+        taps_.back().weight = static_cast<float>(joined);
     } else {
         taps_.push_back(TAxisTap{index, static_cast<float>(weight)});
     }
@@ -161,9 +162,13 @@ void TFastAxis::EndPixel() {
 }
 
 /// How far a single-precision result can lie from the stated one, in steps of a sample; 0 when
-/// they are the same.
+/// they are the same. More than 1 when the result could leave the range of a sample by so much
+/// that rounding does not bring it back (extreme ratios, where the slack of the borders counts).
 double TieMargin(const TFastAxis& columns, const TFastAxis& rows, double scale) {
     const double largest = 255 * columns.WeightSum() * rows.WeightSum();
+    if (largest * scale > 255.3) {
+        return 2;
+    }
     const int bits = columns.ExactBits() + rows.ExactBits();
     int exponent = 0;
     const bool scale_is_exact = std::frexp(scale, &exponent) == 0.5;
@@ -209,14 +214,14 @@ inline float RoundSample(float value) {
     return (value + kShift) - kShift;
 }
 
-/// Writes rounded samples; true when one lies within the margin of a tie.
+/// Writes rounded samples; true when one lies within the margin of a tie. No value is far enough
+/// outside 0 to 255 to round to anything else.
 bool RoundSamples(const float* __restrict values, std::uint8_t* __restrict out,
                   std::size_t count, float tie_start) {
     unsigned near_tie = 0;
     for (std::size_t i = 0; i < count; ++i) {
-        const float value = std::min(std::max(values[i], 0.0f), 255.0f);
-        const float rounded = RoundSample(value);
-        near_tie |= static_cast<unsigned>(std::fabs(value - rounded) > tie_start);
+        const float rounded = RoundSample(values[i]);
+        near_tie |= static_cast<unsigned>(std::fabs(values[i] - rounded) > tie_start);
         out[i] = static_cast<std::uint8_t>(static_cast<std::int32_t>(rounded));
     }
     return near_tie != 0;
@@ -323,9 +328,8 @@ template <std::size_t kChannels>
 void TFastArea<kChannels>::CollectTies(std::size_t first, std::size_t end) {
     const auto tie_start = static_cast<float>(0.5 - margin_);
     for (std::size_t i = first; i < end; ++i) {
-        const float value = std::min(std::max(values_[i], 0.0f), 255.0f);
         const std::size_t pixel = i / kChannels;
-        if (std::fabs(value - RoundSample(value)) > tie_start &&
+        if (std::fabs(values_[i] - RoundSample(values_[i])) > tie_start &&
             (ties_.empty() || ties_.back() != pixel)) {
             ties_.push_back(pixel);
         }

@@ -218,6 +218,12 @@ TEST(BmpReader, OneBitFollowsTheOrderOfBlackAndWhite) {
         EXPECT_EQ(plain.bitmap.GetPixels_zm1g(x, 0), expected[x]) << x;
         EXPECT_EQ(inverted.bitmap.GetPixels_zm1g(x, 0), !expected[x]) << x;
     }
+    // A third entry, never used, tells that the two are no black and white picture's.
+    TReadResult three;
+    Read(Join({MakeHeader({.width = 10, .height = 1, .bits = 1, .colors_used = 3}), white_black,
+               Dword(0), row}),
+         three);
+    EXPECT_TRUE(three.bitmap.GetPixels_zm1g(0, 0));
 }
 
 TEST(BmpReader, PaletteImagesBecomeColoursOrStayIndices) {

@@ -19,13 +19,13 @@ namespace {
 
 using TBytes = std::vector<std::uint8_t>;
 
-// A stream that takes `room` bytes and no more; writing over earlier bytes is free.
+// A stream that takes `room` bytes in all and no more.
 class TFullDiskStream : public TMemoryStream {
 public:
     explicit TFullDiskStream(std::int64_t room) : room_(room) {}
     std::int32_t Write(const void* buffer, std::int32_t count) override {
-        const std::int64_t left = std::max<std::int64_t>(room_ - GetPosition(), 0);
-        const auto taken = static_cast<std::int32_t>(std::min<std::int64_t>(left, count));
+        const auto taken = static_cast<std::int32_t>(std::min<std::int64_t>(room_, count));
+        room_ -= taken;
         return taken > 0 ? TMemoryStream::Write(buffer, taken) : 0;
     }
 
@@ -131,6 +131,7 @@ TEST(BmpWriter, WritesOneBit) {
         bits.SetPixels_zm1g(x, 0, x % 2 == 0);  // 1010101010
         bits.SetPixels_zm1g(x, 1, true);
     }
+    bits.GetScanLine(1)[1] |= 0x3F;  // bits behind the last pixel do not go to the file
     TIOParams params;
     params.UpdateBPSAndSPP(zm1g);
     const TBytes file = Write(bits, params);
@@ -314,9 +315,10 @@ TEST(BmpWriter, ShortWritesFail) {
     TZmBitmap bitmap;
     MakeFourColors(bitmap);
     TIOParams params;
-    for (std::int64_t room = 0; room <= 70; ++room) {
+    constexpr std::int64_t kAllBytes = 70 + 54;  // the headers are written twice
+    for (std::int64_t room = 0; room <= kAllBytes; ++room) {
         TFullDiskStream stream(room);
-        EXPECT_EQ(WriteTo(stream, bitmap, params), room == 70) << room;
+        EXPECT_EQ(WriteTo(stream, bitmap, params), room == kAllBytes) << room;
     }
 }
 

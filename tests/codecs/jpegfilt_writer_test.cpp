@@ -44,7 +44,9 @@ TRGB RawColor(const TRawJpeg& raw, int x, int y) {
     if (raw.components == 3) {
         return TRGB{pixel[2], pixel[1], pixel[0]};
     }
-    const auto mix = [pixel](int i) { return static_cast<std::uint8_t>(pixel[3] * pixel[i] / 255); };
+    const auto mix = [pixel](int i) {
+        return static_cast<std::uint8_t>(pixel[3] * pixel[i] / 255);
+    };
     return TRGB{mix(2), mix(1), mix(0)};
 }
 

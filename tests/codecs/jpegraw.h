@@ -134,7 +134,8 @@ inline std::vector<std::uint8_t> EncodeRawJpeg(const TRawSettings& settings) {
                                : settings.input == JCS_CMYK    ? 4
                                                                : 3;
     encoder.in_color_space = settings.input;
-    std::vector<std::uint8_t> row(static_cast<std::size_t>(settings.width * encoder.input_components));
+    std::vector<std::uint8_t> row(
+        static_cast<std::size_t>(settings.width * encoder.input_components));
     if (setjmp(error.jump) != 0) {
         jpeg_destroy_compress(&encoder);
         return {};

@@ -218,8 +218,8 @@ TEST(PngWriter, AlphaMaskMakesRgba) {
         ExpectRawColors(raw, *bitmap);
         for (std::int32_t y = 0; y < 7; ++y) {
             for (std::int32_t x = 0; x < 9; ++x) {
-                ASSERT_EQ(raw.rows[static_cast<std::size_t>(y)][static_cast<std::size_t>(x * 4 + 3)],
-                          bitmap->GetAlpha(x, y));
+                const TBytes& row = raw.rows[static_cast<std::size_t>(y)];
+                ASSERT_EQ(row[static_cast<std::size_t>(x * 4 + 3)], bitmap->GetAlpha(x, y));
             }
         }
     }
@@ -292,7 +292,8 @@ TBytes FilterBytes(const TBytes& file, std::size_t row_bytes, std::size_t rows) 
     }
     TBytes raw((row_bytes + 1) * rows);
     uLongf size = static_cast<uLongf>(raw.size());
-    EXPECT_EQ(uncompress(raw.data(), &size, packed.data(), static_cast<uLong>(packed.size())), Z_OK);
+    EXPECT_EQ(uncompress(raw.data(), &size, packed.data(), static_cast<uLong>(packed.size())),
+              Z_OK);
     TBytes filters;
     for (std::size_t row = 0; row < rows; ++row) {
         filters.push_back(raw[row * (row_bytes + 1)]);

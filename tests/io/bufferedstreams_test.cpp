@@ -35,13 +35,11 @@ public:
 /// A source that gives at most three bytes a call, and stops early.
 class TMeanStream : public TMemoryStream {
 public:
-    explicit TMeanStream(std::int64_t end)
-        : TMemoryStream(CountingBytes(100)), end_(end) {}
+    explicit TMeanStream(std::int64_t end) : TMemoryStream(CountingBytes(100)), end_(end) {}
     std::int32_t Read(void* buffer, std::int32_t count) override {
         const std::int64_t left = std::max<std::int64_t>(end_ - GetPosition(), 0);
-        return TMemoryStream::Read(buffer,
-                                   static_cast<std::int32_t>(std::min<std::int64_t>(
-                                       std::min(count, 3), left)));
+        return TMemoryStream::Read(
+            buffer, static_cast<std::int32_t>(std::min<std::int64_t>(std::min(count, 3), left)));
     }
 
 private:

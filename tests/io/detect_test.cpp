@@ -3,6 +3,8 @@
 #include <gtest/gtest.h>
 
 #include <algorithm>
+#include <map>
+#include <set>
 #include <string>
 #include <vector>
 
@@ -50,7 +52,7 @@ TBytes IconDirectory(unsigned type_word, std::uint32_t image_offset) {
 
 TBytes Targa() {
     TBytes bytes(18);
-    bytes[2] = 2;       // true colour
+    bytes[2] = 2;  // true colour
     PutWord(bytes, 12, 1);
     PutWord(bytes, 14, 1);
     bytes[16] = 24;
@@ -158,9 +160,14 @@ INSTANTIATE_TEST_SUITE_P(
         TCase{"png", Padded("\x89PNG", 9), 3, 'g', ioPNG},
         TCase{"dicom", Joined(TBytes(128), {'D', 'I', 'C', 'M'}), 131, 'm', ioDICOM},
         TCase{"icon", IconDirectory(1, 22), 18, 21, ioICO},
-        TCase{"cursor", IconDirectory(2, 22), 9, 1, ioCUR},
-        TCase{"targa", Targa(), 16, 15, ioTGA},
-        TCase{"targa of type 11", [] { TBytes b = Targa(); b[2] = 11; return b; }(), 2, 12, ioTGA},
+        TCase{"cursor", IconDirectory(2, 22), 9, 1, ioCUR}, TCase{"targa", Targa(), 16, 15, ioTGA},
+        TCase{"targa of type 11",
+              [] {
+                  TBytes b = Targa();
+                  b[2] = 11;
+                  return b;
+              }(),
+              2, 12, ioTGA},
         TCase{"pixmap", Padded("P6 1 1", 6), 1, '7', ioPXM},
         TCase{"pixmap with comment", Padded("#x P1\nP4\n# 0\r8 2", 16), 7, '7', ioPXM},
         TCase{"jp2", {0, 0, 0, 12, 0x6A, 0x50, 0x20, 0x20, 0x0D, 0x0A, 0x87, 0x0A}, 3, 11, ioJP2},
@@ -169,8 +176,7 @@ INSTANTIATE_TEST_SUITE_P(
         TCase{"dcx", MultiPagePcx(), 4, 8, ioDCX},
         TCase{"wmf", Joined(MetafileHeader(), {0, 0}), 16, 1, ioWMF},
         TCase{"placeable wmf", PlaceableMetafile(), 38, 1, ioWMF},
-        TCase{"emf", EnhancedMetafile(), 40, 0, ioEMF},
-        TCase{"psd", Photoshop(), 13, 25, ioPSD},
+        TCase{"emf", EnhancedMetafile(), 40, 0, ioEMF}, TCase{"psd", Photoshop(), 13, 25, ioPSD},
         TCase{"vectors", {'Z', 'M', 'V', 49}, 3, 48, ioZMV},
         TCase{"layers", Layers(), 13, 0, ioLYR},
         TCase{"layers and vectors", LayersAndVectors(), 32, 88, ioALL},
@@ -184,13 +190,17 @@ TEST(DetectionDetails, JpegIsFoundAmongTheFirst150PositionsOnly) {
 TEST(DetectionDetails, RawSignaturesSkipTheJpegScan) {
     // Place and text of each signature, in 17 bytes with a JPEG behind them.
     const std::vector<std::vector<std::pair<std::size_t, std::string>>> signatures{
-        {{0, "IIRO"}}, {{0, "MMOR"}}, {{0, "IIRS"}}, {{0, "FUJIFILM"}}, {{1, "MRM"}},
-        {{0, "II"}, {8, "CR"}}, {{0, "MM"}, {6, "H"}, {11, "CDR"}}};
+        {{0, "IIRO"}},
+        {{0, "MMOR"}},
+        {{0, "IIRS"}},
+        {{0, "FUJIFILM"}},
+        {{1, "MRM"}},
+        {{0, "II"}, {8, "CR"}},
+        {{0, "MM"}, {6, "H"}, {11, "CDR"}}};
     for (const auto& signature : signatures) {
         TBytes bytes(17);
         for (const auto& [place, text] : signature) {
-            std::copy(text.begin(), text.end(),
-                      bytes.begin() + static_cast<std::ptrdiff_t>(place));
+            std::copy(text.begin(), text.end(), bytes.begin() + static_cast<std::ptrdiff_t>(place));
         }
         bytes = Joined(bytes, JunkBeforeJpeg(0));
         EXPECT_EQ(0, Detect(bytes)) << signature[0].second;
@@ -253,8 +263,8 @@ public:
     std::int32_t Read(void* buffer, std::int32_t count) override {
         const auto there = static_cast<std::int64_t>(Bytes().size());
         const std::int64_t left = std::max<std::int64_t>(there - GetPosition(), 0);
-        return TMemoryStream::Read(
-            buffer, static_cast<std::int32_t>(std::min<std::int64_t>(count, left)));
+        return TMemoryStream::Read(buffer,
+                                   static_cast<std::int32_t>(std::min<std::int64_t>(count, left)));
     }
 
 private:
@@ -358,6 +368,29 @@ TEST_F(DetectionOfFiles, ReconcilesNameAndContent) {
         EXPECT_EQ(row.else_extension, Find(row.name, *row.bytes, zmfmContentElseExtension))
             << row.name;
     }
+}
+
+TEST(DetectionOfSamples, RealFilesAreOfTheirFormat) {
+    const std::vector<test::CorpusEntry> entries = test::CorpusEntries();
+    if (entries.empty()) {
+        GTEST_SKIP() << "the folder of sample files is not there";
+    }
+    const std::map<std::string, std::set<std::int32_t>> types{
+        {"bmp", {ioBMP}},       {"png", {ioPNG}},        {"jpeg", {ioJPEG}},
+        {"gif", {ioGIF}},       {"dicom", {ioDICOM}},    {"pnm", {ioPXM}},
+        {"tga", {ioTGA}},       {"ico", {ioICO, ioCUR}}, {"pcx", {ioPCX, ioDCX}},
+        {"jp2", {ioJP2, ioJ2K}}};
+    std::size_t tested = 0;
+    for (const test::CorpusEntry& entry : entries) {
+        const auto expected = types.find(entry.format);
+        if (expected == types.end()) {
+            continue;
+        }
+        ++tested;
+        const std::int32_t type = FindFileFormat(test::EngineName(entry.path), zmfmContentOnly);
+        EXPECT_TRUE(expected->second.contains(type)) << entry.path << " gave " << type;
+    }
+    EXPECT_GT(tested, 200u);
 }
 
 TEST_F(DetectionOfFiles, MissingFilesHaveNoType) {

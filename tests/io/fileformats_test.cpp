@@ -32,12 +32,12 @@ TEST_F(FileFormats, RowsStandInTheirOrderWithTheirAbilities) {
         std::uint32_t page_bits;
     };
     const std::vector<TRow> expected{
-        {1, "RW", 1u << 3}, {2, "RW", 1u << 4}, {3, "RW", 1u << 2}, {4, "RW", 1u << 6},
-        {5, "RW", 1u << 5}, {21, "RW", 0},      {6, "RW", 0},       {7, "R", 0},
-        {8, "RW", 1u << 7}, {28, "RW", 0},      {9, "R", 0},        {10, "R", 0},
-        {11, "RW", 1u << 8}, {12, "RW", 0},     {16, "RW", 0},      {13, "RW", 1u << 9},
-        {14, "RW", 1u << 9}, {17, "W", 0},      {18, "W", 0},       {19, "RW", 0},
-        {20, "R", 0},        {24, "RW", 0},     {25, "RW", 0},      {27, "RW", 0},
+        {1, "RW", 1u << 3},  {2, "RW", 1u << 4}, {3, "RW", 1u << 2}, {4, "RW", 1u << 6},
+        {5, "RW", 1u << 5},  {21, "RW", 0},      {6, "RW", 0},       {7, "R", 0},
+        {8, "RW", 1u << 7},  {28, "RW", 0},      {9, "R", 0},        {10, "R", 0},
+        {11, "RW", 1u << 8}, {12, "RW", 0},      {16, "RW", 0},      {13, "RW", 1u << 9},
+        {14, "RW", 1u << 9}, {17, "W", 0},       {18, "W", 0},       {19, "RW", 0},
+        {20, "R", 0},        {24, "RW", 0},      {25, "RW", 0},      {27, "RW", 0},
         {26, "RW", 0},       {31, "W", 0}};
     const auto& rows = ZmGlobalSettings().fFileFormats;
     ASSERT_EQ(expected.size(), rows.size());
@@ -57,12 +57,12 @@ TEST_F(FileFormats, FindsRowsByExtension) {
         std::u16string extension;
         std::int32_t type;
     };
-    const std::vector<TCase> cases{
-        {u".JPG", ioJPEG}, {u"jpe", ioJPEG}, {u".xif", ioTIFF}, {u".pix", ioTGA},
-        {u".win", 0},      {u".Dib", ioBMP}, {u".v2", ioDICOM}, {u".zalmo", ioLYR},
-        {u".srw", ioRAW},  {u".3fr", ioRAW}, {u"", 0},          {u".", 0},
-        {u"..jpg", 0},     {u".mpeg", ioMPEG}, {u".wmv", ioWMV}, {u".avi", 0},
-        {u".wdp", 0},      {u".\u0130", 0}};
+    const std::vector<TCase> cases{{u".JPG", ioJPEG}, {u"jpe", ioJPEG},   {u".xif", ioTIFF},
+                                   {u".pix", ioTGA},  {u".win", 0},       {u".Dib", ioBMP},
+                                   {u".v2", ioDICOM}, {u".zalmo", ioLYR}, {u".srw", ioRAW},
+                                   {u".3fr", ioRAW},  {u"", 0},           {u".", 0},
+                                   {u"..jpg", 0},     {u".mpeg", ioMPEG}, {u".wmv", ioWMV},
+                                   {u".avi", 0},      {u".wdp", 0},       {u".\u0130", 0}};
     for (const TCase& c : cases) {
         EXPECT_EQ(c.type, ExtensionToFileType(c.extension)) << ::testing::PrintToString(c.type);
     }
@@ -126,10 +126,10 @@ TEST_F(FileFormats, SavesByAChainOfItsOwn) {
         std::int32_t type;
     };
     const std::vector<TCase> cases{
-        {u"a.jif", ioJPEG}, {u"a.WIN", ioTGA},  {u"a.pix", 0},      {u"a.xif", 0},
+        {u"a.jif", ioJPEG}, {u"a.WIN", ioTGA},   {u"a.pix", 0},       {u"a.xif", 0},
         {u"a.g3n", ioTIFF}, {u"a.heic", ioHEIF}, {u"a.webp", ioWEBP}, {u"a.wdp", ioHDP},
-        {u"a.epdf", ioPDF}, {u"a.eps", ioPS},   {u"a.nef", ioRAW},  {u"a.zmn", ioLYR},
-        {u"a.avi", 0},      {u"a", 0},          {u"dir.png/a", 0},  {u"a.svg", ioSVG}};
+        {u"a.epdf", ioPDF}, {u"a.eps", ioPS},    {u"a.nef", ioRAW},   {u"a.zmn", ioLYR},
+        {u"a.avi", 0},      {u"a", 0},           {u"dir.png/a", 0},   {u"a.svg", ioSVG}};
     for (const TCase& c : cases) {
         EXPECT_EQ(c.type, SaveExtensionToFileType(c.name)) << c.type;
     }

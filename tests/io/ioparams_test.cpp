@@ -6,10 +6,10 @@
 #include <vector>
 
 #include "engine/bitmap/zmxBitmaps.h"
+#include "engine/foundation/zmsettings.h"
 #include "engine/io/zmbytereader.h"
 #include "engine/io/zmimagelimits.h"
 #include "engine/io/zmprogress.h"
-#include "engine/foundation/zmsettings.h"
 
 namespace zm {
 namespace {
@@ -72,9 +72,9 @@ TEST_F(IOParams, SettersWriteTheFieldsOfTheFormatsToo) {
     EXPECT_EQ(96, params.fEXIF_XResolution);
     EXPECT_EQ(97, params.fEXIF_YResolution);
     params.SetImageIndex(4);
-    for (const std::int32_t index : {params.fTIFF_ImageIndex, params.fDCX_ImageIndex,
-                                     params.fGIF_ImageIndex, params.fICO_ImageIndex,
-                                     params.fCUR_ImageIndex}) {
+    for (const std::int32_t index :
+         {params.fTIFF_ImageIndex, params.fDCX_ImageIndex, params.fGIF_ImageIndex,
+          params.fICO_ImageIndex, params.fCUR_ImageIndex}) {
         EXPECT_EQ(4, index);
     }
     params.SetImageCount(6);
@@ -192,9 +192,9 @@ TEST_F(IOParams, DepthAndChannelsFollowTheFormat) {
         std::int32_t bits;
         std::int32_t samples;
     };
-    for (const TRow& row : {TRow{zm1g, 1, 1}, TRow{zm8p, 8, 1}, TRow{zm16g, 16, 1},
-                            TRow{zm24RGB, 8, 3}, TRow{zm32f, 32, 1}, TRow{zmCMYK, 8, 4},
-                            TRow{zm48RGB, 16, 3}, TRow{zmCIELab, 8, 3}}) {
+    for (const TRow& row :
+         {TRow{zm1g, 1, 1}, TRow{zm8p, 8, 1}, TRow{zm16g, 16, 1}, TRow{zm24RGB, 8, 3},
+          TRow{zm32f, 32, 1}, TRow{zmCMYK, 8, 4}, TRow{zm48RGB, 16, 3}, TRow{zmCIELab, 8, 3}}) {
         TIOParams params;
         params.UpdateBPSAndSPP(row.format);
         EXPECT_EQ(row.bits, params.fBitsPerSample) << row.format;
@@ -281,18 +281,17 @@ TEST(ImageLimits, GrowWithTheFileAndCatchOverflow) {
         bool acceptable;
     };
     constexpr std::int64_t kMost32 = 2147483647;
-    for (const TRow& row : {TRow{1, 1, 1, 0, true}, TRow{0, 1, 24, 100, false},
-                            TRow{1, -1, 24, 100, false}, TRow{1, 1, 0, 100, false},
-                            TRow{16384, 32768, 8, 0, true},      // 512 MiB
-                            TRow{16384, 32769, 8, 0, false},     // one row more
-                            TRow{16384, 32769, 8, 14, false},    // 15,400 bytes more
-                            TRow{16384, 32769, 8, 15, true},     // 16,500 bytes more
-                            TRow{kMost32, 1, 8, kMost32, sizeof(void*) > 4},
-                            TRow{kMost32, 1, 9, kMost32, false},
-                            TRow{kMost32 + 1, 1, 1, kMost32, false},
-                            TRow{1, kMost32, 8, std::int64_t{1} << 62, sizeof(void*) > 4},
-                            TRow{kMost32, kMost32, 64, std::int64_t{1} << 62, false},
-                            TRow{16384, 32769, 8, -5, false}}) {
+    for (const TRow& row :
+         {TRow{1, 1, 1, 0, true}, TRow{0, 1, 24, 100, false}, TRow{1, -1, 24, 100, false},
+          TRow{1, 1, 0, 100, false}, TRow{16384, 32768, 8, 0, true},  // 512 MiB
+          TRow{16384, 32769, 8, 0, false},                            // one row more
+          TRow{16384, 32769, 8, 14, false},                           // 15,400 bytes more
+          TRow{16384, 32769, 8, 15, true},                            // 16,500 bytes more
+          TRow{kMost32, 1, 8, kMost32, sizeof(void*) > 4}, TRow{kMost32, 1, 9, kMost32, false},
+          TRow{kMost32 + 1, 1, 1, kMost32, false},
+          TRow{1, kMost32, 8, std::int64_t{1} << 62, sizeof(void*) > 4},
+          TRow{kMost32, kMost32, 64, std::int64_t{1} << 62, false},
+          TRow{16384, 32769, 8, -5, false}}) {
         EXPECT_EQ(row.acceptable,
                   ImageSizeIsAcceptable(row.width, row.height, row.bits, row.file_bytes))
             << row.width << " x " << row.height << " x " << row.bits;

@@ -30,8 +30,8 @@ protected:
         return plugin.caller->Exec(action, text, task);
     }
     /// Makes a picture file and opens it as the job's image.
-    std::unique_ptr<TZmBitmap> Open(TZmPixelFormat format, std::int32_t width,
-                                    std::int32_t height, std::uint32_t task = 1) {
+    std::unique_ptr<TZmBitmap> Open(TZmPixelFormat format, std::int32_t width, std::int32_t height,
+                                    std::uint32_t task = 1) {
         auto picture = MakeGradient(format, width, height);
         const std::u16string name = folder.Name("open" + std::to_string(task) + ".bmp");
         EXPECT_TRUE(picture->Write(name, ioBMP, nullptr));
@@ -110,8 +110,8 @@ TEST_F(ActionsTest, SaveReportsWhatFailed) {
     ExpectReported(5, u"Cannot copy image to clipboard");
     for (const char16_t* format : {u"7", u"-1", u"2147483647"}) {
         const std::u16string name = folder.Name("x.bmp");
-        EXPECT_FALSE(Exec(gaSaveImage, std::u16string(u"format=") + format + u"\r\nimage_file=" +
-                                           name));
+        EXPECT_FALSE(
+            Exec(gaSaveImage, std::u16string(u"format=") + format + u"\r\nimage_file=" + name));
         ExpectReported(5, u"Cannot save image file to \"" + name + u"\"");
     }
     EXPECT_EQ(ListFolder(folder.Path()), (std::vector<std::string>{"open1.bmp"}));
@@ -123,11 +123,13 @@ TEST_F(ActionsTest, TheSavedTypeFollowsTheFormatNotTheName) {
         const char16_t* format;
         std::vector<std::uint8_t> signature;
     };
-    const TCase cases[] = {{u"0", {0xFF, 0xD8}}, {u"1", {0x89, 'P', 'N', 'G'}}, {u"3", {'B', 'M'}},
+    const TCase cases[] = {{u"0", {0xFF, 0xD8}},
+                           {u"1", {0x89, 'P', 'N', 'G'}},
+                           {u"3", {'B', 'M'}},
                            {u"abc", {0xFF, 0xD8}}};
     for (const TCase& row : cases) {
-        ASSERT_TRUE(Exec(gaSaveImage, u"image_file=" + folder.Name("out.txt") + u"\r\nformat=" +
-                                          row.format));
+        ASSERT_TRUE(Exec(gaSaveImage,
+                         u"image_file=" + folder.Name("out.txt") + u"\r\nformat=" + row.format));
         std::vector<std::uint8_t> bytes = ReadFileBytes(folder.File("out.txt"));
         bytes.resize(row.signature.size());
         EXPECT_EQ(bytes, row.signature);
@@ -214,12 +216,11 @@ TEST_F(ActionsTest, ResizeCallsTheEngineWithTheStatedNumbers) {
 
 TEST_F(ActionsTest, ResizeRefusesSilentlyWhenTheProductIsNotAboveZero) {
     Open(zm24RGB, 6, 6);
-    for (const char16_t* text :
-         {u"", u"image_w=5", u"image_w=0\r\nimage_h=5", u"image_w=-5\r\nimage_h=5",
-          u"image_w=abc\r\nimage_h=5",
-          u"image_w=65536\r\nimage_h=65536",  // 2^32: 0 in 32 bits
-          u"image_w=65536\r\nimage_h=32768",  // 2^31: negative in 32 bits
-          u"image_w=99999999999\r\nimage_h=5"}) {
+    for (const char16_t* text : {u"", u"image_w=5", u"image_w=0\r\nimage_h=5",
+                                 u"image_w=-5\r\nimage_h=5", u"image_w=abc\r\nimage_h=5",
+                                 u"image_w=65536\r\nimage_h=65536",  // 2^32: 0 in 32 bits
+                                 u"image_w=65536\r\nimage_h=32768",  // 2^31: negative in 32 bits
+                                 u"image_w=99999999999\r\nimage_h=5"}) {
         EXPECT_FALSE(Exec(gaResizeImage, text)) << Utf8FromUtf16(text);
     }
     ExpectNothingReported();
@@ -263,8 +264,7 @@ TEST_F(ActionsTest, CropRefusesAnEmptyRectangle) {
     Open(zm24RGB, 20, 10);
     for (const char16_t* text :
          {u"", u"l=5\r\nr=5\r\nb=5", u"l=6\r\nr=5\r\nb=5", u"r=20", u"r=20\r\nb={none}",
-          u"l=2147483647\r\nr=-2147483648\r\nb=5",
-          u"r=-2147483648\r\nur=1\r\nb=5"}) {
+          u"l=2147483647\r\nr=-2147483648\r\nb=5", u"r=-2147483648\r\nur=1\r\nb=5"}) {
         EXPECT_FALSE(Exec(gaCropImage, text)) << Utf8FromUtf16(text);
         ExpectReported(2, u"Invalid values");
     }
@@ -298,10 +298,10 @@ TEST_F(ActionsTest, AddBorderOfZeroWidthSucceedsWithoutAChange) {
 TEST_F(ActionsTest, BordersBeyondAllMemoryFailAndLeaveTheImage) {
     auto picture = Open(zm24RGB, 20, 10);
     const std::u16string huge = u"2147483647";
-    EXPECT_FALSE(Exec(gaAddBorder, u"l=" + huge + u"\r\nt=" + huge + u"\r\nr=" + huge +
-                                       u"\r\nb=" + huge));
-    EXPECT_FALSE(Exec(gaCropImage, u"l=-" + huge + u"\r\nt=-" + huge + u"\r\nr=" + huge +
-                                       u"\r\nb=" + huge));
+    EXPECT_FALSE(
+        Exec(gaAddBorder, u"l=" + huge + u"\r\nt=" + huge + u"\r\nr=" + huge + u"\r\nb=" + huge));
+    EXPECT_FALSE(
+        Exec(gaCropImage, u"l=-" + huge + u"\r\nt=-" + huge + u"\r\nr=" + huge + u"\r\nb=" + huge));
     ExpectSamePixels(*picture, *Image());
 }
 

@@ -30,13 +30,12 @@ protected:
     /// A handler of another compiler runs no destructors of ours, so the step lives outside.
     TForeignCatch ExecCatching(std::int32_t action, const std::u16string& text) {
         TTestStep step(Host(), text, kTask);
-        return CatchAsForeignHost(
-            [&] { Caller().Actions().ExecAction(action, &step.params); });
+        return CatchAsForeignHost([&] { Caller().Actions().ExecAction(action, &step.params); });
     }
     /// Saves into a folder that does not exist, which the stream answers with an exception.
     TForeignCatch SaveToMissingFolder() {
-        return ExecCatching(gaSaveImage, u"format=3\r\nimage_file=" + folder.Name("missing") +
-                                             u"/out.bmp");
+        return ExecCatching(gaSaveImage,
+                            u"format=3\r\nimage_file=" + folder.Name("missing") + u"/out.bmp");
     }
 
     TempFolder folder;
@@ -56,8 +55,8 @@ TEST_F(BoundaryTest, TheHostAndTheJobGoOnAfterwards) {
     for (int attempt = 0; attempt < 20; ++attempt) {
         ASSERT_TRUE(SaveToMissingFolder().exception_came);
     }
-    EXPECT_TRUE(Caller().Exec(gaSaveImage, u"format=3\r\nimage_file=" + folder.Name("ok.bmp"),
-                              kTask));
+    EXPECT_TRUE(
+        Caller().Exec(gaSaveImage, u"format=3\r\nimage_file=" + folder.Name("ok.bmp"), kTask));
     EXPECT_EQ(ListFolder(folder.Path()), (std::vector<std::string>{"in.bmp", "ok.bmp"}));
     EXPECT_EQ(Host().HeapFaults(), 0);
 }

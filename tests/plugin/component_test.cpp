@@ -178,8 +178,8 @@ TEST_F(ComponentTest, EachEventFunctionRunsItsOwnHandler) {
     events.StopEvent(0, &params);
     events.DeleteEvent(0, &params);
     events.DuplicateEvent(0, &params);
-    EXPECT_EQ(ran, (std::vector<std::string>{"config3", "start3", "stop3", "delete3",
-                                             "duplicate3"}));
+    EXPECT_EQ(ran,
+              (std::vector<std::string>{"config3", "start3", "stop3", "delete3", "duplicate3"}));
     char16_t buffer[kDescriptionBufferLength];
     events.EventDescr(0, &params, buffer);
     EXPECT_EQ(std::u16string(buffer), u"New Event!");
@@ -245,8 +245,8 @@ TEST_F(ComponentTest, HostWindowAnswersScaleAndSettings) {
     ReadPluginSettings(settings, *plugin);
     EXPECT_EQ(settings.RegKey, u"");
 
-    constexpr std::int32_t kScales[][2] = {{99, 100}, {100, 100}, {125, 125}, {250, 250},
-                                           {251, 100}, {-1, 100}, {0, 100}};
+    constexpr std::int32_t kScales[][2] = {{99, 100},  {100, 100}, {125, 125}, {250, 250},
+                                           {251, 100}, {-1, 100},  {0, 100}};
     for (const auto& row : kScales) {
         scale = row[0];
         EXPECT_EQ(plugin->DefaultScale(), row[1]);
@@ -279,10 +279,10 @@ TEST(VersionCompare, FieldsByFields) {
         std::int32_t expected;
     };
     constexpr TCase kCases[] = {
-        {u"8.3", u"8.3.0.0", 0},       {u"8-3", u"8.3", 0},        {u"8..3", u"8.0.3", 0},
-        {u"8.2.99.99", u"8.3", -1},    {u"10", u"8.3", 1},         {u"", u"0.0.0.0", 0},
-        {u"8.3.0.0.9", u"8.3", 0},     {u"8.3.0.1", u"8.3", 1},    {u" 8.3", u"0.8.3", 0},
-        {u"4294967296.5", u"0.5", 0},  {u"8.x3", u"8.0.3", 0},     {u"-8", u"0.8", 0},
+        {u"8.3", u"8.3.0.0", 0},      {u"8-3", u"8.3", 0},     {u"8..3", u"8.0.3", 0},
+        {u"8.2.99.99", u"8.3", -1},   {u"10", u"8.3", 1},      {u"", u"0.0.0.0", 0},
+        {u"8.3.0.0.9", u"8.3", 0},    {u"8.3.0.1", u"8.3", 1}, {u" 8.3", u"0.8.3", 0},
+        {u"4294967296.5", u"0.5", 0}, {u"8.x3", u"8.0.3", 0},  {u"-8", u"0.8", 0},
         {u"8.\x0663", u"8.0", 0},  // other scripts' digits are none
     };
     for (const TCase& row : kCases) {

@@ -39,8 +39,8 @@ protected:
 };
 
 TEST_F(ContractTest, VersionGate) {
-    constexpr const char16_t* kRefused[] = {u"8.2.99.99", u"8.2", u"7.9", u"", u"abc", u"v8.3",
-                                            u".8.3", u"0008"};
+    constexpr const char16_t* kRefused[] = {u"8.2.99.99", u"8.2",  u"7.9",  u"",
+                                            u"abc",       u"v8.3", u".8.3", u"0008"};
     constexpr const char16_t* kAccepted[] = {u"8.3", u"8.3.0.0", u"8-3", u"8.10", u"10"};
     TAFAppInfo info = Host().app_info;
     for (const char16_t* version : kRefused) {
@@ -72,8 +72,7 @@ TEST(ContractUnload, EveryLoadStartsAnewAndGivesAllMemoryBack) {
         std::string error_text;
         const auto library = platform::LoadLibraryFile(EngineName(copy), error_text);
         ASSERT_NE(library, nullptr) << error_text;
-        const auto entry =
-            reinterpret_cast<TInitQVPlugin>(library->FindSymbol(kInitQVPluginName));
+        const auto entry = reinterpret_cast<TInitQVPlugin>(library->FindSymbol(kInitQVPluginName));
         TAFPluginInfo* info = entry(&host.app_info);
         ASSERT_NE(info, nullptr) << Utf8FromUtf16(version);
         EXPECT_FALSE(TPluginCaller(host, info).Exec(gaSaveImage, u""));
@@ -89,6 +88,7 @@ TEST_F(ContractTest, PluginRecord) {
     EXPECT_EQ(info.PluginConfig, nullptr);
     EXPECT_EQ(info.About, nullptr);
     EXPECT_NE(info.ShutdownPlugin, nullptr);
+    EXPECT_EQ(info.Icon != nullptr, IconsHaveHandles());
     EXPECT_EQ(info.IsActions, -1);
     EXPECT_EQ(info.IsEvents, 0);
     EXPECT_EQ(info.EventsInfo, nullptr);
@@ -105,8 +105,7 @@ TEST_F(ContractTest, ActionRecords) {
         EXPECT_EQ(info->Indent, 0);
         EXPECT_EQ(info->ActionType, 0);
         EXPECT_EQ(std::u16string(info->ScriptFunctionName), u"");
-        // Icons exist where the platform has icon handles, for all or for none.
-        EXPECT_EQ(info->Icon == nullptr, Caller().Info()->Icon == nullptr);
+        EXPECT_EQ(info->Icon != nullptr, IconsHaveHandles());
     }
 }
 

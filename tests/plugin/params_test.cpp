@@ -184,8 +184,7 @@ TEST(Params, HostileTextsEndInDefaultsAndInTime) {
     EXPECT_EQ(Parse(megabyte).GetString(u"k"), u"");
     EXPECT_EQ(Parse(std::u16string(1 << 20, u'\n') + u"k=v").GetString(u"k"), u"v");
 
-    const std::u16string joined =
-        Parse(u"l_count=2147483647\r\nl_0=first").GetStrings(u"l");
+    const std::u16string joined = Parse(u"l_count=2147483647\r\nl_0=first").GetStrings(u"l");
     EXPECT_EQ(joined.size(), 5 + 2 * (static_cast<std::size_t>(kMaxListItems) - 1));
     const auto seconds = std::chrono::steady_clock::now() - start;
     EXPECT_LT(seconds, std::chrono::seconds(30));

@@ -218,10 +218,10 @@ TLoadedModule& LoadedModule() {
         module->library = platform::LoadLibraryFile(path, error_text);
         EXPECT_NE(module->library, nullptr) << error_text;
         if (module->library != nullptr) {
-            module->entry = reinterpret_cast<TInitQVPlugin>(
-                module->library->FindSymbol(kInitQVPluginName));
-            module->caller = std::make_unique<TPluginCaller>(
-                module->host, module->entry(&module->host.app_info));
+            module->entry =
+                reinterpret_cast<TInitQVPlugin>(module->library->FindSymbol(kInitQVPluginName));
+            module->caller = std::make_unique<TPluginCaller>(module->host,
+                                                             module->entry(&module->host.app_info));
         }
         return module;
     }();

@@ -23,6 +23,9 @@ private:
     void* handle_ = nullptr;
 };
 
+/// Whether icons have handles on this platform.
+bool IconsHaveHandles();
+
 /// What a host of another make saw of a call.
 struct TForeignCatch {
     bool exception_came = false;

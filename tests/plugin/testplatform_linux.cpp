@@ -22,6 +22,10 @@ TTestWindow::~TTestWindow() {
     window_answer = nullptr;
 }
 
+bool IconsHaveHandles() {
+    return false;
+}
+
 TForeignCatch CatchAsForeignHost(const std::function<void()>& call) {
     TForeignCatch result;
     try {

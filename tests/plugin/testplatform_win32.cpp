@@ -51,6 +51,10 @@ TTestWindow::~TTestWindow() {
     window_answer = nullptr;
 }
 
+bool IconsHaveHandles() {
+    return true;
+}
+
 TForeignCatch CatchAsForeignHost(const std::function<void()>& call) {
     system_exception_seen = false;
     system_exception_text.clear();

@@ -2,6 +2,7 @@
 
 #include <gtest/gtest.h>
 
+#include <algorithm>
 #include <cstdlib>
 #include <limits>
 #include <vector>
@@ -244,6 +245,60 @@ TEST(Quantizer, NeuralNeighboursFollowByHand) {
     EXPECT_EQ(map[1], Color(16, 4, 4));
     EXPECT_EQ(map[2], Color(32, 32, 32));
     EXPECT_EQ(map[15], Color(240, 240, 240));
+}
+
+// Whole palettes of a formula picture, worked out by a separate plain program from the rules of
+// the two methods. 0xRRGGBB.
+void MakeFormulaPicture(TZmBitmap& bitmap) {
+    ASSERT_TRUE(bitmap.Allocate(40, 30, zm24RGB));
+    for (std::int32_t y = 0; y < 30; ++y) {
+        for (std::int32_t x = 0; x < 40; ++x) {
+            bitmap.SetPixels_zm24RGB(x, y, Color(static_cast<std::uint8_t>(x * 7 + y * 13),
+                                                 static_cast<std::uint8_t>(x * x + y * 5),
+                                                 static_cast<std::uint8_t>(x * y * 3)));
+        }
+    }
+}
+
+void ExpectPalette(std::int32_t method, std::int32_t quality,
+                   const std::vector<std::uint32_t>& expected) {
+    const TReductionSettings settings(method, quality);
+    TZmBitmap bitmap;
+    MakeFormulaPicture(bitmap);
+    std::vector<TRGB> map;
+    TZmQuantizer quantizer(bitmap, map, static_cast<std::int32_t>(expected.size()));
+    for (std::size_t i = 0; i < expected.size(); ++i) {
+        const std::uint32_t rgb = expected[i];
+        EXPECT_EQ(map[i], Color(static_cast<std::uint8_t>(rgb >> 16),
+                                static_cast<std::uint8_t>(rgb >> 8),
+                                static_cast<std::uint8_t>(rgb)))
+            << i;
+    }
+}
+
+TEST(Quantizer, WholeNeuralPalettes) {
+    // Every pixel a sample; 4 neighbours on either side at the start.
+    ExpectPalette(kNeural, 100,
+                  {0x3D27DD, 0x262C86, 0x1F120F, 0x431F2E, 0x722117, 0xD83910, 0xCD3A5E, 0xD0946D,
+                   0xF245C7, 0xC157E4, 0xAD14B1, 0x84447E, 0xAE6DA7, 0x4A7311, 0x24DD38, 0x32B11F,
+                   0x127126, 0x307C77, 0x61424B, 0x6C8F52, 0x9F4E1B, 0xB4B510, 0xCFE549, 0xD4932D,
+                   0x7CCE94, 0x72D529, 0x25CE8A, 0x1E74C3, 0x6E91D4, 0xA5C7E6, 0x2ECEE0,
+                   0xE7CAB6});
+    // One pixel in 30: the outer neurons stay where they began.
+    ExpectPalette(kNeural, 0,
+                  {0x000000, 0x010101, 0x040404, 0x1E1010, 0x2A1817, 0x137827, 0x08A43B, 0x2A6F54,
+                   0x502A8E, 0x731681, 0x6D3857, 0x9E3258, 0xE22640, 0xE33534, 0xE4BC7D, 0x7A9753,
+                   0x89A25D, 0x9CCD89, 0x93C59D, 0x63AF8D, 0x398193, 0x2C66C1, 0x26ABC4, 0x5BE5BE,
+                   0x98A3D3, 0xA758E8, 0xC25CC6, 0xD3A4EE, 0xE0E0E0, 0xE8E8E8, 0xF0F0F0,
+                   0xF8F8F8});
+}
+
+TEST(Quantizer, WholeBoxPalette) {
+    ExpectPalette(kBoxes, -1,
+                  {0x202010, 0x384090, 0xB84010, 0x984098, 0x188838, 0x98B8C0, 0x90A030, 0x389090,
+                   0x20D838, 0xC020E0, 0x603030, 0x18B8D8, 0xE0C0B0, 0xC0E038, 0xC04058, 0x3040D8,
+                   0x588830, 0xD84098, 0x60D040, 0x183850, 0xD89838, 0x60B0E0, 0x40D898,
+                   0xC060E0});
 }
 
 TEST(Quantizer, NeuralLookupFindsTheNearestEntry) {

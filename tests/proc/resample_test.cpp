@@ -132,22 +132,23 @@ TEST(ResampleDispatcherTest, OnePixelFillsEverything) {
 }
 
 TEST(ResampleDispatcherTest, EveryFilterSurvivesThinPictures) {
-    for (const TZmPixelFormat format : {zm1g, zm8p, zm8g, zm16g, zm24RGB, zm32RGB, zm48RGB}) {
-        for (int filter = 0; filter < kResampleFilterCount; ++filter) {
-            for (const auto& [from, to] :
-                 {std::pair{TZmImageSize{1, 1}, TZmImageSize{3, 2}},
-                  std::pair{TZmImageSize{1, 900}, TZmImageSize{900, 1}},
-                  std::pair{TZmImageSize{900, 1}, TZmImageSize{1, 900}},
-                  std::pair{TZmImageSize{2, 2}, TZmImageSize{1, 1}},
-                  std::pair{TZmImageSize{1, 65535}, TZmImageSize{2, 1}},
-                  std::pair{TZmImageSize{1, 2}, TZmImageSize{1, 40000}}}) {
-                const auto source = MakeGradient(format, from.width, from.height);
-                const auto target = TargetFor(*source, to.width, to.height);
+    struct TThinCase {
+        TZmImageSize from;
+        TZmImageSize to;
+    };
+    for (const TThinCase& test :
+         {TThinCase{{1, 1}, {3, 2}}, TThinCase{{1, 300}, {300, 1}}, TThinCase{{300, 1}, {1, 300}},
+          TThinCase{{2, 2}, {1, 1}}, TThinCase{{1, 20000}, {2, 1}}, TThinCase{{1, 2}, {1, 20000}},
+          TThinCase{{65535, 1}, {1, 2}}}) {
+        for (const TZmPixelFormat format : {zm1g, zm8p, zm8g, zm16g, zm24RGB, zm32RGB, zm48RGB}) {
+            const auto source = MakeGradient(format, test.from.width, test.from.height);
+            for (int filter = 0; filter < kResampleFilterCount; ++filter) {
+                const auto target = TargetFor(*source, test.to.width, test.to.height);
                 EXPECT_TRUE(ResampleBitmapInto(*source, *target,
                                                static_cast<TResampleFilter>(filter), nullptr,
                                                {}))
                     << format << ' ' << filter;
-                EXPECT_EQ(target->GetWidth(), to.width);
+                EXPECT_EQ(target->GetWidth(), test.to.width);
             }
         }
     }

@@ -152,6 +152,37 @@ bool TLinuxFile::Close() {
     return result == 0 || errno == EINTR;  // the descriptor is gone in either case
 }
 
+/// A file that is removed when its handle closes.
+class TDeletingFile : public TFileHandle {
+public:
+    // The absolute name is kept: the current folder may be another one at the end.
+    TDeletingFile(std::unique_ptr<TFileHandle> file, const std::u16string& name)
+        : file_(std::move(file)), name_(AbsolutePath(name)) {}
+    ~TDeletingFile() override { Close(); }
+    std::int32_t Read(void* buffer, std::int32_t count) override {
+        return file_->Read(buffer, count);
+    }
+    std::int32_t Write(const void* buffer, std::int32_t count) override {
+        return file_->Write(buffer, count);
+    }
+    std::int64_t Seek(std::int64_t offset, TSeekOrigin origin) override {
+        return file_->Seek(offset, origin);
+    }
+    std::int64_t GetSize() override { return file_->GetSize(); }
+    bool Close() override {
+        const bool closed = file_->Close();
+        if (!name_.empty()) {
+            RemoveFile(name_);
+            name_.clear();
+        }
+        return closed;
+    }
+
+private:
+    std::unique_ptr<TFileHandle> file_;
+    std::u16string name_;
+};
+
 std::unique_ptr<TFileHandle> Fail(int error_number, std::string& error_text) {
     error_text = ErrorText(error_number);
     return nullptr;
@@ -346,6 +377,18 @@ std::unique_ptr<TFileHandle> CreateTemporaryBeside(const std::u16string& target_
         }
     }
     return Fail(errno, error_text);
+}
+
+std::unique_ptr<TFileHandle> CreateDeletingFile(const std::u16string& name,
+                                                std::string& error_text) {
+    if (GetFileKind(name) == fkOther) {
+        return Fail(EINVAL, error_text);  // a device must not be deleted
+    }
+    auto file = OpenFile(name, fmCreate, error_text);
+    if (file == nullptr) {
+        return nullptr;
+    }
+    return std::make_unique<TDeletingFile>(std::move(file), name);
 }
 
 std::u16string ResolveLinkTarget(const std::u16string& target_name) {

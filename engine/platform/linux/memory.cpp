@@ -15,6 +15,8 @@
 namespace zm::platform {
 namespace {
 
+constexpr std::size_t kLargePagesFrom = std::size_t{4} << 20;
+
 constexpr char kCpuFolder[] = "/sys/devices/system/cpu/";
 constexpr char kControlGroups[] = "/sys/fs/cgroup";
 
@@ -137,7 +139,14 @@ void* SystemHeapAllocate(std::size_t size_bytes) {
     }
     void* const block = ::mmap(nullptr, size_bytes, PROT_READ | PROT_WRITE,
                                MAP_PRIVATE | MAP_ANONYMOUS, -1, 0);
-    return block == MAP_FAILED ? nullptr : block;
+    if (block == MAP_FAILED) {
+        return nullptr;
+    }
+    // Large pages spare most of the page faults that a big image costs when it is first written.
+    if (size_bytes >= kLargePagesFrom) {
+        static_cast<void>(::madvise(block, size_bytes, MADV_HUGEPAGE));
+    }
+    return block;
 }
 
 void SystemHeapFree(void* block, std::size_t size_bytes) {

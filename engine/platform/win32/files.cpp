@@ -252,6 +252,24 @@ std::unique_ptr<TFileHandle> CreateTemporaryBeside(const std::u16string& target_
     return Fail(GetLastError(), error_text);
 }
 
+std::unique_ptr<TFileHandle> CreateDeletingFile(const std::u16string& name,
+                                                std::string& error_text) {
+    if (const DWORD refusal = RefusalOf(name)) {
+        return Fail(refusal, error_text);
+    }
+    if (GetFileKind(name) == fkOther) {
+        return Fail(ERROR_INVALID_NAME, error_text);
+    }
+    const HANDLE handle =
+        CreateFileW(WideOf(NativeName(name)), GENERIC_READ | GENERIC_WRITE | DELETE,
+                    FILE_SHARE_READ | FILE_SHARE_DELETE, nullptr, CREATE_ALWAYS,
+                    FILE_ATTRIBUTE_TEMPORARY | FILE_FLAG_DELETE_ON_CLOSE, nullptr);
+    if (handle == INVALID_HANDLE_VALUE) {
+        return Fail(GetLastError(), error_text);
+    }
+    return std::make_unique<TWin32File>(handle, /*seekable=*/true);
+}
+
 std::u16string ResolveLinkTarget(const std::u16string& target_name) {
     const DWORD attributes = AttributesOf(target_name);
     if (attributes == INVALID_FILE_ATTRIBUTES ||
