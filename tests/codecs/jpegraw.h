@@ -120,25 +120,17 @@ struct TRawSettings {
     std::function<void(jpeg_compress_struct&)> write_markers;
 };
 
-inline std::vector<std::uint8_t> EncodeRawJpeg(const TRawSettings& settings) {
-    jpeg_compress_struct encoder = {};
-    TRawError error;
-    encoder.err = InitRawError(error);
-    jpeg_create_compress(&encoder);
-    unsigned char* memory = nullptr;
-    unsigned long size = 0;
-    jpeg_mem_dest(&encoder, &memory, &size);
-    encoder.image_width = static_cast<JDIMENSION>(settings.width);
-    encoder.image_height = static_cast<JDIMENSION>(settings.height);
-    encoder.input_components = settings.input == JCS_GRAYSCALE ? 1
-                               : settings.input == JCS_CMYK    ? 4
-                                                               : 3;
-    encoder.in_color_space = settings.input;
-    std::vector<std::uint8_t> row(
-        static_cast<std::size_t>(settings.width * encoder.input_components));
+/// Apart from the function with the jump, whose frame then holds nothing that a jump could spoil.
+[[gnu::noinline]] inline std::vector<std::uint8_t> MakeRawRow(int width, int components) {
+    return std::vector<std::uint8_t>(static_cast<std::size_t>(width * components));
+}
+
+/// Everything that may jump out of the library; no object is made or freed here.
+[[gnu::noinline]] inline bool WriteRawJpeg(jpeg_compress_struct& encoder, TRawError& error,
+                                           const TRawSettings& settings,
+                                           std::vector<std::uint8_t>& row) {
     if (setjmp(error.jump) != 0) {
-        jpeg_destroy_compress(&encoder);
-        return {};
+        return false;
     }
     jpeg_set_defaults(&encoder);
     jpeg_set_colorspace(&encoder, settings.file);
@@ -164,8 +156,32 @@ inline std::vector<std::uint8_t> EncodeRawJpeg(const TRawSettings& settings) {
         jpeg_write_scanlines(&encoder, &line, 1);
     }
     jpeg_finish_compress(&encoder);
+    return true;
+}
+
+/// Empty when the library refuses the settings.
+inline std::vector<std::uint8_t> EncodeRawJpeg(const TRawSettings& settings) {
+    jpeg_compress_struct encoder = {};
+    TRawError error;
+    encoder.err = InitRawError(error);
+    jpeg_create_compress(&encoder);
+    unsigned char* memory = nullptr;
+    unsigned long size = 0;
+    jpeg_mem_dest(&encoder, &memory, &size);
+    encoder.image_width = static_cast<JDIMENSION>(settings.width);
+    encoder.image_height = static_cast<JDIMENSION>(settings.height);
+    encoder.input_components = settings.input == JCS_GRAYSCALE ? 1
+                               : settings.input == JCS_CMYK    ? 4
+                                                               : 3;
+    encoder.in_color_space = settings.input;
+    std::vector<std::uint8_t> row(
+        static_cast<std::size_t>(settings.width * encoder.input_components));
+    const bool is_written = WriteRawJpeg(encoder, error, settings, row);
     jpeg_destroy_compress(&encoder);
-    std::vector<std::uint8_t> bytes(memory, memory + size);
+    std::vector<std::uint8_t> bytes;
+    if (is_written) {
+        bytes.assign(memory, memory + size);
+    }
     std::free(memory);
     return bytes;
 }
