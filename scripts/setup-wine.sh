@@ -53,9 +53,9 @@ MakeRoot() {
     AsRoot mkdir -p "$root.partial/var/lib/zalmo"
     local inside=(chroot "$root.partial" /usr/bin/env "${wine_environment[@]}")
     # A program that crashes prints its stack and ends; no dialog waits for a click.
-    AsRoot "${wrapper[@]}" sh -c 'mount -t proc proc "$0/proc" 2>/dev/null; "$@" wineboot -i &&
+    AsRoot "${wrapper[@]}" sh -c '"$@" wineboot -i &&
         "$@" wine reg add "HKCU\\Software\\Wine\\WineDbg" /v ShowCrashDialog /t REG_DWORD /d 0 /f &&
-        "$@" wineserver -w' "$root.partial" "${inside[@]}" >>"$log" 2>&1 </dev/null ||
+        "$@" wineserver -w' wine "${inside[@]}" >>"$log" 2>&1 </dev/null ||
         { tail -n 20 "$log" >&2; Fail "Wine does not start (log: $log)"; }
 }
 

@@ -271,7 +271,8 @@ void TZmDictionary::Insert(std::u16string_view key, std::unique_ptr<TObject> val
         return;
     }
     const TPlace place(m_hashFunction(form, m_bucketCount) % m_bucketCount, m_insertions++);
-    const auto entry = m_buckets.try_emplace(place, std::u16string(key), std::move(value)).first;
+    TZmDictionaryBucket bucket{.key = std::u16string(key), .value = std::move(value)};
+    const auto entry = m_buckets.emplace(place, std::move(bucket)).first;
     m_index.emplace(std::move(form), entry);
 }
 

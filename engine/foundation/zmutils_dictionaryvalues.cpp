@@ -48,8 +48,7 @@ std::u16string DoubleToNeutralText(double value) {
         return u"0.0";
     }
     std::array<char, 32> buffer{};
-    const char* const end =
-        std::to_chars(buffer.data(), buffer.data() + buffer.size(), value).ptr;
+    const char* const end = std::to_chars(buffer.data(), buffer.data() + buffer.size(), value).ptr;
     std::string text(static_cast<const char*>(buffer.data()), end);
     if (text.find('.') == std::string::npos) {
         text.insert(std::min(text.find('e'), text.size()), ".0");

@@ -39,9 +39,8 @@ public:
 
     /// Adds all names of the wanted kinds to `strings`, with their folder when `bFullPath`.
     static void PopulateStrings(const std::u16string& path, std::vector<std::u16string>& strings,
-                                bool bGetFiles = true, bool bGetDirs = true,
-                                bool bGetHidden = true, bool bFullPath = true,
-                                bool CheckDirLinks = false);
+                                bool bGetFiles = true, bool bGetDirs = true, bool bGetHidden = true,
+                                bool bFullPath = true, bool CheckDirLinks = false);
 
 private:
     bool IsFolderLink(const std::u16string& name) const;

@@ -59,8 +59,7 @@ void TZmHashStream::AddData(const void* bytes, std::size_t count) {
 
 const TMemoryStream& TZmHashStream::Kept() const {
     if (m_MemStream == nullptr) {
-        throw EZmException(
-            "Read error. Hash stream not Buffered, please create Buffered stream.");
+        throw EZmException("Read error. Hash stream not Buffered, please create Buffered stream.");
     }
     return *m_MemStream;
 }

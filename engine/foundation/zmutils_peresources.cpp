@@ -12,24 +12,24 @@
 namespace zm {
 namespace {
 
-constexpr std::uint16_t kDosMagic = 0x5A4D;        // "MZ"
-constexpr std::uint32_t kPeMagic = 0x00004550;     // "PE", two zeros
+constexpr std::uint16_t kDosMagic = 0x5A4D;     // "MZ"
+constexpr std::uint32_t kPeMagic = 0x00004550;  // "PE", two zeros
 constexpr std::uint16_t kOptionalMagic32 = 0x10B;
 constexpr std::uint16_t kOptionalMagic64 = 0x20B;
 constexpr std::size_t kDosHeaderBytes = 64;
-constexpr std::size_t kPeOffsetField = 60;         // in the DOS header
-constexpr std::size_t kCoffHeaderBytes = 24;       // with the magic before it
-constexpr std::size_t kDataDirectory32 = 96;       // in the optional header
+constexpr std::size_t kPeOffsetField = 60;    // in the DOS header
+constexpr std::size_t kCoffHeaderBytes = 24;  // with the magic before it
+constexpr std::size_t kDataDirectory32 = 96;  // in the optional header
 constexpr std::size_t kDataDirectory64 = 112;
 constexpr std::size_t kResourceDirectoryIndex = 2;
 constexpr std::size_t kSectionHeaderBytes = 40;
 constexpr std::size_t kDirectoryHeaderBytes = 16;
 constexpr std::size_t kDirectoryEntryBytes = 8;
 constexpr std::size_t kDataEntryBytes = 16;
-constexpr std::uint32_t kHighBit = 0x80000000;     // a text name; a directory further down
-constexpr std::size_t kMaxSections = 96;           // more than that no system loads
+constexpr std::uint32_t kHighBit = 0x80000000;  // a text name; a directory further down
+constexpr std::size_t kMaxSections = 96;        // more than that no system loads
 constexpr std::int64_t kMaxTreeBytes = 16 << 20;
-constexpr std::int64_t kMinReadCost = 64;          // a small read costs a call of the system too
+constexpr std::int64_t kMinReadCost = 64;  // a small read costs a call of the system too
 
 /// Fields at places inside a block; what lies outside reads as 0.
 std::uint16_t U16At(std::span<const std::uint8_t> bytes, std::size_t offset) {
@@ -54,8 +54,7 @@ std::vector<std::uint8_t> ReadBlock(TStream& stream, std::int64_t position, std:
     stream.SetPosition(position);
     for (std::size_t done = 0; done < count;) {
         const std::size_t piece = std::min<std::size_t>(count - done, 1 << 30);
-        const std::int32_t got =
-            stream.Read(block.data() + done, static_cast<std::int32_t>(piece));
+        const std::int32_t got = stream.Read(block.data() + done, static_cast<std::int32_t>(piece));
         if (got < 1) {
             return {};
         }

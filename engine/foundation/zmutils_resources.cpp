@@ -19,13 +19,13 @@ struct TFriendlyName {
     const char16_t* text;
 };
 constexpr TFriendlyName kFriendlyNames[] = {
-    {1, u"Cursor"},         {2, u"Bitmap"},           {3, u"Icon"},
-    {4, u"Menu"},           {5, u"Dialog"},           {6, u"String Table"},
-    {7, u"Font Directory"}, {8, u"Font"},             {9, u"Accelerators"},
-    {10, u"RC Data"},       {11, u"Message Table"},   {12, u"Cursor Group"},
-    {14, u"Icon Group"},    {16, u"Version"},         {17, u"Dialog Include"},
-    {19, u"Plug and Play"}, {20, u"VXD"},             {21, u"Animated Cursor"},
-    {22, u"Animated Icon"}, {23, u"HTML"},            {24, u"Manifest"},
+    {1, u"Cursor"},         {2, u"Bitmap"},         {3, u"Icon"},
+    {4, u"Menu"},           {5, u"Dialog"},         {6, u"String Table"},
+    {7, u"Font Directory"}, {8, u"Font"},           {9, u"Accelerators"},
+    {10, u"RC Data"},       {11, u"Message Table"}, {12, u"Cursor Group"},
+    {14, u"Icon Group"},    {16, u"Version"},       {17, u"Dialog Include"},
+    {19, u"Plug and Play"}, {20, u"VXD"},           {21, u"Animated Cursor"},
+    {22, u"Animated Icon"}, {23, u"HTML"},          {24, u"Manifest"},
 };
 
 /// A group's directory: six bytes with the count of frames in the last two, then fourteen bytes
@@ -115,8 +115,7 @@ std::int32_t TZmResourceExtractor::IndexOfNumber(std::uint32_t type_number) cons
         std::find_if(m_typesList.begin(), m_typesList.end(), [&](const TPeResourceType& type) {
             return type.name.is_number && type.name.number == type_number;
         });
-    return found == m_typesList.end() ? -1
-                                      : static_cast<std::int32_t>(found - m_typesList.begin());
+    return found == m_typesList.end() ? -1 : static_cast<std::int32_t>(found - m_typesList.begin());
 }
 
 std::int32_t TZmResourceExtractor::GetNamesCount(std::int32_t TypeIndex) const {
@@ -196,8 +195,7 @@ std::vector<std::uint8_t> TZmResourceExtractor::GetFrameBuffer(std::int32_t Type
     if (number == nullptr) {
         return {};
     }
-    const std::int32_t frames =
-        IndexOfNumber(FrameTypeOf(ItemAt(m_typesList, TypeIndex)->name));
+    const std::int32_t frames = IndexOfNumber(FrameTypeOf(ItemAt(m_typesList, TypeIndex)->name));
     for (std::int32_t i = 0; i < GetNamesCount(frames); ++i) {
         const TPeName& name = ItemAt(ItemAt(m_typesList, frames)->resources, i)->name;
         if (name.is_number && name.number == *number) {
@@ -208,8 +206,7 @@ std::vector<std::uint8_t> TZmResourceExtractor::GetFrameBuffer(std::int32_t Type
 }
 
 bool TZmResourceExtractor::GetGroupAndFrame(std::int32_t TypeIndex, std::int32_t NameIndex,
-                                            std::int32_t& GroupTypeIndex,
-                                            std::int32_t& GroupIndex,
+                                            std::int32_t& GroupTypeIndex, std::int32_t& GroupIndex,
                                             std::int32_t& FrameIndex) const {
     if (!GetIsGrouped(TypeIndex) || !HasName(TypeIndex, NameIndex)) {
         return false;

@@ -12,7 +12,7 @@ namespace zm::platform {
 struct TDirectoryEntry {
     std::u16string name;  ///< without the folder
     bool is_folder = false;
-    bool is_hidden = false;  ///< by attribute; where there is none, by a leading dot
+    bool is_hidden = false;       ///< by attribute; where there is none, by a leading dot
     std::int64_t size_bytes = 0;  ///< 0 for folders
     TFileTimes times;
 };

@@ -100,9 +100,7 @@ public:
     explicit TStranger(int& alive) : alive_(alive) { ++alive_; }
     ~TStranger() override { --alive_; }
     std::string ClassName() const override { return "TStranger"; }
-    std::unique_ptr<TObject> Clone() const override {
-        return std::make_unique<TStranger>(alive_);
-    }
+    std::unique_ptr<TObject> Clone() const override { return std::make_unique<TStranger>(alive_); }
 
 private:
     int& alive_;
@@ -133,7 +131,8 @@ TEST(Dictionary, OwnsItsValues) {
 
 TEST(Dictionary, GettersTakeTheStatedKindsOnly) {
     TZmDictionary d;
-    ASSERT_TRUE(d.Parse(uR"({"i":42,"d":2.5,"b":true,"s":"7","t":"true","l":[1],
+    ASSERT_TRUE(
+        d.Parse(uR"({"i":42,"d":2.5,"b":true,"s":"7","t":"true","l":[1],
         "e":{"#text":"12"},"c":{"#content":{"#text":"3.5"}},"u":{"#text":"true"},"n":{}})"));
     EXPECT_EQ(d.GetString(u"s"), u"7");
     EXPECT_EQ(d.GetString(u"e"), u"12");
@@ -162,8 +161,12 @@ TEST(Dictionary, GettersTakeTheStatedKindsOnly) {
 
 TEST(Dictionary, AMissingKeyRaisesUnlessSilent) {
     TZmDictionary dictionary;
-    const std::string message = "Key \"gr\xC3\xB6\xC3\x9F" "e\" not found";
-    const std::u16string key = u"gr\x00F6\x00DF" u"e";
+    const std::string message =
+        "Key \"gr\xC3\xB6\xC3\x9F"
+        "e\" not found";
+    const std::u16string key =
+        u"gr\x00F6\x00DF"
+        u"e";
     EXPECT_EQ(MessageOf([&] { dictionary.Get(key); }), message);
     EXPECT_EQ(MessageOf([&] { dictionary.GetInteger(key); }), message);
     EXPECT_EQ(MessageOf([&] { dictionary.GetBoolean(key); }), message);
@@ -205,11 +208,21 @@ TEST(Dictionary, DumpsAsXmlElements) {
 
 TEST(NeutralNumbers, AcceptedTexts) {
     const std::pair<const char16_t*, std::optional<double>> cases[] = {
-        {u"1.5e3", 1500.0}, {u"-.5", -0.5},         {u"+2.", 2.0},
-        {u"15e3", 15000.0}, {u"", std::nullopt},    {u"+-1.0", std::nullopt},
-        {u".", std::nullopt}, {u"1.2.3", std::nullopt}, {u" 1.0", std::nullopt},
-        {u"1,5", std::nullopt}, {u"inf", std::nullopt}, {u"nan.", std::nullopt},
-        {u"0x1.8", std::nullopt}, {u"1.0e999", std::nullopt}, {u"\x0131.5", std::nullopt},
+        {u"1.5e3", 1500.0},
+        {u"-.5", -0.5},
+        {u"+2.", 2.0},
+        {u"15e3", 15000.0},
+        {u"", std::nullopt},
+        {u"+-1.0", std::nullopt},
+        {u".", std::nullopt},
+        {u"1.2.3", std::nullopt},
+        {u" 1.0", std::nullopt},
+        {u"1,5", std::nullopt},
+        {u"inf", std::nullopt},
+        {u"nan.", std::nullopt},
+        {u"0x1.8", std::nullopt},
+        {u"1.0e999", std::nullopt},
+        {u"\x0131.5", std::nullopt},
     };
     for (const auto& [text, value] : cases) {
         EXPECT_EQ(NeutralTextToDouble(text), value) << Utf8FromUtf16(text);

@@ -42,10 +42,12 @@ TEST_F(HashStream, GivesThePublishedHashes) {
         {0x8003, kMD5OfAbc},
         {0x8004, "a9993e364706816aba3e25717850c26c9cd0d89d"},
         {0x800C, "ba7816bf8f01cfea414140de5dae2223b00361a396177a9cb410ff61f20015ad"},
-        {0x800D, "cb00753f45a35e8bb5a03d699ac65007272c32ab0eded1631a8b605a43ff5bed"
-                 "8086072ba1e7cc2358baeca134c825a7"},
-        {0x800E, "ddaf35a193617abacc417349ae20413112e6fa4e89a97ea20a9eeee64b55d39a"
-                 "2192992a274fc1a836ba3c23a3feebbd454d4423643ce80e2a9ac94fa54ca49f"},
+        {0x800D,
+         "cb00753f45a35e8bb5a03d699ac65007272c32ab0eded1631a8b605a43ff5bed"
+         "8086072ba1e7cc2358baeca134c825a7"},
+        {0x800E,
+         "ddaf35a193617abacc417349ae20413112e6fa4e89a97ea20a9eeee64b55d39a"
+         "2192992a274fc1a836ba3c23a3feebbd454d4423643ce80e2a9ac94fa54ca49f"},
     };
     for (const auto& [algorithm, expected] : hashes) {
         for (const bool buffered : {false, true}) {

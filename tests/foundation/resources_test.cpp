@@ -63,6 +63,7 @@ constexpr std::uint32_t kDown = 0x80000000;  // a directory further down; a text
 /// the frames #2 and #1.
 TBytes ResourceTree() {
     TWriter tree;
+    // clang-format off
     tree.Directory(1, 2)               // 000: the types
         .Entry(kDown | 0x130, kDown | 0x28)
         .Entry(3, kDown | 0x40)
@@ -101,6 +102,7 @@ TBytes ResourceTree() {
         .Word(2)                       // resource number
         .Word(0x2020).Word(0).Word(1).Word(32).Long(2)
         .Word(1);
+    // clang-format on
     EXPECT_EQ(tree.Size(), 0x174u);
     return tree.Take();
 }
@@ -109,6 +111,7 @@ TBytes ResourceTree() {
 TBytes ModuleWith(const TBytes& tree, bool wide) {
     const std::uint32_t fixed_bytes = wide ? 112 : 96;
     TWriter module;
+    // clang-format off
     module.Text("MZ").ZerosTo(60).Long(64);                // DOS header, offset of the next
     module.Text(std::string_view("PE\0\0", 4))             // 40
         .Word(wide ? 0x8664 : 0x14C)                       // machine
@@ -127,9 +130,9 @@ TBytes ModuleWith(const TBytes& tree, bool wide) {
         .Long(0x174).Long(kTreeAddress).Long(static_cast<std::uint32_t>(tree.size()))
         .Long(kTreeStart)
         .Long(0).Long(0).Long(0).Long(0);
+    // clang-format on
     EXPECT_LE(module.Size(), kTreeStart);
-    module.ZerosTo(kTreeStart).Text(
-        {reinterpret_cast<const char*>(tree.data()), tree.size()});
+    module.ZerosTo(kTreeStart).Text({reinterpret_cast<const char*>(tree.data()), tree.size()});
     return module.Take();
 }
 

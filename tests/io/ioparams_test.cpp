@@ -6,8 +6,8 @@
 #include <vector>
 
 #include "engine/bitmap/zmxBitmaps.h"
+#include "engine/foundation/zmbytereader.h"
 #include "engine/foundation/zmsettings.h"
-#include "engine/io/zmbytereader.h"
 #include "engine/io/zmimagelimits.h"
 #include "engine/io/zmprogress.h"
 
@@ -287,9 +287,9 @@ TEST(ImageLimits, GrowWithTheFileAndCatchOverflow) {
           TRow{16384, 32769, 8, 0, false},                            // one row more
           TRow{16384, 32769, 8, 14, false},                           // 15,400 bytes more
           TRow{16384, 32769, 8, 15, true},                            // 16,500 bytes more
-          TRow{kMost32, 1, 8, kMost32, sizeof(void*) > 4}, TRow{kMost32, 1, 9, kMost32, false},
+          TRow{kMost32, 1, 8, kMost32, true}, TRow{kMost32, 1, 9, kMost32, false},
           TRow{kMost32 + 1, 1, 1, kMost32, false},
-          TRow{1, kMost32, 8, std::int64_t{1} << 62, sizeof(void*) > 4},
+          TRow{2, kMost32, 8, std::int64_t{1} << 62, sizeof(void*) > 4},
           TRow{kMost32, kMost32, 64, std::int64_t{1} << 62, false},
           TRow{16384, 32769, 8, -5, false}}) {
         EXPECT_EQ(row.acceptable,

@@ -35,8 +35,7 @@ TCrypto LoadCrypto() {
         library = library != nullptr ? library : ::dlopen(name, RTLD_NOW | RTLD_LOCAL);
     }
     // Never unloaded: the library registers clean-up of its own for the end of the process.
-    crypto.complete = library != nullptr &&
-                      Bind(library, "EVP_MD_CTX_new", crypto.new_context) &&
+    crypto.complete = library != nullptr && Bind(library, "EVP_MD_CTX_new", crypto.new_context) &&
                       Bind(library, "EVP_MD_CTX_free", crypto.free_context) &&
                       Bind(library, "EVP_DigestInit_ex", crypto.begin) &&
                       Bind(library, "EVP_DigestUpdate", crypto.update) &&
@@ -55,8 +54,7 @@ struct TAlgorithm {
     const char* name;
 };
 constexpr TAlgorithm kAlgorithms[] = {
-    {0x8003, "MD5"},    {0x8004, "SHA1"},   {0x800C, "SHA256"},
-    {0x800D, "SHA384"}, {0x800E, "SHA512"},
+    {0x8003, "MD5"}, {0x8004, "SHA1"}, {0x800C, "SHA256"}, {0x800D, "SHA384"}, {0x800E, "SHA512"},
 };
 
 const void* FindAlgorithm(std::uint32_t id) {

@@ -18,8 +18,7 @@ std::int64_t NanosecondsOf(const FILETIME& time) {
 
 class TWin32Directory : public TDirectoryReader {
 public:
-    TWin32Directory(HANDLE search, const WIN32_FIND_DATAW& first)
-        : search_(search), data_(first) {}
+    TWin32Directory(HANDLE search, const WIN32_FIND_DATAW& first) : search_(search), data_(first) {}
     ~TWin32Directory() override { FindClose(search_); }
     TWin32Directory(const TWin32Directory&) = delete;
     TWin32Directory& operator=(const TWin32Directory&) = delete;
@@ -50,8 +49,7 @@ bool TWin32Directory::Next(TDirectoryEntry& entry) {
     } while (entry.name == u"." || entry.name == u"..");
     entry.is_folder = (data_.dwFileAttributes & FILE_ATTRIBUTE_DIRECTORY) != 0;
     entry.is_hidden = (data_.dwFileAttributes & FILE_ATTRIBUTE_HIDDEN) != 0;
-    const std::uint64_t size =
-        (std::uint64_t{data_.nFileSizeHigh} << 32) | data_.nFileSizeLow;
+    const std::uint64_t size = (std::uint64_t{data_.nFileSizeHigh} << 32) | data_.nFileSizeLow;
     entry.size_bytes = entry.is_folder ? 0 : static_cast<std::int64_t>(size);
     entry.times = {NanosecondsOf(data_.ftCreationTime), NanosecondsOf(data_.ftLastWriteTime),
                    NanosecondsOf(data_.ftLastAccessTime)};

@@ -9,7 +9,7 @@
 namespace zm::platform {
 namespace {
 
-constexpr DWORD kProviderType = 24;              // RSA and AES, which brings SHA-2
+constexpr DWORD kProviderType = 24;               // RSA and AES, which brings SHA-2
 constexpr DWORD kVerifyContextOnly = 0xF0000000;  // no keys of a user are asked for
 constexpr std::size_t kMaxAddBytes = 1 << 30;
 
