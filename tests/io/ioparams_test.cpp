@@ -6,7 +6,7 @@
 #include <vector>
 
 #include "engine/bitmap/zmxBitmaps.h"
-#include "engine/foundation/zmbytereader.h"
+#include "engine/io/zmbytereader.h"
 #include "engine/foundation/zmsettings.h"
 #include "engine/io/zmimagelimits.h"
 #include "engine/io/zmprogress.h"
