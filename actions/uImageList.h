@@ -44,7 +44,9 @@ public:
     /// Keys: `l`, `t`, `r`, `b` (expanded) and their units `ul`, `ut`, `ur`, `ub`. Right and
     /// bottom are exclusive, negative values count from the far edge. Code 2: empty rectangle.
     bool Crop(const IStepParams& params);
-    /// Turns nothing: there is no rotation in the engine. False, without a report.
+    /// Keys: `action` (0 rotate, 1 flip horizontally, 2 flip vertically), `angle` (expanded;
+    /// degrees clockwise). What a turned picture leaves free is white. False without a report for
+    /// an angle of 0 and other actions.
     bool Rotate(const IStepParams& params);
     /// Keys as Crop, as widths of the borders, and `color`.
     bool AddBorder(const IStepParams& params);

@@ -11,6 +11,9 @@ constexpr std::int32_t kErrorInvalidValues = 2;
 constexpr TColor kWhite = 0xFFFFFF;
 constexpr std::int32_t kUnitPercent = 1;
 constexpr std::int32_t kMethodLongAndShortSide = 1;
+constexpr std::int32_t kActionRotate = 0;
+constexpr std::int32_t kActionFlipHorizontally = 1;
+constexpr std::int32_t kActionFlipVertically = 2;
 
 /// Percentage of a side in the 32-bit arithmetic that stored steps count on, truncated.
 std::int32_t PercentWrapped(std::int32_t percent, std::int32_t dimension) {
@@ -105,8 +108,30 @@ bool TQVImageList::AddBorder(const IStepParams& params) {
 }
 
 bool TQVImageList::Rotate(const IStepParams& params) {
-    static_cast<void>(JobBitmap(params.GetTaskId()));
-    return false;
+    TZmBitmap* bitmap = JobBitmap(params.GetTaskId());
+    if (bitmap == nullptr) {
+        return false;
+    }
+    switch (params.GetInteger(u"action")) {
+        case kActionRotate: {
+            // Required: an angle of 0, the default, counts as a failed step.
+            const std::int32_t angle = ExpandedInteger(params, u"angle", u"0");
+            if (angle == 0) {
+                return false;
+            }
+            // Steps count degrees clockwise, bitmaps counter-clockwise.
+            bitmap->Rotate(-static_cast<double>(angle), zmrBilinear, kWhite);
+            return true;
+        }
+        case kActionFlipHorizontally:
+            bitmap->Flip(fdHorizontal);
+            return true;
+        case kActionFlipVertically:
+            bitmap->Flip(fdVertical);
+            return true;
+        default:
+            return false;
+    }
 }
 
 }  // namespace zm

@@ -3,12 +3,15 @@
 
 #include <benchmark/benchmark.h>
 
+#include <algorithm>
 #include <cstdint>
 #include <cstring>
 #include <memory>
 #include <vector>
 
+#include "engine/bitmap/zmquantizer.h"
 #include "engine/bitmap/zmxBitmaps.h"
+#include "engine/foundation/zmsettings.h"
 #include "engine/proc/zmresample.h"
 #include "engine/proc/zmresample_p.h"
 
@@ -78,6 +81,8 @@ BENCHMARK_CAPTURE(Resample, BilinearEnlargeUneven, kSmall, kUnevenLarge, rfBilin
     ->Unit(benchmark::kMillisecond);
 BENCHMARK_CAPTURE(Resample, BicubicEnlarge, kSmall, kLarge, rfBicubic)
     ->Unit(benchmark::kMillisecond);
+BENCHMARK_CAPTURE(Resample, BicubicEnlargeUneven, kSmall, kUnevenLarge, rfBicubic)
+    ->Unit(benchmark::kMillisecond);
 BENCHMARK_CAPTURE(Resample, NearestShrink, kLarge, kSmall, rfNone)
     ->Unit(benchmark::kMillisecond);
 BENCHMARK_CAPTURE(Resample, NearestEnlarge, kSmall, kLarge, rfNone)
@@ -89,7 +94,83 @@ BENCHMARK_CAPTURE(Resample, FastLinearEnlarge, kSmall, kLarge, rfFastLinear)
 BENCHMARK_CAPTURE(Resample, Lanczos3Shrink, kLarge, kSmall, rfLanczos3)
     ->Unit(benchmark::kMillisecond);
 
-/// The plain form, for the gain of the fast one.
+/// A palette of 256 colours and the index of every pixel.
+void BM_Quantize(benchmark::State& state, std::int32_t method) {
+    const auto source = MakePicture(kLargeWidth, kLargeHeight);
+    const std::int32_t old_method = ZmGlobalSettings().fColorReductionAlgorithm;
+    ZmGlobalSettings().fColorReductionAlgorithm = method;
+    std::vector<std::uint8_t> indices(std::size_t{kLargeWidth} * kLargeHeight);
+    for (auto _ : state) {
+        std::vector<TRGB> palette;
+        TZmQuantizer quantizer(*source, palette, 256);
+        std::uint8_t* out = indices.data();
+        for (std::int32_t y = 0; y < kLargeHeight; ++y) {
+            const auto* row = reinterpret_cast<const TRGB*>(source->GetScanLine(y));
+            out = std::transform(row, row + kLargeWidth, out, [&](TRGB color) {
+                return static_cast<std::uint8_t>(quantizer.GetRGBIndex(color));
+            });
+        }
+        benchmark::DoNotOptimize(indices.data());
+    }
+    ZmGlobalSettings().fColorReductionAlgorithm = old_method;
+}
+BENCHMARK_CAPTURE(BM_Quantize, Neural, 0)->Unit(benchmark::kMillisecond);
+BENCHMARK_CAPTURE(BM_Quantize, Boxes, 1)->Unit(benchmark::kMillisecond);
+
+/// One thread and all of them; the rest of the process counts too.
+void BM_Lanczos3Threads(benchmark::State& state) {
+    const auto source = MakePicture(kLargeWidth, kLargeHeight);
+    TZmBitmap target(kSmallWidth, kSmallHeight, zm24RGB);
+    const std::int32_t old_count = ZmGlobalSettings().fImageProcMaxThreads;
+    ZmGlobalSettings().fImageProcMaxThreads = static_cast<std::int32_t>(state.range(0));
+    for (auto _ : state) {
+        if (!ResampleBitmapInto(*source, target, rfLanczos3, nullptr, {})) {
+            state.SkipWithError("no result");
+        }
+    }
+    ZmGlobalSettings().fImageProcMaxThreads = old_count;
+}
+BENCHMARK(BM_Lanczos3Threads)->ArgName("threads")->Arg(1)->Arg(2)->MeasureProcessCPUTime()
+    ->Unit(benchmark::kMillisecond);
+
+/// The plain forms, for the gain of the fast ones.
+template <typename Engine>
+void RunPlain(benchmark::State& state, TZmImageSize from, TZmImageSize to, const Engine& engine) {
+    const auto source = MakePicture(from.width, from.height);
+    TZmBitmap target(to.width, to.height, zm24RGB);
+    for (auto _ : state) {
+        if (!engine(*source, target)) {
+            state.SkipWithError("no result");
+        }
+    }
+}
+
+void BM_BicubicPlain(benchmark::State& state) {
+    RunPlain(state, kSmall, kLarge, [](TZmBitmap& source, TZmBitmap& target) {
+        return ResampleAreaPlain(source, target, nullptr, TAreaInterpolation::kCubic, {});
+    });
+}
+BENCHMARK(BM_BicubicPlain)->Unit(benchmark::kMillisecond);
+
+void BM_FastLinearPlain(benchmark::State& state) {
+    const bool shrink = state.range(0) != 0;
+    RunPlain(state, shrink ? kLarge : kSmall, shrink ? kSmall : kLarge,
+             [](TZmBitmap& source, TZmBitmap& target) {
+                 return ResampleFastLinear(source, target, nullptr, {}, TResampleForm::kPlain);
+             });
+}
+BENCHMARK(BM_FastLinearPlain)->ArgName("shrink")->Arg(1)->Arg(0)->Unit(benchmark::kMillisecond);
+
+void BM_Lanczos3Plain(benchmark::State& state) {
+    const std::int32_t old_count = ZmGlobalSettings().fImageProcMaxThreads;
+    ZmGlobalSettings().fImageProcMaxThreads = 1;
+    RunPlain(state, kLarge, kSmall, [](TZmBitmap& source, TZmBitmap& target) {
+        return ResampleKernel(source, target, rfLanczos3, {}, TResampleForm::kPlain);
+    });
+    ZmGlobalSettings().fImageProcMaxThreads = old_count;
+}
+BENCHMARK(BM_Lanczos3Plain)->Unit(benchmark::kMillisecond);
+
 void BM_BilinearPlain(benchmark::State& state) {
     const bool shrink = state.range(0) != 0;
     const auto source = shrink ? MakePicture(kLargeWidth, kLargeHeight)

@@ -1,5 +1,5 @@
-// Any bytes as a JPEG file: parameters only, default and native pixels, a scaled load; what loads
-// is written again.
+// Any bytes as a JPEG file: parameters only, default and native pixels, a scaled load, always with
+// the picture turned upright; what loads is written again.
 
 #include <cstddef>
 #include <cstdint>
@@ -26,6 +26,7 @@ void Load(const std::uint8_t* data, std::size_t size, const zm::TJpegReadOptions
     zm::TZmBitmap bitmap;
     zm::TIOParams params;
     params.fJPEG_Scale = scale;
+    params.fJPEG_EnableAdjustOrientation = true;
     bool aborting = false;
     zm::TProgressRec progress;
     progress.Aborting = &aborting;

@@ -14,8 +14,9 @@ PackagesFor() {
             echo g++ cmake ninja-build libpng-dev libjpeg62-turbo-dev zlib1g-dev libhwy-dev \
                 libcli11-dev ;;
         # ImageMagick is the independent eye that opens what the module wrote.
-        test) PackagesFor build; echo libgtest-dev libgmock-dev googletest python3 imagemagick ;;
-        bench) PackagesFor build; echo libbenchmark-dev python3 ;;
+        test) PackagesFor build; echo libgtest-dev libgmock-dev googletest python3 imagemagick \
+            libjpeg-turbo-progs pngcheck ;;
+        bench) PackagesFor build; echo libbenchmark-dev libjpeg-turbo-progs python3 ;;
         fuzz) PackagesFor build; echo clang libclang-rt-dev ;;
         check) PackagesFor test; echo clang-format clang-tidy ;;
         windows)

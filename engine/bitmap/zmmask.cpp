@@ -2,9 +2,8 @@
 
 #include <algorithm>
 #include <cstring>
-#include <new>
-#include <stdexcept>
 
+#include "engine/bitmap/zmbitmapmemory_p.h"
 #include "engine/bitmap/zmpixelformats.h"
 #include "engine/foundation/zmnumbers.h"
 
@@ -52,6 +51,10 @@ bool IsRowFull(const std::uint8_t* row, std::int32_t width, std::int32_t bits_pe
 
 }  // namespace
 
+void TZmMaskBitsDeleter::operator()(std::uint8_t* bits) const {
+    FreeBitmapBlock(bits, zmmaAuto, size_bytes);
+}
+
 void TZmMask::ResetRect() {
     fX1 = kMaxInt32;
     fY1 = kMaxInt32;
@@ -77,7 +80,7 @@ bool TZmMask::AllocateBits(std::int32_t width, std::int32_t height,
 }
 
 void TZmMask::FreeBits() {
-    fBits = {};
+    fBits.reset();
     fWidth = 0;
     fHeight = 0;
     fBitsperpixel = 0;
@@ -90,16 +93,16 @@ std::uint8_t* TZmMask::GetScanLine(std::int32_t row) {
     if (row < 0 || row >= fHeight) {
         return nullptr;
     }
-    if (fBits.empty()) {
-        try {
-            fBits.resize(static_cast<std::size_t>(fRowlen * fHeight));
-        } catch (const std::bad_alloc&) {
-            return nullptr;
-        } catch (const std::length_error&) {
+    if (fBits == nullptr) {
+        const std::int64_t size_bytes = fRowlen * fHeight;
+        void* const block = AllocateBitmapBlock(zmmaAuto, size_bytes);
+        if (block == nullptr) {
             return nullptr;
         }
+        std::memset(block, 0, BitsSize());
+        fBits = {static_cast<std::uint8_t*>(block), TZmMaskBitsDeleter{size_bytes}};
     }
-    return fBits.data() + (fHeight - row - 1) * fRowlen;
+    return fBits.get() + (fHeight - row - 1) * fRowlen;
 }
 
 void TZmMask::SetPixel(std::int32_t x, std::int32_t y, std::int32_t alpha) {
@@ -144,7 +147,7 @@ void TZmMask::Fill(std::int32_t alpha) {
         return;
     }
     const std::int32_t byte = fBitsperpixel == 8 ? alpha & 255 : alpha != 0 ? 255 : 0;
-    std::memset(fBits.data(), byte, fBits.size());
+    std::memset(fBits.get(), byte, BitsSize());
     ResetRect();
     fFull = byte == 255;
     if (byte != 0) {
@@ -156,7 +159,9 @@ void TZmMask::Fill(std::int32_t alpha) {
 }
 
 void TZmMask::Empty() {
-    std::fill(fBits.begin(), fBits.end(), std::uint8_t{0});
+    if (fBits != nullptr) {
+        std::memset(fBits.get(), 0, BitsSize());
+    }
     fFull = false;
     ResetRect();
 }
@@ -165,11 +170,18 @@ void TZmMask::Assign(TZmMask& source) {
     if (&source == this) {
         return;
     }
-    fBits = source.fBits;
+    FreeBits();
     fWidth = source.fWidth;
     fHeight = source.fHeight;
     fBitsperpixel = source.fBitsperpixel;
     fRowlen = source.fRowlen;
+    if (source.fBits != nullptr) {
+        if (GetScanLine(0) == nullptr) {
+            FreeBits();
+            return;
+        }
+        std::memcpy(fBits.get(), source.fBits.get(), BitsSize());
+    }
     fX1 = source.fX1;
     fY1 = source.fY1;
     fX2 = source.fX2;

@@ -1,7 +1,9 @@
 #include "engine/bitmap/zmonebit_p.h"
 
+#include <array>
 #include <cstring>
 
+#include "engine/bitmap/zmrowconvert_fast_p.h"
 #include "engine/foundation/zmnumbers.h"
 
 namespace zm {
@@ -38,6 +40,13 @@ void PackBits(std::uint8_t* dest, std::int32_t width, Predicate&& is_set) {
     }
 }
 
+/// Pixels done by the fast function, 0 when the processor has none.
+std::int32_t RunFastBitsAbove(const std::uint8_t* gray, std::uint8_t* dest, std::int32_t width,
+                              const std::uint8_t* levels) {
+    const TZmBitsAboveFunction run = FindFastBitsAbove();
+    return run != nullptr ? run(gray, dest, width, levels) : 0;
+}
+
 struct TMean {
     std::int64_t count = 0;
     std::int64_t sum = 0;
@@ -57,11 +66,21 @@ TMean MeanOf(const TGrayHistogram& histogram, std::int32_t first, std::int32_t l
 
 }  // namespace
 
+void PlainOrderedBitsFromGray(const std::uint8_t* gray, std::uint8_t* dest, std::int32_t width,
+                              std::int32_t y) {
+    PackBits(dest, width,
+             [gray, y](std::int32_t x) { return kOrderedMatrix[x & 7][y & 7] < gray[x] >> 2; });
+}
+
+/// An entry lies below a grey's quarter when the grey lies above four times the entry plus 3.
 void OrderedBitsFromGray(const std::uint8_t* gray, std::uint8_t* dest, std::int32_t width,
                          std::int32_t y) {
-    PackBits(dest, width, [gray, y](std::int32_t x) {
-        return kOrderedMatrix[x & 7][y & 7] < gray[x] >> 2;
-    });
+    std::array<std::uint8_t, 8> levels{};
+    for (std::size_t x = 0; x < levels.size(); ++x) {
+        levels[x] = static_cast<std::uint8_t>(kOrderedMatrix[x][y & 7] * 4 + 3);
+    }
+    const std::int32_t done = RunFastBitsAbove(gray, dest, width, levels.data());
+    PlainOrderedBitsFromGray(gray + done, dest + done / 8, width - done, y);
 }
 
 void OrderedBitsFromFloat(const std::uint8_t* values, std::uint8_t* dest, std::int32_t width,
@@ -76,9 +95,20 @@ void OrderedBitsFromFloat(const std::uint8_t* values, std::uint8_t* dest, std::i
     });
 }
 
+void PlainThresholdBits(const std::uint8_t* gray, std::uint8_t* dest, std::int32_t width,
+                        std::int32_t level) {
+    PackBits(dest, width, [gray, level](std::int32_t x) { return gray[x] > level; });
+}
+
 void ThresholdBits(const std::uint8_t* gray, std::uint8_t* dest, std::int32_t width,
                    std::int32_t level) {
-    PackBits(dest, width, [gray, level](std::int32_t x) { return gray[x] > level; });
+    std::int32_t done = 0;
+    if (level >= 0 && level <= 255) {
+        std::array<std::uint8_t, 8> levels{};
+        levels.fill(static_cast<std::uint8_t>(level));
+        done = RunFastBitsAbove(gray, dest, width, levels.data());
+    }
+    PlainThresholdBits(gray + done, dest + done / 8, width - done, level);
 }
 
 void AddToHistogram(const std::uint8_t* gray, std::int32_t width, TGrayHistogram& histogram) {

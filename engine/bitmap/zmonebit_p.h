@@ -11,13 +11,21 @@ namespace zm {
 void OrderedBitsFromGray(const std::uint8_t* gray, std::uint8_t* dest, std::int32_t width,
                          std::int32_t y);
 
-/// The same for a row of floats, against the halved value itself.
+/// The same pixel by pixel: the rule as stated, whose bits OrderedBitsFromGray gives.
+void PlainOrderedBitsFromGray(const std::uint8_t* gray, std::uint8_t* dest, std::int32_t width,
+                              std::int32_t y);
+
+/// As OrderedBitsFromGray for a row of floats, against the halved value itself.
 void OrderedBitsFromFloat(const std::uint8_t* values, std::uint8_t* dest, std::int32_t width,
                           std::int32_t y);
 
 /// Sets the bits of pixels whose grey is above `level`.
 void ThresholdBits(const std::uint8_t* gray, std::uint8_t* dest, std::int32_t width,
                    std::int32_t level);
+
+/// The same pixel by pixel.
+void PlainThresholdBits(const std::uint8_t* gray, std::uint8_t* dest, std::int32_t width,
+                        std::int32_t level);
 
 using TGrayHistogram = std::array<std::int64_t, 256>;
 

@@ -18,11 +18,11 @@ class TZmBitmap;
 /// image keeps its own palette. Which method serves the others, and how thoroughly, follows
 /// fColorReductionAlgorithm and fColorReductionQuality of the settings.
 ///
-/// Not thread-safe: GetRGBIndex remembers its last answers.
+/// Not thread-safe: GetRGBIndex remembers its answers.
 class TZmQuantizer {
 public:
-    /// Fills `color_map` (resized to `color_count` entries, limited to 2 to 1024; entries not in
-    /// use are black). The bitmap is only read, and only here.
+    /// Fills `color_map` (resized to `color_count` entries, limited to 1 to 1024; entries not in
+    /// use are black; who writes a palette to a file asks for 256 at most). The bitmap is only read, and only here.
     TZmQuantizer(TZmBitmap& source, std::vector<TRGB>& color_map, std::int32_t color_count);
     ~TZmQuantizer();
     TZmQuantizer(const TZmQuantizer&) = delete;

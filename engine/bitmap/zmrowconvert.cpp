@@ -8,6 +8,7 @@
 #include <cstring>
 
 #include "engine/bitmap/zmpixelformats.h"
+#include "engine/bitmap/zmrowconvert_fast_p.h"
 #include "engine/bitmap/zmrowconvert_p.h"
 #include "engine/foundation/zmsettings.h"
 
@@ -67,8 +68,7 @@ bool HasSmallCoefs(const TZmRowContext& context) {
 
 /// Grey of colours that `pixel(x)` gives as a TRGB; usual weights take a 32-bit loop.
 template <typename Pixel>
-void GrayRow(std::uint8_t* dest, std::int32_t width, const TZmRowContext& context,
-             Pixel&& pixel) {
+void GrayRow(std::uint8_t* dest, std::int32_t width, const TZmRowContext& context, Pixel&& pixel) {
     if (!HasSmallCoefs(context)) {
         for (std::int32_t x = 0; x < width; ++x) {
             const TRGB rgb = pixel(x);
@@ -123,16 +123,14 @@ constexpr auto kBitsTo8g = MakeNibbleTable<1>({0}, {255});
 constexpr auto kBitsTo16g = MakeNibbleTable<2>({0, 0}, {255, 255});
 constexpr auto kBitsTo24 = MakeNibbleTable<3>({0, 0, 0}, {255, 255, 255});
 constexpr auto kBitsTo32f = MakeNibbleTable<4>({0, 0, 0, 0}, {0, 0, 0x80, 0x3F});  // 1.0f
-constexpr auto kBitsTo48 = MakeNibbleTable<6>({0, 0, 0, 0, 0, 0},
-                                              {255, 255, 255, 255, 255, 255});
+constexpr auto kBitsTo48 = MakeNibbleTable<6>({0, 0, 0, 0, 0, 0}, {255, 255, 255, 255, 255, 255});
 constexpr auto kBitsTo32 = MakeNibbleTable<4>({0, 0, 0, 255}, {255, 255, 255, 255});
 
 // From zm8p.
 
 /// Replaces each byte by `pixel(byte)`; wide rows compute the 256 pixels once.
 template <typename T, typename Pixel>
-void MapBytes(const std::uint8_t* source, std::uint8_t* dest, std::int32_t width,
-              Pixel&& pixel) {
+void MapBytes(const std::uint8_t* source, std::uint8_t* dest, std::int32_t width, Pixel&& pixel) {
     if (width < kTableWidth) {
         for (std::int32_t x = 0; x < width; ++x, dest += sizeof(T)) {
             Store<T>(dest, pixel(source[x]));
@@ -319,8 +317,8 @@ void Row32fTo8g(const std::uint8_t* source, std::uint8_t* dest, std::int32_t wid
 void Row32fTo16g(const std::uint8_t* source, std::uint8_t* dest, std::int32_t width,
                  const TZmRowContext&) {
     for (std::int32_t x = 0; x < width; ++x) {
-        Store(dest + 2 * x, static_cast<std::uint16_t>(
-                                UnitToInteger(Load<float>(source + 4 * x), 65535.0)));
+        Store(dest + 2 * x,
+              static_cast<std::uint16_t>(UnitToInteger(Load<float>(source + 4 * x), 65535.0)));
     }
 }
 void Row32fTo24(const std::uint8_t* source, std::uint8_t* dest, std::int32_t width,
@@ -401,8 +399,7 @@ void Row32To24(const std::uint8_t* source, std::uint8_t* dest, std::int32_t widt
     }
 }
 
-using TFunctionTable = std::array<std::array<TZmRowFunction, kPixelFormatCount>,
-                                  kPixelFormatCount>;
+using TFunctionTable = std::array<std::array<TZmRowFunction, kPixelFormatCount>, kPixelFormatCount>;
 
 constexpr TFunctionTable MakeFunctionTable() {
     TFunctionTable table{};
@@ -465,7 +462,30 @@ void SetCMYKTransform(const TZmCMYKTransform* transform) {
     cmyk_transform.store(transform);
 }
 
+/// Each store writes a byte too many, which the next one takes back. A copy of the palette has
+/// that byte behind its last entry too.
+void Row8pTo24Fast(const std::uint8_t* source, std::uint8_t* dest, std::int32_t width,
+                   const TZmRowContext& context) {
+    if (width < kTableWidth) {
+        Row8pTo24(source, dest, width, context);
+        return;
+    }
+    std::array<std::uint8_t, 3 * 256 + 1> colors;
+    std::memcpy(colors.data(), context.palette, 3 * 256);
+    colors.back() = 0;
+    for (std::int32_t x = 1; x < width; ++x, dest += 3) {
+        Store(dest, Load<std::uint32_t>(colors.data() + 3 * *source++));
+    }
+    std::memcpy(dest, colors.data() + 3 * *source, 3);
+}
+
 TZmRowFunction FindRowFunction(TZmPixelFormat from, TZmPixelFormat to) {
+    const TZmRowFunction fast =
+        from == zm8p && to == zm24RGB ? Row8pTo24Fast : FindFastRowFunction(from, to);
+    return fast != nullptr ? fast : FindPlainRowFunction(from, to);
+}
+
+TZmRowFunction FindPlainRowFunction(TZmPixelFormat from, TZmPixelFormat to) {
     return from < kPixelFormatCount && to < kPixelFormatCount ? kRowFunctions[from][to] : nullptr;
 }
 
@@ -498,7 +518,7 @@ TRGB RowPixelToRGB(const std::uint8_t* row, std::int32_t x, TZmPixelFormat forma
     TRGB rgb;
     if (format == zm24RGB) {
         std::memcpy(&rgb, pixel, sizeof rgb);
-    } else if (const TZmRowFunction convert = FindRowFunction(format, zm24RGB)) {
+    } else if (const TZmRowFunction convert = FindPlainRowFunction(format, zm24RGB)) {
         convert(pixel, reinterpret_cast<std::uint8_t*>(&rgb), 1,
                 format == zmCMYK ? MakeRowContext(nullptr) : TZmRowContext{});
     }

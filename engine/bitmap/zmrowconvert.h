@@ -34,12 +34,16 @@ struct TZmRowContext {
 
 /// Converts `width` pixels; `source` and `dest` do not overlap. No byte behind the last pixel of
 /// `dest` changes, but for the unused bits of its last byte in zm1g, which become 0.
-using TZmRowFunction = void (*)(const std::uint8_t* source, std::uint8_t* dest,
-                                std::int32_t width, const TZmRowContext& context);
+using TZmRowFunction = void (*)(const std::uint8_t* source, std::uint8_t* dest, std::int32_t width,
+                                const TZmRowContext& context);
 
 /// The direct row function of a pair, or nil when there is none (equal formats, routes through
-/// zm24RGB, 1-bit output, quantising).
+/// zm24RGB, 1-bit output, quantising). The fastest for the processor at hand; for rows, not for
+/// single pixels.
 TZmRowFunction FindRowFunction(TZmPixelFormat from, TZmPixelFormat to);
+
+/// The same without regard to speed: the stated arithmetic, whose bytes every other gives too.
+TZmRowFunction FindPlainRowFunction(TZmPixelFormat from, TZmPixelFormat to);
 
 /// Grey weights and CMYK transform from the global settings, palette as given.
 TZmRowContext MakeRowContext(const TRGB* palette);

@@ -30,8 +30,12 @@ std::int64_t DefaultMinFileSize() {
 
 }  // namespace
 
-TZmBitmap::TZmBitmap()
+TZmBitmapState::TZmBitmapState()
     : fmemmap(std::make_unique<TZmFileBuffer>()), fMinFileSize(DefaultMinFileSize()) {}
+
+TZmBitmapState::~TZmBitmapState() = default;
+
+TZmBitmap::TZmBitmap() = default;
 
 TZmBitmap::TZmBitmap(std::int32_t width, std::int32_t height, TZmPixelFormat format)
     : TZmBitmap() {
@@ -52,6 +56,25 @@ TZmBitmap::TZmBitmap(TZmBitmap& source, const TRect& rect) : TZmBitmap() {
         }
         source.CopyRectTo(this, rect.left, rect.top, 0, 0, fWidth, fHeight, /*copy_alpha=*/true);
     }
+}
+
+TZmBitmap::TZmBitmap(TBitmap& source) : TZmBitmap() {
+    TZmBitmap borrowed;
+    borrowed.EncapsulateTBitmap(&source, /*do_free_image=*/false);
+    AssignEx(&borrowed, /*with_params=*/false);
+}
+
+TZmBitmap::TZmBitmap(TBitmap& source, const TRect& rect) : TZmBitmap() {
+    TZmBitmap borrowed;
+    borrowed.EncapsulateTBitmap(&source, /*do_free_image=*/false);
+    TZmBitmap part(borrowed, rect);
+    part.SwitchTo(this);
+}
+
+TZmBitmap::TZmBitmap(void* memory, std::int32_t width, std::int32_t height,
+                     TZmPixelFormat format)
+    : TZmBitmap() {
+    EncapsulateMemory(memory, width, height, format, /*do_free_image=*/false, zmboTOPLEFT);
 }
 
 TZmBitmap::~TZmBitmap() {

@@ -1,45 +1,23 @@
 #pragma once
 
-#include <array>
 #include <cstdint>
-#include <functional>
 #include <memory>
 #include <string>
 #include <vector>
 
-#include "engine/bitmap/zmbasebitmap.h"
+#include "engine/bitmap/zmbitmapenums.h"
+#include "engine/bitmap/zmbitmapstate.h"
 #include "engine/bitmap/zmpixelformats.h"
-#include "engine/bitmap/zmplatformbitmap.h"
+#include "engine/bitmap/zmrender.h"
 #include "engine/foundation/zmdefs.h"
-#include "engine/foundation/zmutils_filebuffer.h"
 
 namespace zm {
 
 class TIOParams;
 class TStream;
-class TZmBitmap;
+class TZmDibbitmap;
 class TZmMask;
 struct TZmRowLayout;
-
-/// Deleters of objects whose classes live on higher floors; defined there.
-struct TIOParamsDeleter {
-    void operator()(TIOParams* params) const;
-};
-
-/// Supplies the rows of a virtual bitmap.
-class TZmVirtualBitmapProvider {
-public:
-    virtual ~TZmVirtualBitmapProvider() = default;
-    /// Address of `width` pixels of a row from column `start`, valid until the next call.
-    virtual std::uint8_t* GetRow(TZmBitmap* bitmap, std::int32_t row, std::int32_t start,
-                                 std::int32_t width) = 0;
-};
-
-using TZmNotifyEvent = std::function<void(void* sender)>;
-using TZmBitmapProgressEvent = std::function<void(void* sender, std::int32_t percent)>;
-/// Writes pixel (x, y) of a virtual bitmap at `pixel`.
-using TZmRenderVirtualPixelEvent =
-    std::function<void(TZmBitmap* bitmap, std::int32_t x, std::int32_t y, void* pixel)>;
 
 /// `FillColor` of Crop that means: leave the grown area as allocated.
 inline constexpr TColor kCropNoFill = 0x1FFFFFFF;
@@ -54,8 +32,10 @@ inline constexpr TColor kCropNoFill = 0x1FFFFFFF;
 /// Alpha is no channel of the pixel but a second bitmap of format `zm8g`, 255 opaque, owned by
 /// the image. Typed pixel access and rows do not test their arguments in release builds.
 ///
+/// Drawing and the display adjustments are members of the base class.
+///
 /// Not thread-safe, not even for reading rows of a file-backed image through GetScanLine.
-class TZmBitmap : public TZmBaseBitmap {
+class TZmBitmap : public TZmBitmapRendering {
 public:
     // Construction.
     TZmBitmap();
@@ -63,6 +43,14 @@ public:
     /// A copy of another bitmap / of a rectangle of it (right and bottom exclusive).
     explicit TZmBitmap(TZmBitmap& source);
     TZmBitmap(TZmBitmap& source, const TRect& rect);
+    /// The image of a file, found by extension, then by content (see Read, which may raise).
+    /// Empty when the load fails.
+    TZmBitmap(const std::u16string& file_name, TIOParams* params);
+    /// A copy of a platform bitmap / of a rectangle of it.
+    explicit TZmBitmap(TBitmap& source);
+    TZmBitmap(TBitmap& source, const TRect& rect);
+    /// Borrows pixels, top row first, rows aligned to 32 bits (see EncapsulateMemory).
+    TZmBitmap(void* memory, std::int32_t width, std::int32_t height, TZmPixelFormat format);
     ~TZmBitmap() override;
 
     // Size and format. Getters first look at a platform bitmap that may have changed.
@@ -188,18 +176,14 @@ public:
     /// A grey format; zm24RGB, zm32RGB, zm48RGB with equal channels in all pixels; zm8p with
     /// equal channels in all used entries.
     bool IsGrayScale();
-    double GetBlackValue() const { return fBlackValue; }
-    void SetBlackValue(double value) { fBlackValue = value; }
-    double GetWhiteValue() const { return fWhiteValue; }
-    void SetWhiteValue(double value) { fWhiteValue = value; }
     TZmDitherMethod GetDefaultDitherMethod() const { return fDefaultDitherMethod; }
     void SetDefaultDitherMethod(TZmDitherMethod method) { fDefaultDitherMethod = method; }
 
     // Alpha.
     /// The plane, created all opaque when there is none; nil on a plane itself.
-    virtual TZmBitmap* GetAlphaChannel();
+    TZmBitmap* GetAlphaChannel() override;
     /// The plane or nil; never creates one.
-    virtual TZmBitmap* GetAlphaChannelRaw() { return fAlphaChannel.get(); }
+    TZmBitmap* GetAlphaChannelRaw() override { return fAlphaChannel.get(); }
     static std::unique_ptr<TZmBitmap> CreateAsAlphaChannel(std::int32_t width,
                                                            std::int32_t height,
                                                            TZmLocation location);
@@ -213,9 +197,32 @@ public:
     bool GetFull() const { return fFull; }
     void SetFull(bool full) { fFull = full; }
     bool GetIsAlpha() const { return fIsAlpha; }
+    /// Makes the plane when there is none, otherwise resamples it to the image's size (smoothly
+    /// or by nearest neighbour) and refreshes the marks of full planes. Engine/proc.
+    void SyncAlphaChannel(bool anti_alias);
     /// Moves the fourth byte of zm32RGB to the plane or back.
     void SynchronizeRGBA(bool rgba_to_alpha, bool update_pixel_format);
     void AlphaFill(std::int32_t value);
+    /// Fills a rectangle of the plane, made when needed, with a value / with a gradient that
+    /// starts and ends at the rectangle's sides, also where these lie outside the plane.
+    void AlphaFillRect(std::int32_t x1, std::int32_t y1, std::int32_t x2, std::int32_t y2,
+                       std::int32_t value);
+    void AlphaFillRect(std::int32_t x1, std::int32_t y1, std::int32_t x2, std::int32_t y2,
+                       std::int32_t start_value, std::int32_t end_value,
+                       TZmGradientDirection direction);
+    /// Merges a rectangle of this plane (255 without one) into the plane of `dest`, made when
+    /// needed; results are rounded to the nearest and clamped. Clipped like CopyRectTo.
+    void MergeAlphaRectTo(TZmBitmap* dest, std::int32_t src_x, std::int32_t src_y,
+                          std::int32_t dst_x, std::int32_t dst_y, std::int32_t rect_width,
+                          std::int32_t rect_height, TZmAlphaMergeMode mode, double rate);
+    /// Fades the plane toward its transparent pixels (value 0): less than n = `feather_depth` + 1
+    /// pixels from the nearest one, at distance d, a value becomes value * d / n, rounded to the
+    /// nearest. Distances are straight lines, or with `quick` counted in steps to any of the
+    /// eight neighbours. Depths below 1 do nothing, those above 65533 count as that.
+    void FeatherAlphaEdges(std::int32_t feather_depth, bool quick);
+    /// Gives the pixels whose colour channels all lie within two colours, bounds included, an
+    /// alpha. The plane is made when needed.
+    void SetTransparentColors(TRGB min_color, TRGB max_color, std::int32_t alpha);
     /// Plane from an 8-bit or 1-bit mask (set bits opaque) / mask from the plane.
     void CopyFromTZmMask(TZmMask& source);
     void CopyToTZmMask(TZmMask& dest);
@@ -227,6 +234,22 @@ public:
     bool Crop(std::int32_t x1, std::int32_t y1, std::int32_t x2, std::int32_t y2,
               TColor fill_color);
     bool Crop(const TRect& inclusive_rect, TColor fill_color);
+    /// Crops to the pixels that are not transparent. False when nothing changed, which is also
+    /// the answer for an image without alpha, or all transparent.
+    bool CropAlpha();
+    /// Changes the size of the canvas; the picture keeps its own and goes to the given side, a
+    /// centre offset being truncated. New pixels take the value (see Fill) and, in an alpha
+    /// plane, `fill_alpha`. Sizes below 1 do nothing; False without room.
+    bool Resize(std::int32_t new_width, std::int32_t new_height, double background_value,
+                std::int32_t fill_alpha, TZmHorizAlign horiz_align, TZmVertAlign vert_align);
+    /// Adds to each side, or takes away; nothing of the picture may be left.
+    bool Resize(std::int32_t add_left, std::int32_t add_top, std::int32_t add_right,
+                std::int32_t add_bottom, double background_value, std::int32_t fill_alpha);
+    /// Moves a rectangle, alpha included, to another place; what leaves the image is lost. With
+    /// `clear_region` the rectangle takes the value and alpha first.
+    void MoveRegion(std::int32_t x1, std::int32_t y1, std::int32_t x2, std::int32_t y2,
+                    std::int32_t dst_x, std::int32_t dst_y, double background_value,
+                    std::int32_t fill_alpha, bool clear_region);
     /// Copies a rectangle, clipped to both images, converting pixels where the formats differ.
     void CopyRectTo(TZmBitmap* dest, std::int32_t src_x, std::int32_t src_y, std::int32_t dst_x,
                     std::int32_t dst_y, std::int32_t rect_width, std::int32_t rect_height,
@@ -240,8 +263,23 @@ public:
     void Fill(TRGBA value);
     void FillRect(std::int32_t x1, std::int32_t y1, std::int32_t x2, std::int32_t y2,
                   double value);
+    /// Fills with a gradient, each channel of the format on a straight line between the two
+    /// colours, rounded to the nearest, ties to even. In zm1g and zm8p colours go along the line
+    /// and pixels take the nearer of black and white, or the nearest palette entry. The alpha
+    /// plane stays. GradientFillRect starts and ends at the rectangle's sides, also outside.
+    void GradientFill(TColor start_color, TColor end_color, TZmGradientDirection direction);
+    void GradientFillRect(std::int32_t x1, std::int32_t y1, std::int32_t x2, std::int32_t y2,
+                          TColor start_color, TColor end_color,
+                          TZmGradientDirection direction);
 
     // Processing and I/O, defined in the rooms above.
+    /// Mirrors / turns in place, by degrees counter-clockwise (engines: the rotation header). An
+    /// angle of 0 does nothing, not even tell Changed; without room the image stays as it was.
+    void Flip(TFlipDir direction);
+    void Rotate(double angle, TZmAntialiasMode mode, TColor background);
+    void Rotate(double angle, bool antialias, TZmAntialiasMode mode, TColor background);
+    void RotateEx(double angle, TZmAntialiasMode mode, TColor background, void* sender,
+                  const TZmBitmapProgressEvent& on_progress);
     /// Resizes in place (sizing rule and engines: the resampling header).
     void Resample(std::int32_t new_width, std::int32_t new_height, TResampleFilter filter,
                   bool maintain_aspect_ratio, bool shrink_only);
@@ -267,6 +305,24 @@ public:
     bool GetParamsEnabled() const { return fIOParams != nullptr; }
     void SetParamsEnabled(bool enabled);
     TIOParams* GetParams() const { return fIOParams.get(); }
+
+    // Exchange in memory: the raw form (contract in zmrawblob.h), device-independent bitmaps
+    // (zmdibbitmap.h, zmdib.h). False leaves this bitmap as it was.
+    std::int32_t CalcRAWSize();
+    bool SaveRAWToBufferOrStream(void* Buffer, std::int64_t buffer_bytes, TStream* Stream,
+                                 bool StreamHasSize);
+    bool LoadRAWFromBufferOrStream(const void* Buffer, std::int64_t buffer_bytes,
+                                   TStream* Stream);
+    bool CopyFromTDibBitmap(TZmDibbitmap* source);
+    bool CopyToTDibBitmap(TZmDibbitmap* dest, std::int32_t source_x, std::int32_t source_y,
+                          std::int32_t sourceWidth, std::int32_t sourceHeight);
+    void MergeFromTDibBitmap(TZmDibbitmap* source, std::int32_t x, std::int32_t y);
+    bool CopyFromDIB(const void* dib, std::int64_t dib_bytes);
+    bool CopyFromDIB(const void* bitmap_info, std::int64_t info_bytes, const void* pixels,
+                     std::int64_t pixel_bytes);
+    std::vector<std::uint8_t> CreateDIB(std::int32_t dpi_x, std::int32_t dpi_y);
+    std::vector<std::uint8_t> CreateDIB(const TRect& inclusive_rect, std::int32_t dpi_x,
+                                        std::int32_t dpi_y);
 
     const std::u16string& GetFilename() const { return fFilename; }
     void SetFilename(const std::u16string& name) { fFilename = name; }
@@ -325,68 +381,16 @@ private:
     void CopyPixelsFrom(TZmBaseBitmap* source);
     void CopyRGBAToPlane();
     void CopyPlaneToRGBA();
-    bool CropAlphaFrom(TZmBitmap& source, std::int32_t x1, std::int32_t y1);
-    void CropPixelsFrom(TZmBitmap& source, std::int32_t x1, std::int32_t y1, TColor fill_color);
+    bool CropTo(const TRect& inclusive_rect, const double* fill_value, std::int32_t fill_alpha);
+    bool CropAlphaFrom(TZmBitmap& source, std::int32_t x1, std::int32_t y1, std::int32_t alpha);
+    void CropPixelsFrom(TZmBitmap& source, std::int32_t x1, std::int32_t y1,
+                        const double* fill_value);
     bool TakeCropped(TZmBitmap& cropped);
+    bool TakeRaw(TZmBitmap& loaded);
     void CopyRowsTo(TZmBitmap& dest, const TRect& area, std::int32_t shift_x,
                     std::int32_t shift_y, const TRect* frame);
     bool ResizePixels(std::int32_t new_width, std::int32_t new_height);
     void UpdateTBitmapPalette();
-
-    std::unique_ptr<TZmFileBuffer> fmemmap;
-    std::uint8_t* fWorkingMap = nullptr;
-    std::vector<TRGB> fRGBPalette;
-    std::int32_t fPaletteUsed = 256;
-    std::unique_ptr<TZmBitmap> fAlphaChannel;
-    std::uint8_t* fMemory = nullptr;
-    void* fRealMemory = nullptr;
-    std::int64_t fRealMemorySize = 0;
-    TZmMemoryAllocator fRealMemoryAllocator = zmmaAuto;  // the one that made fRealMemory
-    TBitmap* fBitmap = nullptr;
-    std::unique_ptr<TBitmap> fOwnedBitmap;
-    std::vector<std::uint8_t*> fBitmapScanlines;
-    std::vector<std::uint8_t*> fScanlinesToUnMapPtr;
-    std::vector<std::int32_t> fScanlinesToUnMapRow;
-    TZmBitmapOrigin fOrigin = zmboBOTTOMLEFT;
-    std::u16string fFilename;
-    std::int32_t fFileType = 0;
-    std::int32_t fWidth = 0;
-    std::int32_t fHeight = 0;
-    std::int32_t fBitCount = 0;
-    std::int32_t fChannelCount = 0;
-    std::int64_t fRowLen = 0;
-    TZmPixelFormat fPixelFormat = zmnull;
-    bool fIsAlpha = false;
-    TZmLocation fLocation = zmFile;
-    bool fFull = false;
-    bool fEncapsulatedFromTBitmap = false;
-    bool fEncapsulatedFromMemory = false;
-    std::int64_t fMinFileSize = 0;
-    TZmDitherMethod fDefaultDitherMethod = zmThreshold;
-    double fBlackValue = 0;
-    double fWhiteValue = 0;
-    std::array<std::int32_t, 4> fChannelOffset{};
-    bool fEnableChannelOffset = false;
-    std::int32_t fContrast = 0;
-    std::unique_ptr<TZmMask> fAdjustmentsMask;
-    std::int32_t fBitAlignment = 32;
-    TZmMemoryAllocator fMemoryAllocator = zmmaAuto;
-    bool fFullReallocate = true;
-    std::int32_t fCanvasCurrentAlpha = -1;
-    TZmNotifyEvent fOnChanged;
-    TZmBitmapProgressEvent fOnProgress;
-    bool fModified = false;
-    std::int32_t fFragmentsCount = 0;
-    std::int32_t fRowsPerFragment = 0;
-    std::vector<std::uint8_t*> fFragments;
-    TZmRenderVirtualPixelEvent fOnRenderVirtualPixel;
-    TZmVirtualBitmapProvider* fVirtualBitmapProvider = nullptr;
-    std::vector<std::uint8_t> fVirtualBitmapRowBuffer;
-    bool fIsVirtual = false;
-    bool fIsResource = false;
-    std::vector<std::unique_ptr<TZmBitmap>> fSavedBitmaps;
-    bool fWicFastLoading = false;
-    std::unique_ptr<TIOParams, TIOParamsDeleter> fIOParams;
 };
 
 }  // namespace zm

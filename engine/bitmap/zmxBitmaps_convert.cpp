@@ -236,7 +236,7 @@ void TZmBitmap::ConvertGrayRangeFrom(TZmBitmap& source) {
 
 void TZmBitmap::QuantizeFrom(TZmBitmap& source) {
     std::vector<TRGB> palette;
-    TZmQuantizer quantizer(source, palette, std::clamp(fPaletteUsed, 2, kPaletteEntries));
+    TZmQuantizer quantizer(source, palette, std::clamp(fPaletteUsed, 1, kPaletteEntries));
     palette.resize(kPaletteEntries);
     fRGBPalette = palette;
     TIndexCache cache(quantizer);

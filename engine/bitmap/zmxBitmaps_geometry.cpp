@@ -1,77 +1,18 @@
-/// Crop, copies of rectangles and changes of the canvas size.
+/// Copies and moves of rectangles.
 
 #include <algorithm>
-#include <cmath>
 #include <cstring>
-#include <optional>
-#include <utility>
 #include <vector>
 
 #include "engine/bitmap/zmbitrow_p.h"
+#include "engine/bitmap/zmcopyspan_p.h"
+#include "engine/bitmap/zmellipse_p.h"
 #include "engine/bitmap/zmrgbpixels_p.h"
 #include "engine/bitmap/zmxBitmaps.h"
 #include "engine/foundation/zmnumbers.h"
 
 namespace zm {
 namespace {
-
-/// One axis of a copy, in 64 bits so that no sum of coordinates overflows.
-struct TCopySpan {
-    std::int64_t source = 0;
-    std::int64_t dest = 0;
-    std::int64_t length = 0;
-};
-
-/// Clips one axis: a negative destination shortens the run and advances the source, a negative
-/// source starts at 0. Nothing when the run misses the source or the destination.
-std::optional<TCopySpan> ClipSpan(TCopySpan span, std::int64_t source_size,
-                                  std::int64_t dest_size) {
-    if (span.dest < 0) {
-        span.length += span.dest;
-        span.source -= span.dest;
-        span.dest = 0;
-    }
-    if (span.length <= 0 || span.dest >= dest_size || span.source >= source_size ||
-        span.source + span.length <= 0) {
-        return std::nullopt;
-    }
-    span.source = std::max<std::int64_t>(span.source, 0);
-    span.length = std::min({span.length, source_size - span.source, dest_size - span.dest});
-    return span;
-}
-
-/// What a picture of `source_size` pixels has of a new axis of `dest_size` pixels that starts at
-/// coordinate `start` of it. A length of 0 when the two do not meet.
-struct TOverlap {
-    std::int32_t source = 0;
-    std::int32_t dest = 0;
-    std::int32_t length = 0;
-};
-
-TOverlap FindOverlap(std::int32_t start, std::int32_t dest_size, std::int32_t source_size) {
-    const std::int64_t first = std::max(start, 0);
-    const std::int64_t end = std::min<std::int64_t>(source_size, std::int64_t{start} + dest_size);
-    if (first >= end) {
-        return {};
-    }
-    return {static_cast<std::int32_t>(first), static_cast<std::int32_t>(first - start),
-            static_cast<std::int32_t>(end - first)};
-}
-
-/// Columns of a row of an ellipse: those whose centres lie inside it.
-struct TEllipse {
-    double width = 0;
-    double height = 0;
-
-    /// First column and number of columns of row `y`, counted from the ellipse's own corner.
-    std::pair<std::int64_t, std::int64_t> RowSpan(std::int64_t y) const {
-        const double distance = (static_cast<double>(y) + 0.5) / height * 2.0 - 1.0;
-        const double half = std::sqrt(std::max(0.0, 1.0 - distance * distance)) * width / 2.0;
-        const auto first = static_cast<std::int64_t>(std::ceil(width / 2.0 - half - 0.5));
-        const auto last = static_cast<std::int64_t>(std::floor(width / 2.0 + half - 0.5));
-        return {first, last - first + 1};
-    }
-};
 
 /// Copies runs of pixels from rows of one bitmap to rows of another or of the same.
 class TRunCopier {
@@ -125,20 +66,26 @@ private:
     std::vector<std::uint8_t> bits_;
 };
 
-/// Fills what a picture of `inner` (inclusive) leaves free in a bitmap.
-void FillAround(TZmBitmap& bitmap, const TRect& inner, TColor color) {
-    const std::int32_t right = bitmap.GetWidth() - 1;
-    const std::int32_t bottom = bitmap.GetHeight() - 1;
-    const auto value = static_cast<double>(color);
-    bitmap.FillRect(0, 0, right, inner.top - 1, value);
-    bitmap.FillRect(0, inner.top, inner.left - 1, inner.bottom, value);
-    bitmap.FillRect(inner.right + 1, inner.top, right, inner.bottom, value);
-    bitmap.FillRect(0, inner.bottom + 1, right, bottom, value);
+/// Moves an inclusive rectangle that lies inside one plane of pixels.
+void MovePixels(TZmBitmap& pixels, const TRect& region, std::int32_t dst_x,
+                       std::int32_t dst_y, double background_value, bool clear_region) {
+    const std::int32_t width = region.right - region.left + 1;
+    const std::int32_t height = region.bottom - region.top + 1;
+    TZmBitmap moved;
+    moved.SetMinFileSize(pixels.GetMinFileSize());
+    if (!moved.Allocate(width, height, pixels.GetPixelFormat())) {
+        return;
+    }
+    pixels.CopyPaletteTo(&moved);
+    pixels.CopyRectTo(&moved, region.left, region.top, 0, 0, width, height,
+                      /*copy_alpha=*/false);
+    if (clear_region) {
+        pixels.FillRect(region.left, region.top, region.right, region.bottom, background_value);
+    }
+    moved.CopyRectTo(&pixels, 0, 0, dst_x, dst_y, width, height, /*copy_alpha=*/false);
 }
 
 }  // namespace
-
-// Copies of rectangles.
 
 void TZmBitmap::CopyRectTo(TZmBitmap* dest, std::int32_t src_x, std::int32_t src_y,
                            std::int32_t dst_x, std::int32_t dst_y, std::int32_t rect_width,
@@ -162,8 +109,8 @@ void TZmBitmap::CopyToEx(TZmBitmap* dest, std::int32_t src_x, std::int32_t src_y
             plane->fFull = is_full;
         }
     }
-    const auto columns = ClipSpan({src_x, dst_x, rect_width}, fWidth, dest->fWidth);
-    const auto lines = ClipSpan({src_y, dst_y, rect_height}, fHeight, dest->fHeight);
+    const auto columns = ClipCopySpan({src_x, dst_x, rect_width}, fWidth, dest->fWidth);
+    const auto lines = ClipCopySpan({src_y, dst_y, rect_height}, fHeight, dest->fHeight);
     if (!columns || !lines) {
         return;
     }
@@ -194,7 +141,7 @@ void TZmBitmap::CopyRowsTo(TZmBitmap& dest, const TRect& area, std::int32_t shif
         std::int64_t left = area.left;
         std::int64_t right = area.right;
         if (frame != nullptr) {
-            const TEllipse ellipse{static_cast<double>(frame->right),
+            const TZmEllipse ellipse{static_cast<double>(frame->right),
                                    static_cast<double>(frame->bottom)};
             const auto [first, count] = ellipse.RowSpan(std::int64_t{y} - frame->top);
             left = std::max(left, frame->left + first);
@@ -214,150 +161,32 @@ void TZmBitmap::CopyRowsTo(TZmBitmap& dest, const TRect& area, std::int32_t shif
     }
 }
 
-// Crop.
-
-bool TZmBitmap::Crop(std::int32_t x1, std::int32_t y1, std::int32_t x2, std::int32_t y2,
-                     TColor fill_color) {
+void TZmBitmap::MoveRegion(std::int32_t x1, std::int32_t y1, std::int32_t x2, std::int32_t y2,
+                           std::int32_t dst_x, std::int32_t dst_y, double background_value,
+                           std::int32_t fill_alpha, bool clear_region) {
     if (IsEmpty() || fIsVirtual) {
-        return false;
-    }
-    if (x1 > x2 || y1 > y2 || (x1 == 0 && y1 == 0 && x2 == fWidth - 1 && y2 == fHeight - 1)) {
-        return true;
-    }
-    const std::int64_t width = std::int64_t{x2} - x1 + 1;
-    const std::int64_t height = std::int64_t{y2} - y1 + 1;
-    TZmBitmap cropped;
-    cropped.CopySettingsFrom(*this);
-    cropped.fMinFileSize = fMinFileSize;
-    cropped.fMemoryAllocator = fMemoryAllocator;
-    cropped.fPaletteUsed = fPaletteUsed;
-    if (width > kMaxInt32 || height > kMaxInt32 ||
-        !cropped.Allocate(static_cast<std::int32_t>(width), static_cast<std::int32_t>(height),
-                          fPixelFormat) ||
-        !cropped.CropAlphaFrom(*this, x1, y1)) {
-        return false;
-    }
-    cropped.fRGBPalette = fRGBPalette;
-    cropped.CropPixelsFrom(*this, x1, y1, fill_color);
-    return TakeCropped(cropped);
-}
-
-/// Takes over what `source` has of this new image, whose corner lies at x1, y1 there, and fills
-/// the rest.
-void TZmBitmap::CropPixelsFrom(TZmBitmap& source, std::int32_t x1, std::int32_t y1,
-                               TColor fill_color) {
-    const bool is_filled = fill_color != kCropNoFill;
-    const TOverlap columns = FindOverlap(x1, fWidth, source.fWidth);
-    const TOverlap lines = FindOverlap(y1, fHeight, source.fHeight);
-    const bool is_overlapping = columns.length > 0 && lines.length > 0;
-    if (is_filled && (!is_overlapping || fPixelFormat == zm1g)) {
-        // One bit a pixel is filled whole, which gives the unused bits of the rows a value too.
-        Fill(static_cast<double>(fill_color));
-    } else if (is_filled) {
-        FillAround(*this,
-                   TRect{columns.dest, lines.dest, columns.dest + columns.length - 1,
-                         lines.dest + lines.length - 1},
-                   fill_color);
-    }
-    source.CopyRectTo(this, columns.source, lines.source, columns.dest, lines.dest,
-                      columns.length, lines.length, /*copy_alpha=*/false);
-}
-
-/// Gives this new image the plane of `source`, cropped at the same corner; grown parts are
-/// opaque. False without room.
-bool TZmBitmap::CropAlphaFrom(TZmBitmap& source, std::int32_t x1, std::int32_t y1) {
-    TZmBitmap* const plane = source.fAlphaChannel.get();
-    if (plane == nullptr) {
-        return true;
-    }
-    TZmBitmap* const cropped = GetAlphaChannel();
-    if (cropped == nullptr || cropped->IsEmpty()) {
-        return false;
-    }
-    const TOverlap columns = FindOverlap(x1, fWidth, plane->fWidth);
-    const TOverlap lines = FindOverlap(y1, fHeight, plane->fHeight);
-    plane->CopyRectTo(cropped, columns.source, lines.source, columns.dest, lines.dest,
-                      columns.length, lines.length, /*copy_alpha=*/false);
-    cropped->fFull = plane->fFull;
-    return true;
-}
-
-bool TZmBitmap::Crop(const TRect& inclusive_rect, TColor fill_color) {
-    return Crop(inclusive_rect.left, inclusive_rect.top, inclusive_rect.right,
-                inclusive_rect.bottom, fill_color);
-}
-
-/// Makes a cropped picture this object's own; events and file parameters stay.
-bool TZmBitmap::TakeCropped(TZmBitmap& cropped) {
-    if (fLocation == zmTBitmap) {
-        if (!ReplaceTBitmapPixels(cropped)) {
-            return false;
-        }
-    } else {
-        FreePixels();
-        MovePixelsFrom(cropped);
-    }
-    fAlphaChannel = std::move(cropped.fAlphaChannel);
-    Changed();
-    return true;
-}
-
-// Canvas size.
-
-void TZmBitmap::SetWidth(std::int32_t width) {
-    if (width >= 0 && width != GetWidth()) {
-        ResizeSide(width, fHeight);
-    }
-}
-
-void TZmBitmap::SetHeight(std::int32_t height) {
-    if (height >= 0 && height != GetHeight()) {
-        ResizeSide(fWidth, height);
-    }
-}
-
-/// Changes one side. Rows and columns that both sizes have keep their pixels. A side of 0 lets
-/// the pixels go, and without room the image stays as it was.
-void TZmBitmap::ResizeSide(std::int32_t new_width, std::int32_t new_height) {
-    const bool has_room = fIsVirtual || ResizePixels(new_width, new_height);
-    if (!has_room) {
         return;
     }
-    fWidth = new_width;
-    fHeight = new_height;
-    DeriveFields();
-    if (fAlphaChannel != nullptr) {
-        fAlphaChannel->ResizeSide(new_width, new_height);
+    const TRect region{std::max(x1, 0), std::max(y1, 0), std::min(x2, fWidth - 1),
+                       std::min(y2, fHeight - 1)};
+    if (region.left > region.right || region.top > region.bottom) {
+        return;
+    }
+    // What lies outside the image stays behind, and the rest keeps its place in the rectangle.
+    const std::int32_t to_x = SaturateToInt32(std::int64_t{dst_x} + region.left - x1);
+    const std::int32_t to_y = SaturateToInt32(std::int64_t{dst_y} + region.top - y1);
+    MovePixels(*this, region, to_x, to_y, background_value, clear_region);
+    TZmBitmap* const plane = fAlphaChannel.get();
+    if (plane != nullptr && !plane->IsEmpty()) {
+        const TRect part{region.left, region.top, std::min(region.right, plane->fWidth - 1),
+                         std::min(region.bottom, plane->fHeight - 1)};
+        const bool is_full = plane->fFull && (!clear_region || (fill_alpha & 255) == 255);
+        if (part.left <= part.right && part.top <= part.bottom) {
+            MovePixels(*plane, part, to_x, to_y, fill_alpha, clear_region);
+        }
+        plane->fFull = is_full;
     }
     Changed();
-}
-
-bool TZmBitmap::ResizePixels(std::int32_t new_width, std::int32_t new_height) {
-    if (new_width == 0 || new_height == 0 || fPixelFormat == zmnull) {
-        FreePixels();
-        return true;
-    }
-    TZmBitmap resized;
-    resized.CopySettingsFrom(*this);
-    resized.fMinFileSize = fMinFileSize;
-    resized.fMemoryAllocator = fMemoryAllocator;
-    if (!resized.Allocate(new_width, new_height, fPixelFormat)) {
-        return false;
-    }
-    resized.fRGBPalette = fRGBPalette;
-    resized.fPaletteUsed = fPaletteUsed;
-    if (!IsEmpty()) {
-        const auto row_bytes = static_cast<std::size_t>(std::min(fRowLen, resized.fRowLen));
-        for (std::int32_t y = 0; y < std::min(fHeight, new_height); ++y) {
-            std::memcpy(resized.GetScanLine(y), GetScanLine(y), row_bytes);
-        }
-    }
-    if (fLocation == zmTBitmap) {
-        return ReplaceTBitmapPixels(resized);
-    }
-    FreePixels();
-    MovePixelsFrom(resized);
-    return true;
 }
 
 }  // namespace zm

@@ -16,11 +16,11 @@
 #include "engine/bitmap/zmpixelformats.h"
 #include "engine/bitmap/zmxBitmaps.h"
 #include "engine/codecs/bmpfilt_p.h"
+#include "engine/foundation/zmbytereader.h"
 #include "engine/foundation/zmnumbers.h"
 #include "engine/foundation/zmsettings.h"
 #include "engine/foundation/zmstreams.h"
 #include "engine/io/zmbufferedstreams.h"
-#include "engine/io/zmbytereader.h"
 #include "engine/io/zmimagelimits.h"
 #include "engine/io/zmioparams.h"
 

@@ -12,10 +12,10 @@
 #include "engine/bitmap/zmxBitmaps.h"
 #include "engine/codecs/bmpfilt.h"
 #include "engine/codecs/bmpfilt_p.h"
+#include "engine/foundation/zmbytereader.h"
 #include "engine/foundation/zmnumbers.h"
 #include "engine/foundation/zmstreams.h"
 #include "engine/io/zmbufferedstreams.h"
-#include "engine/io/zmbytereader.h"
 #include "engine/io/zmioparams.h"
 
 namespace zm {

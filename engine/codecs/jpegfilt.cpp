@@ -17,9 +17,11 @@
 #include "engine/codecs/jpegfilt_p.h"
 #include "engine/foundation/zmassert.h"
 #include "engine/foundation/zmnumbers.h"
+#include "engine/foundation/zmsettings.h"
 #include "engine/io/zmbufferedstreams.h"
 #include "engine/io/zmimagelimits.h"
 #include "engine/io/zmioparams.h"
+#include "engine/metadata/zmmetahooks.h"
 
 #include <jerror.h>
 
@@ -203,7 +205,11 @@ public:
     [[nodiscard]] bool ReadHeader();
     void FillResolution();
     void CollectMarkers();
-    void ChooseColors(bool native_format);
+    void ChooseColors(const TJpegReadOptions& options);
+    void UseProfile(TZmProfileRow rows) { profile_rows_ = std::move(rows); }
+    [[nodiscard]] bool GoesThroughProfile(bool has_profile) const;
+    [[nodiscard]] TZmPixelFormat FileFormat() const;
+    [[nodiscard]] TZmPixelFormat TargetFormat() const { return format_; }
     [[nodiscard]] bool ChooseScale();
     [[nodiscard]] bool SizeIsAcceptable();
     [[nodiscard]] bool Start();
@@ -218,7 +224,7 @@ private:
     void InitSource(TStream& stream, std::int64_t byte_limit);
     void InitMonitor();
     bool ScansAreComplete() const;
-    std::uint8_t* ConvertTarget(std::uint8_t* bitmap_row);
+    void FinishRow(std::uint8_t* bitmap_row, std::int32_t width);
     void LoopOverRows(TZmBitmap& bitmap);
 
     jpeg_decompress_struct decoder_ = {};
@@ -229,8 +235,9 @@ private:
     TProgressRec& progress_;
     std::int64_t file_bytes_;
     TZmPixelFormat format_ = zm24RGB;
-    std::vector<std::uint8_t> cmyk_row_;  // only when CMYK becomes RGB
+    std::vector<std::uint8_t> file_row_;  // only when rows are converted on their way
     TZmRowFunction convert_cmyk_ = nullptr;
+    TZmProfileRow profile_rows_;
     bool rows_done_ = false;
 };
 
@@ -301,7 +308,7 @@ void TJpegReader::CollectMarkers() {
     }
 }
 
-void TJpegReader::ChooseColors(bool native_format) {
+void TJpegReader::ChooseColors(const TJpegReadOptions& options) {
     params_.SetImageCount(1);
     params_.fBitsPerSample = 8;
     params_.fSamplesPerPixel = decoder_.num_components;
@@ -310,7 +317,7 @@ void TJpegReader::ChooseColors(bool native_format) {
     switch (decoder_.jpeg_color_space) {
         case JCS_GRAYSCALE:
             params_.fJPEG_ColorSpace = ioJPEG_GRAYLEV;
-            if (native_format) {
+            if (options.native_format) {
                 decoder_.out_color_space = JCS_GRAYSCALE;
                 format_ = zm8g;
             }
@@ -320,18 +327,32 @@ void TJpegReader::ChooseColors(bool native_format) {
             break;
         case JCS_YCbCr:
             params_.fJPEG_ColorSpace = ioJPEG_YCbCr;
+            if (options.keep_ycbcr) {
+                decoder_.out_color_space = JCS_YCbCr;
+            }
             break;
         case JCS_CMYK:
         case JCS_YCCK:
             params_.fJPEG_ColorSpace =
                 decoder_.jpeg_color_space == JCS_CMYK ? ioJPEG_CMYK : ioJPEG_YCbCrK;
             decoder_.out_color_space = JCS_CMYK;
-            format_ = native_format ? zmCMYK : zm24RGB;
+            format_ = options.native_format ? zmCMYK : zm24RGB;
             break;
         default:
             throw EZmJpegException(
                 JpegMessageText(JpegMessageNumber(JERR_CONVERSION_NOTIMPL)));
     }
+}
+
+/// Format of the rows that the library delivers.
+TZmPixelFormat TJpegReader::FileFormat() const {
+    return decoder_.out_color_space == JCS_CMYK ? zmCMYK : format_;
+}
+
+/// Ink amounts that are to be kept, and samples that are no colours yet, are left alone.
+bool TJpegReader::GoesThroughProfile(bool has_profile) const {
+    return has_profile && ZmGlobalSettings().fEnableCMS && format_ != zmCMYK &&
+           decoder_.out_color_space != JCS_YCbCr;
 }
 
 bool TJpegReader::ChooseScale() {
@@ -401,17 +422,33 @@ bool TJpegReader::PrepareBitmap(TZmBitmap& bitmap) {
     if (!bitmap.Allocate(width, height, format_)) {
         return false;
     }
-    if (decoder_.out_color_space == JCS_CMYK && format_ == zm24RGB) {
+    if (FileFormat() != format_) {
         convert_cmyk_ = FindRowFunction(zmCMYK, zm24RGB);
         ZM_ASSERT(convert_cmyk_ != nullptr);
-        cmyk_row_.resize(static_cast<std::size_t>(width) * 4);
+    }
+    if (convert_cmyk_ != nullptr || profile_rows_) {
+        const std::int32_t bits = PixelFormatInfo(FileFormat()).bit_count;
+        file_row_.resize(static_cast<std::size_t>(width) * static_cast<std::size_t>(bits / 8));
     }
     return true;
 }
 
+/// From the row that the library delivered to the bitmap's.
+void TJpegReader::FinishRow(std::uint8_t* bitmap_row, std::int32_t width) {
+    if (profile_rows_ && profile_rows_(file_row_.data(), bitmap_row, width)) {
+        return;
+    }
+    // Required: the ink amounts of CMYK files are taken as stored inverted, 255 for no ink, as the
+    // great majority of such files has them; that is also the form of zmCMYK.
+    if (convert_cmyk_ != nullptr) {
+        convert_cmyk_(file_row_.data(), bitmap_row, width, MakeRowContext(nullptr));
+    } else {
+        std::copy(file_row_.begin(), file_row_.end(), bitmap_row);
+    }
+}
+
 /// Runs inside the guard: no object with a destructor lives here while the library works.
 void TJpegReader::LoopOverRows(TZmBitmap& bitmap) {
-    const TZmRowContext context = MakeRowContext(nullptr);
     const std::int32_t height = bitmap.GetHeight();
     const std::int32_t width = bitmap.GetWidth();
     for (std::int32_t row = 0; row < height; ++row) {
@@ -419,14 +456,12 @@ void TJpegReader::LoopOverRows(TZmBitmap& bitmap) {
         if (bitmap_row == nullptr) {
             return;
         }
-        JSAMPROW target = convert_cmyk_ != nullptr ? cmyk_row_.data() : bitmap_row;
+        JSAMPROW target = file_row_.empty() ? bitmap_row : file_row_.data();
         if (jpeg_read_scanlines(&decoder_, &target, 1) != 1) {
             return;
         }
-        // Required: the ink amounts of CMYK files are taken as stored inverted, 255 for no ink,
-        // as the great majority of such files has them; that is also the form of zmCMYK.
-        if (convert_cmyk_ != nullptr) {
-            convert_cmyk_(cmyk_row_.data(), bitmap_row, width, context);
+        if (!file_row_.empty()) {
+            FinishRow(bitmap_row, width);
         }
         if (!StepProgress(progress_, row + 1)) {
             return;
@@ -452,9 +487,25 @@ bool TJpegReader::Finish() {
     return true;
 }
 
-bool DecodeImage(TJpegReader& reader, TZmBitmap& bitmap, TIOParams& params) {
-    if (!reader.SizeIsAcceptable() || !reader.Start() || !reader.PrepareBitmap(bitmap) ||
-        !reader.ReadRows(bitmap) || !reader.Finish()) {
+/// The rows' way through the input profile is opened last, when the rows are sure to come.
+void OpenProfile(TJpegReader& reader, TIOParams& params, bool has_profile) {
+    const auto open = MetadataHooks().open_profile_rows;
+    if (open != nullptr && reader.GoesThroughProfile(has_profile)) {
+        reader.UseProfile(open(params, reader.FileFormat(), reader.TargetFormat()));
+    }
+}
+
+bool DecodeImage(TJpegReader& reader, TZmBitmap& bitmap, const TJpegMetadata& metadata,
+                 TIOParams& params) {
+    if (!reader.SizeIsAcceptable() || !reader.Start()) {
+        return false;
+    }
+    OpenProfile(reader, params, metadata.has_input_profile);
+    if (!reader.PrepareBitmap(bitmap) || !reader.ReadRows(bitmap) || !reader.Finish()) {
+        return false;
+    }
+    if (params.fJPEG_EnableAdjustOrientation &&
+        !ApplyJpegOrientation(bitmap, params, metadata.orientation)) {
         return false;
     }
     if (params.fJPEG_Scale != ioJPEG_AUTOCALC) {  // there the two fields are the wanted size
@@ -484,7 +535,11 @@ bool ReadJpeg(TStream& stream, TZmBitmap& bitmap, const TJpegReadOptions& option
     }
     reader.FillResolution();
     reader.CollectMarkers();
-    reader.ChooseColors(options.native_format);
+    TJpegMetadata metadata;
+    if (options.read_metadata && params.fGetMetaData) {
+        metadata = ReadJpegMetadata(params);
+    }
+    reader.ChooseColors(options);
     if (!reader.ChooseScale()) {
         return false;
     }
@@ -493,7 +548,7 @@ bool ReadJpeg(TStream& stream, TZmBitmap& bitmap, const TJpegReadOptions& option
         params.fHeight = reader.ImageHeight();
         return true;
     }
-    return DecodeImage(reader, bitmap, params);
+    return DecodeImage(reader, bitmap, metadata, params);
 }
 
 /// Sizes in the parameters, which are a wish before a load and a fact after it.

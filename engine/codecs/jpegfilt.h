@@ -22,9 +22,13 @@ struct TJpegReadOptions {
     bool native_format = false;       ///< keep grey and CMYK pixels as they are
     bool params_only = false;         ///< fill the parameters and leave the bitmap alone
     bool read_metadata = true;        ///< parse EXIF, IPTC, XMP and profile markers
+    bool keep_ycbcr = false;          ///< samples of YCbCr files in zm24RGB, Y in the first byte
 };
 
-/// Reads a JPEG; up to 149 bytes of junk before it are skipped. Bad data, also data that end
+/// Reads a JPEG; markers, resolution and colour space go to `params`, the image is turned upright
+/// when `params.fJPEG_EnableAdjustOrientation` asks for it, and warnings are counted there. With
+/// fJPEG_GetExifThumbnail the embedded thumbnail comes instead of the image, where there is one.
+/// Up to 149 bytes of junk before it are skipped. Bad data, also data that end
 /// before the last row: `*progress.Aborting` true; nothing is raised.
 void ReadJPEGStream(TStream& stream, TZmBitmap& bitmap, const TJpegReadOptions& options,
                     TProgressRec& progress, TIOParams& params);

@@ -6,13 +6,20 @@
 
 #include <csetjmp>
 #include <cstdint>
+#include <span>
 #include <string>
+#include <vector>
+
+#include "engine/metadata/zmmarkers.h"
 
 #ifndef JCS_EXTENSIONS
 #error "A JPEG library with the extended colour spaces (blue first) is needed."
 #endif
 
 namespace zm {
+
+class TIOParams;
+class TZmBitmap;
 
 /// Messages of the JPEG library have numbers 0 to 124. The numbering is that of the library's
 /// 6b line with its cropping extension, so it stays the same whatever library is linked.
@@ -71,5 +78,31 @@ template <typename Step>
 }
 
 inline constexpr std::int32_t kJpegStreamBufferBytes = 65536;
+
+/// What the reader has to know of a file's metadata.
+struct TJpegMetadata {
+    std::int32_t orientation = 1;    ///< 1 to 8
+    bool has_input_profile = false;  ///< rows may go through MetadataHooks().open_profile_rows
+};
+
+/// Takes the metadata out of `params.fJPEG_MarkerList` into the other fields: IPTC, EXIF, XMP,
+/// profile, in this order. The resolution stands in `params` already.
+TJpegMetadata ReadJpegMetadata(TIOParams& params);
+
+/// Turns the image upright and makes fields and EXIF markers say so. False without room.
+[[nodiscard]] bool ApplyJpegOrientation(TZmBitmap& bitmap, TIOParams& params,
+                                        std::int32_t orientation);
+
+/// The markers of a file to be written: the output profile, then the list without the marker that
+/// the library writes by itself.
+TZmMarkerList JpegMarkersToWrite(TIOParams& params);
+
+/// Whether a marker is a piece of a colour profile.
+bool IsJpegProfileMarker(std::uint8_t type, std::span<const std::uint8_t> data);
+/// A profile from its pieces, which may stand in any order; empty when one lacks, comes twice or
+/// disagrees.
+std::vector<std::uint8_t> JoinJpegProfile(const TZmMarkerList& markers);
+/// Appends the pieces of a profile; a profile that is too large for 255 pieces is left out.
+void CutJpegProfile(std::span<const std::uint8_t> profile, TZmMarkerList& markers);
 
 }  // namespace zm

@@ -105,8 +105,7 @@ TColorPlan PlanFor(TIOJPEGColorspace color_space) {
 
 class TJpegWriter {
 public:
-    TJpegWriter(TStream& stream, TZmBitmap& bitmap, const TIOParams& params,
-                TProgressRec& progress);
+    TJpegWriter(TStream& stream, TZmBitmap& bitmap, TIOParams& params, TProgressRec& progress);
     ~TJpegWriter() { jpeg_destroy_compress(&encoder_); }
     TJpegWriter(const TJpegWriter&) = delete;
     TJpegWriter& operator=(const TJpegWriter&) = delete;
@@ -128,6 +127,7 @@ private:
     std::unique_ptr<TJpegDestination> destination_;
     TZmBitmap& bitmap_;
     const TIOParams& params_;
+    const TZmMarkerList markers_;
     TProgressRec& progress_;
     TColorPlan plan_;
     TZmRgbRows rgb_rows_;
@@ -138,11 +138,12 @@ private:
     bool rows_done_ = false;
 };
 
-TJpegWriter::TJpegWriter(TStream& stream, TZmBitmap& bitmap, const TIOParams& params,
+TJpegWriter::TJpegWriter(TStream& stream, TZmBitmap& bitmap, TIOParams& params,
                          TProgressRec& progress)
     : destination_(std::make_unique<TJpegDestination>()),
       bitmap_(bitmap),
       params_(params),
+      markers_(JpegMarkersToWrite(params)),
       progress_(progress),
       plan_(PlanFor(params.fJPEG_ColorSpace)),
       rgb_rows_(bitmap),
@@ -203,16 +204,11 @@ void TJpegWriter::SetSubsampling() {
     }
 }
 
-/// The list as it is, but for APP14: the library writes its own.
 void TJpegWriter::WriteMarkers() {
-    const TZmMarkerList& markers = params_.fJPEG_MarkerList;
-    for (std::int32_t i = 0; i < markers.Count(); ++i) {
-        const std::uint8_t type = markers.GetMarkerType(i);
-        const auto data = markers.GetMarkerData(i);
-        if (type != kMarkerApp14) {
-            jpeg_write_marker(&encoder_, type, data.data(),
-                              static_cast<unsigned>(data.size()));
-        }
+    for (std::int32_t i = 0; i < markers_.Count(); ++i) {
+        const auto data = markers_.GetMarkerData(i);
+        jpeg_write_marker(&encoder_, markers_.GetMarkerType(i), data.data(),
+                          static_cast<unsigned>(data.size()));
     }
 }
 

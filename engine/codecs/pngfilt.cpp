@@ -1,7 +1,8 @@
 // PNG reader: an adapter around libpng, which does the format (Portable Network Graphics, W3C
 // Recommendation; big-endian). Here stand the choice of pixel format and transformations, and how
-// alpha, palette, texts, resolution and background reach the bitmap and the file parameters.
-// Frames of animations behind the first image are not read.
+// alpha, palette, texts, resolution and background reach the bitmap and the file parameters. The
+// chunks that carry EXIF blocks, profiles and international texts are kept for the rooms that know
+// them. Frames of animations behind the first image are not read.
 
 #include "engine/codecs/pngfilt.h"
 
@@ -10,9 +11,11 @@
 #include <memory>
 #include <new>
 
+#include "engine/bitmap/zmrowconvert.h"
 #include "engine/bitmap/zmxBitmaps.h"
 #include "engine/codecs/accessscope_p.h"
 #include "engine/codecs/pngfilt_p.h"
+#include "engine/foundation/zmassert.h"
 #include "engine/foundation/zmnumbers.h"
 #include "engine/foundation/zmsettings.h"
 #include "engine/io/zmbufferedstreams.h"
@@ -61,6 +64,30 @@ std::uint8_t ScaleSampleTo8(std::uint32_t value, std::int32_t bit_depth) {
     return static_cast<std::uint8_t>((value > highest ? highest : value) * 255 / highest);
 }
 
+/// Red first to blue first, in place. Whole words, which compilers turn into vector code.
+void SwapRedAndBlue(std::uint8_t* row, std::size_t width) {
+    for (std::size_t x = 0; x < width; ++x) {
+        std::uint32_t pixel = 0;
+        std::memcpy(&pixel, row + x * 4, 4);
+        pixel = (pixel & 0xFF00FF00u) | (pixel >> 16 & 0xFF) | (pixel & 0xFF) << 16;
+        std::memcpy(row + x * 4, &pixel, 4);
+    }
+}
+
+void TakeAlphas(const std::uint8_t* source, std::uint8_t* alphas, std::size_t width) {
+    for (std::size_t x = 0; x < width; ++x) {
+        alphas[x] = source[x * 4 + 3];
+    }
+}
+
+bool IsInternational(const png_text& text) {
+    return text.compression > PNG_TEXT_COMPRESSION_zTXt;
+}
+
+std::size_t TextLength(const png_text& text) {
+    return IsInternational(text) ? text.itxt_length : text.text_length;
+}
+
 class TPngReader {
 public:
     TPngReader(TStream& stream, std::int64_t file_bytes, TZmBitmap& bitmap, TIOParams& params,
@@ -86,9 +113,13 @@ private:
     bool IsGray() const { return (color_type_ & PNG_COLOR_MASK_COLOR) == 0; }
     bool IsNative() const;
     bool HasAlpha() const;
+    bool SwapsColors() const;
     TZmPixelFormat TargetFormat() const;
     void RequestTransformations();
     void CollectTexts();
+    void KeepText(const png_text& text);
+    void KeepProfile();
+    void KeepExif();
     void FillBackground();
     void FillResolution();
     void FillColorMap();
@@ -98,7 +129,7 @@ private:
     bool AllRowsWereRead() const;
     bool FinishLastRow();
     std::uint8_t* RowTarget(std::int32_t pass, std::int32_t row);
-    bool SplitRow(const std::uint8_t* source, std::int32_t row);
+    bool SplitRow(std::uint8_t* source, std::int32_t row);
 
     TPngSession session_;
     png_structp png_ = nullptr;
@@ -118,6 +149,7 @@ private:
     TZmBitmap* plane_ = nullptr;
     std::unique_ptr<std::uint8_t[]> row_buffer_;  // one row, or all of an interlaced image
     std::size_t buffer_row_bytes_ = 0;
+    TZmRowFunction split_colors_ = nullptr;
     bool rows_done_ = false;
     bool end_is_missing_ = false;
 };
@@ -167,6 +199,12 @@ bool TPngReader::HasAlpha() const {
     return has_transparency && (bit_depth_ > 1 || IsPalette());
 }
 
+/// Rows that are split are swapped on the way, faster than the library does it; not those of an
+/// interlaced image, which go back to it in the next pass.
+bool TPngReader::SwapsColors() const {
+    return HasAlpha() && interlace_ == PNG_INTERLACE_NONE;
+}
+
 TZmPixelFormat TPngReader::TargetFormat() const {
     if (bit_depth_ == 1 && !IsPalette()) {
         return zm1g;
@@ -183,7 +221,10 @@ TZmPixelFormat TPngReader::TargetFormat() const {
 void TPngReader::FillParams() {
     params_.fPNG_TextKeys.clear();
     params_.fPNG_TextValues.clear();
+    params_.fPNG_Chunks.Clear();
     CollectTexts();
+    KeepProfile();
+    KeepExif();
     FillBackground();
     params_.SetImageCount(1);
     params_.fWidth = params_.fOriginalWidth = static_cast<std::int32_t>(width_);
@@ -204,12 +245,57 @@ void TPngReader::CollectTexts() {
     png_get_text(png_, info_, &texts, &count);
     for (; texts_taken_ < count; ++texts_taken_) {
         const png_text& text = texts[texts_taken_];
-        const bool is_international = text.compression > PNG_TEXT_COMPRESSION_zTXt;
-        const std::size_t length = is_international ? text.itxt_length : text.text_length;
         params_.fPNG_TextKeys.emplace_back(text.key);
         params_.fPNG_TextValues.emplace_back(text.text != nullptr ? text.text : "",
-                                             text.text != nullptr ? length : 0);
+                                             text.text != nullptr ? TextLength(text) : 0);
+        KeepText(text);
     }
+}
+
+void TPngReader::KeepText(const png_text& text) {
+    if (!params_.fGetMetaData || !IsInternational(text)) {
+        return;
+    }
+    TZmPngChunk chunk;
+    chunk.kind = kPngChunkText;
+    chunk.key = text.key;
+    chunk.language = text.lang != nullptr ? text.lang : "";
+    chunk.translated_key = text.lang_key != nullptr ? text.lang_key : "";
+    if (text.text != nullptr) {
+        chunk.data.assign(text.text, text.text + TextLength(text));
+    }
+    params_.fPNG_Chunks.Add(std::move(chunk));
+}
+
+void TPngReader::KeepProfile() {
+    png_charp name = nullptr;
+    png_bytep profile = nullptr;
+    png_uint_32 size = 0;
+    int compression = 0;
+    if (!params_.fGetMetaData ||
+        png_get_iCCP(png_, info_, &name, &compression, &profile, &size) == 0) {
+        return;
+    }
+    TZmPngChunk chunk;
+    chunk.kind = kPngChunkProfile;
+    chunk.key = name;
+    chunk.data.assign(profile, profile + size);
+    params_.fPNG_Chunks.Add(std::move(chunk));
+}
+
+/// The chunk may stand on either side of the image data.
+void TPngReader::KeepExif() {
+    png_bytep block = nullptr;
+    png_uint_32 size = 0;
+    const bool is_kept = params_.fPNG_Chunks.Find(kPngChunkExif) != nullptr;
+    if (is_kept || !params_.fGetMetaData ||
+        png_get_eXIf_1(png_, info_, &size, &block) == 0) {
+        return;
+    }
+    TZmPngChunk chunk;
+    chunk.kind = kPngChunkExif;
+    chunk.data.assign(block, block + size);
+    params_.fPNG_Chunks.Add(std::move(chunk));
 }
 
 /// Grey and RGB backgrounds count in the file's own depth; libpng has looked up that of a
@@ -285,7 +371,7 @@ void TPngReader::RequestTransformations() {
         if (IsGray() && bit_depth_ > 1) {
             png_set_gray_to_rgb(png_);
         }
-        if (bit_depth_ > 1 || IsPalette()) {
+        if ((bit_depth_ > 1 || IsPalette()) && !SwapsColors()) {
             png_set_bgr(png_);
         }
         if (HasAlpha()) {
@@ -332,6 +418,8 @@ bool TPngReader::PreparePlane() {
         return false;
     }
     plane_->SetFull(false);
+    split_colors_ = FindRowFunction(zm32RGB, zm24RGB);
+    ZM_ASSERT(split_colors_ != nullptr);
     return true;
 }
 
@@ -358,20 +446,17 @@ std::uint8_t* TPngReader::RowTarget(std::int32_t pass, std::int32_t row) {
     return target;
 }
 
-bool TPngReader::SplitRow(const std::uint8_t* source, std::int32_t row) {
+bool TPngReader::SplitRow(std::uint8_t* source, std::int32_t row) {
     std::uint8_t* colors = bitmap_.GetScanLine(row);
     std::uint8_t* alphas = plane_->GetScanLine(row);
     if (colors == nullptr || alphas == nullptr) {
         return false;
     }
-    for (png_uint_32 x = 0; x < width_; ++x) {
-        colors[0] = source[0];
-        colors[1] = source[1];
-        colors[2] = source[2];
-        alphas[x] = source[3];
-        colors += 3;
-        source += 4;
+    if (SwapsColors()) {
+        SwapRedAndBlue(source, width_);
     }
+    split_colors_(source, colors, static_cast<std::int32_t>(width_), MakeRowContext(nullptr));
+    TakeAlphas(source, alphas, width_);
     return true;
 }
 
@@ -435,6 +520,7 @@ bool TPngReader::ReadEnd() {
     session_.limits_chunk_memory = true;
     const bool is_read = RunPngGuarded(png_, [this] { png_read_end(png_, info_); });
     CollectTexts();
+    KeepExif();
     return is_read || (session_.ran_short && !session_.stream_raised);
 }
 

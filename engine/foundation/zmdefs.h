@@ -58,6 +58,11 @@ struct TCIELab {
 };
 static_assert(sizeof(TCIELab) == 3);
 
+struct TPoint {
+    std::int32_t x = 0;
+    std::int32_t y = 0;
+};
+
 /// Rectangle; right and bottom are exclusive unless a routine says otherwise.
 struct TRect {
     std::int32_t left = 0;
@@ -124,7 +129,7 @@ inline constexpr int kResampleFilterCount = 18;
 enum TZmAntialiasMode : std::uint8_t { zmrNone, zmrFast, zmrBilinear, zmrBicubic };
 
 /// Direction of a flip.
-enum TZmFlipDir : std::uint8_t { fdNone, fdHorizontal, fdVertical };
+enum TFlipDir : std::uint8_t { fdHorizontal, fdVertical, fdNone };
 
 /// Raised for misuse of the engine (a missing bitmap, an unsupported request). `what()` is the
 /// message in UTF-8.

@@ -5,14 +5,16 @@
 #include "engine/bitmap/zmplatformbitmap.h"
 #include "engine/bitmap/zmxBitmaps.h"
 
-// Life of the driver, its notices, and the frame that every load and save runs in.
+// Life of the driver, its notices and threads, and the frame that every load and save runs in.
 namespace zm {
 
 TZalmoIO::TZalmoIO() : own_bitmap_(std::make_unique<TZmBitmap>()), fZmBitmap(own_bitmap_.get()) {
     fParams = std::make_unique<TIOParams>(static_cast<TZmParamsOwner*>(this));
 }
 
-TZalmoIO::~TZalmoIO() = default;
+TZalmoIO::~TZalmoIO() {
+    WaitThreads(/*abort_all=*/false);
+}
 
 std::unique_ptr<TZalmoIO> TZalmoIO::CreateFromBitmap(TZmBitmap* bitmap) {
     auto driver = std::make_unique<TZalmoIO>();
@@ -46,8 +48,9 @@ void TZalmoIO::AttachTBitmap(TBitmap* bitmap) {
     PrepareBitmap();
 }
 
-void TZalmoIO::CheckAttachedBitmap() const {
-    if (fZmBitmap == nullptr) {
+/// Layers bring bitmaps of their own.
+void TZalmoIO::CheckAttachedBitmap(std::int32_t type) const {
+    if (fZmBitmap == nullptr && type != ioLYR) {
         throw EZmException("Active layer does not contain bitmap");
     }
 }
@@ -70,25 +73,74 @@ void TZalmoIO::Update() {
     }
 }
 
-TProgressRec TZalmoIO::MakeProgress() {
+/// A work that starts while all are to end does not get to work at all.
+void TZalmoIO::ClearAborting() {
+    fAborting = abort_all_.load();
+}
+
+/// The record of one work. Its flag is the work's own; the driver's joins in at each progress
+/// step, from whatever thread it was set.
+TProgressRec TZalmoIO::MakeProgress(bool& aborting) {
     TProgressRec progress;
-    progress.fOnProgress = [this](void*, std::int32_t percent) { DoIntProgress(percent); };
+    progress.fOnProgress = [this, &aborting](void*, std::int32_t percent) {
+        DoIntProgress(percent);
+        threads_.PausePoint();
+        aborting = aborting || fAborting;
+    };
     progress.Sender = this;
-    progress.Aborting = &fAborting;
+    progress.Aborting = &aborting;
     return progress;
 }
 
-void TZalmoIO::DoIntProgress(std::int32_t percent) {
-    if (fOnProgress) {
-        fOnProgress(this, percent);
+void TZalmoIO::Notify(const TZmIONotice& notice) {
+    if (!threads_.IsOwnThread()) {
+        Deliver(notice);
+        return;
     }
+    notices_.Post(notice);
+    if (fOnNoticeQueued) {
+        fOnNoticeQueued(this);
+    }
+}
+
+void TZalmoIO::Deliver(const TZmIONotice& notice) {
+    const auto call = [this](const TZmFinishWorkEvent& event) {
+        if (event) {
+            event(this);
+        }
+    };
+    switch (notice.kind) {
+        case kNoticeProgress:
+            if (fOnProgress) {
+                fOnProgress(this, notice.percent);
+            }
+            break;
+        case kNoticeBitmapChanged:
+            if (fZmBitmap != nullptr) {
+                fZmBitmap->Changed();
+            }
+            break;
+        case kNoticeImageLoaded: call(fOnImageLoaded); break;
+        case kNoticeFinishWork: call(fOnFinishWork); break;
+    }
+}
+
+std::int32_t TZalmoIO::DrainNotices() {
+    std::int32_t count = 0;
+    while (const auto notice = notices_.Take()) {
+        Deliver(*notice);
+        ++count;
+    }
+    return count;
+}
+
+void TZalmoIO::DoIntProgress(std::int32_t percent) {
+    Notify({kNoticeProgress, percent});
 }
 
 void TZalmoIO::DoFinishWork() {
     DoIntProgress(100);
-    if (fOnFinishWork) {
-        fOnFinishWork(this);
-    }
+    Notify({kNoticeFinishWork});
 }
 
 bool TZalmoIO::Fail() {
@@ -102,17 +154,68 @@ bool TZalmoIO::FailWithNotice() {
     return false;
 }
 
-bool TZalmoIO::RunToNotice(const std::function<void()>& work) {
+bool TZalmoIO::RunToNotice(TAfterWork after, const std::function<void(bool& aborting)>& work) {
+    const auto finish = [&] {
+        if (after == kAfterLoad) {
+            Notify({kNoticeImageLoaded});
+        }
+        DoFinishWork();
+    };
+    ClearAborting();
+    bool aborting = fAborting;
     try {
-        work();
+        if (!aborting) {
+            work(aborting);
+        }
     } catch (const std::bad_alloc&) {
-        fAborting = true;
+        aborting = true;
     } catch (...) {
-        FailWithNotice();
+        fAborting = true;
+        finish();
         throw;
     }
-    DoFinishWork();
-    return !fAborting;
+    if (aborting) {
+        fAborting = true;
+    }
+    const bool has_worked = !fAborting;
+    finish();
+    return has_worked;
+}
+
+/// Only a borrowed bitmap can be left to a thread: the driver's own may go with the driver.
+bool TZalmoIO::StartsThread() const {
+    return fAsyncMode && own_bitmap_ == nullptr && in_place_ == 0 && !threads_.IsOwnThread();
+}
+
+bool TZalmoIO::RunOrStart(std::function<bool()> work) {
+    if (StartsThread()) {
+        ClearAborting();
+        if (threads_.Start([work] { work(); })) {
+            return true;
+        }
+    }
+    return work();
+}
+
+void TZalmoIO::WaitThreads(bool abort_all) {
+    abort_all_ = abort_all;
+    if (abort_all && threads_.Count() > 0) {
+        fAborting = true;
+    }
+    threads_.Wait();
+    abort_all_ = false;
+}
+
+std::int32_t TZalmoIO::CountFile(std::int32_t type, const std::u16string& name) {
+    const bool starts_thread = StartsThread();
+    const bool is_loaded = LoadFileAs(type, name);
+    return is_loaded && !starts_thread ? GetParams()->GetImageCount() : -1;
+}
+
+std::int32_t TZalmoIO::CountStream(std::int32_t type, TStream& stream) {
+    const bool starts_thread = StartsThread();
+    const bool is_loaded = LoadStreamAs(type, stream);
+    return is_loaded && !starts_thread ? GetParams()->GetImageCount() : -1;
 }
 
 }  // namespace zm

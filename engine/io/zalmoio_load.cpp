@@ -2,102 +2,142 @@
 
 #include "engine/bitmap/zmmask.h"
 #include "engine/bitmap/zmxBitmaps.h"
-#include "engine/codecs/bmpfilt.h"
-#include "engine/codecs/jpegfilt.h"
-#include "engine/codecs/pngfilt.h"
 #include "engine/foundation/zmsettings.h"
 #include "engine/foundation/zmstreams.h"
 #include "engine/foundation/zmstrings.h"
+#include "engine/foundation/zmutils_resources.h"
 #include "engine/io/zalmoio.h"
+#include "engine/io/zalmoio_codecs_p.h"
+#include "engine/io/zalmoio_headers_p.h"
 #include "engine/io/zmfileformats.h"
 #include "engine/io/zmformatdetect.h"
+#include "engine/platform/urlclient.h"
 
-// Loading: choice of the type, the steps that all codecs share, and the family of load operations.
+// Loading: choice of the type, where the bytes come from, and the steps that all codecs share.
 namespace zm {
 
 namespace {
 
-/// The SVG row of the file itself is write-only; a plug-in row that reads takes its place.
+/// The SVG row of the file itself is write-only, the PDF row too; a plug-in row that reads takes
+/// its place.
 std::int32_t ReaderTypeOf(std::int32_t file_type) {
-    if (file_type != ioSVG) {
-        return file_type;
-    }
-    for (const std::int32_t plugin_type : {kPluginSvgType, kPluginSvgReaderType}) {
-        if (FindFormatInfo(plugin_type) != nullptr) {
-            return plugin_type;
+    if (file_type == ioSVG) {
+        for (const std::int32_t plugin_type : {kPluginSvgType, kPluginSvgReaderType}) {
+            if (FindFormatInfo(plugin_type) != nullptr) {
+                return plugin_type;
+            }
         }
     }
     return file_type;
 }
 
+/// The two plug-in rows for PDF stand in for each other.
+const TZmFileFormatInfo* FindReaderRow(std::int32_t file_type) {
+    const TZmFileFormatInfo* row = FindFormatInfo(file_type);
+    const bool is_pdf = file_type == kPluginPdfType || file_type == kPluginPdfWriteType;
+    if (row == nullptr && is_pdf) {
+        row = FindFormatInfo(kPluginPdfType + kPluginPdfWriteType - file_type);
+    }
+    return row;
+}
+
+bool IsUrl(const std::u16string& name) {
+    const std::u16string lower = AsciiLower(name);
+    return lower.starts_with(u"http://") || lower.starts_with(u"https://") ||
+           lower.starts_with(u"ftp://");
+}
+
+/// The part of a URL that names the resource, without query and fragment.
+std::u16string_view UrlPath(std::u16string_view url) {
+    return url.substr(0, url.find_first_of(u"?#"));
+}
+
+/// Index of a resource by name, without case; -1 for none.
+std::int32_t FindResourceName(const TZmResourceExtractor& module, std::int32_t type,
+                              const std::u16string& name) {
+    for (std::int32_t i = 0; i < module.GetNamesCount(type); ++i) {
+        if (KeysEqualNoCase(module.GetNames(type, i), name)) {
+            return i;
+        }
+    }
+    return -1;
+}
+
 }  // namespace
 
-TZalmoIO::TLoadCodec TZalmoIO::LoadCodecBMP() {
-    return {ioBMP, [this](TStream& stream, TProgressRec& progress, TZmMask& alpha) {
-                TIOParams& params = *GetParams();
-                ReadBMPStream(stream, *fZmBitmap, /*byte_limit=*/0,
-                              /*ignore_alpha=*/!params.fBMP_HandleTransparency, alpha,
-                              /*no_file_header=*/false, /*params_only=*/false, progress, params);
-            }};
+bool TZalmoIO::LoadFileAs(std::int32_t type, const std::u16string& name) {
+    CheckAttachedBitmap(type);
+    return RunOrFail(
+        [&] { return RunOrStart([this, type, name] { return LoadFileNow(type, name); }); });
 }
 
-TZalmoIO::TLoadCodec TZalmoIO::LoadCodecPNG() {
-    return {ioPNG, [this](TStream& stream, TProgressRec& progress, TZmMask&) {
-                TIOParams& params = *GetParams();
-                params.fPNG_Background = RGBFromColor(fBackground);
-                ReadPNGStream(stream, *fZmBitmap, params, /*params_only=*/false, progress);
-                fBackground = ColorFromRGB(params.fPNG_Background);
-            }};
+bool TZalmoIO::LoadStreamAs(std::int32_t type, TStream& stream) {
+    CheckAttachedBitmap(type);
+    return RunOrFail(
+        [&] { return RunOrStart([this, type, &stream] { return LoadStreamNow(type, stream); }); });
 }
 
-TZalmoIO::TLoadCodec TZalmoIO::LoadCodecJpeg() {
-    return {ioJPEG, [this](TStream& stream, TProgressRec& progress, TZmMask&) {
-                TIOParams& params = *GetParams();
-                TJpegReadOptions options;
-                options.native_format = params.fNativePixelFormat;
-                ReadJPEGStream(stream, *fZmBitmap, options, progress, params);
-            }};
-}
-
-std::optional<TZalmoIO::TLoadCodec> TZalmoIO::InternalLoadCodec(std::int32_t file_type) {
-    switch (file_type) {
-        case ioBMP: return LoadCodecBMP();
-        case ioPNG: return LoadCodecPNG();
-        case ioJPEG: return LoadCodecJpeg();
-        default: return std::nullopt;
+bool TZalmoIO::LoadFileNow(std::int32_t type, const std::u16string& name) {
+    const TZmFileFormatInfo* row = FindReaderRow(type);
+    const TZmLoadCodec* codec = FindLoadCodec(type);
+    if (codec == nullptr || (row != nullptr && !row->InternalFormat)) {
+        return LoadFileByRow(row, name);
     }
-}
-
-bool TZalmoIO::RunLoadFile(const TLoadCodec& codec, const std::u16string& file_name) {
-    CheckAttachedBitmap();
     fAborting = true;  // stands when the file cannot be opened
-    TFileStream stream(file_name, fmOpenRead);
-    return RunLoad(codec, stream, file_name);
+    TFileStream stream(name, fmOpenRead);
+    return RunLoad(*codec, stream, name, /*with_header=*/false);
 }
 
-bool TZalmoIO::RunLoad(const TLoadCodec& codec, TStream& stream, const std::u16string& file_name) {
-    CheckAttachedBitmap();
-    return RunToNotice([&] { LoadSteps(codec, stream, file_name); });
+bool TZalmoIO::LoadStreamNow(std::int32_t type, TStream& stream) {
+    const TZmFileFormatInfo* row = FindReaderRow(type);
+    const TZmLoadCodec* codec = FindLoadCodec(type);
+    if (codec == nullptr || (row != nullptr && !row->InternalFormat)) {
+        return LoadStreamByRow(row, stream);
+    }
+    return RunLoad(*codec, stream, {}, fStreamHeaders);
 }
 
-void TZalmoIO::LoadSteps(const TLoadCodec& codec, TStream& stream,
-                         const std::u16string& file_name) {
-    fAborting = false;
-    TProgressRec progress = MakeProgress();
-    PrepareBitmap();
+bool TZalmoIO::RunLoad(const TZmLoadCodec& codec, TStream& stream, const std::u16string& name,
+                       bool with_header) {
+    return RunToNotice(
+        kAfterLoad, [&](bool& aborting) { LoadSteps(codec, stream, name, with_header, aborting); });
+}
+
+void TZalmoIO::LoadSteps(const TZmLoadCodec& codec, TStream& stream, const std::u16string& name,
+                         bool with_header, bool& aborting) {
+    TProgressRec progress = MakeProgress(aborting);
+    if (!PrepareBitmap()) {
+        aborting = true;
+        return;
+    }
     TIOParams& params = *GetParams();
     params.ResetInfo();
     fZmBitmap->RemoveAlphaChannel(/*merge=*/false, /*background=*/0);
+    TZmStreamHeaderFind header;
+    if (with_header) {
+        header = SkipStreamHeader(codec.type, stream);
+    }
+    const std::int64_t file_bytes = stream.GetSize();
     TZmMask alpha;
-    codec.read(stream, progress, alpha);
+    if (header.is_acceptable) {
+        TZmLoadCall call{stream, *fZmBitmap, params, progress, fBackground, /*params_only=*/false,
+                         alpha};
+        codec.read(call);
+    } else {
+        aborting = true;
+    }
     ApplyResolutionDefaults();
     TakeAlpha(alpha);
-    if (!fAborting) {
-        params.fFileName = file_name;
+    if (!aborting) {
+        AdjustDPI(file_bytes);
+        params.fFileName = name;
         params.fFileType = codec.type;
     }
+    if (header.next >= 0) {
+        stream.SetPosition(header.next);
+    }
     Update();
-    fZmBitmap->Changed();
+    Notify({kNoticeBitmapChanged});
 }
 
 void TZalmoIO::ApplyResolutionDefaults() {
@@ -120,40 +160,43 @@ void TZalmoIO::TakeAlpha(TZmMask& alpha) {
     }
 }
 
-bool TZalmoIO::BeginRowLoad(const TZmFileFormatInfo& row) {
+/// An internal row's function is no reader: its type either has a codec or cannot be read.
+bool TZalmoIO::BeginRowLoad(const TZmFileFormatInfo* row) {
     TIOParams& params = *GetParams();
     fAborting = true;
     params.ResetInfo();
     params.fFileName.clear();
     params.fFileType = ioUnknown;
-    // An internal row's function is no reader: its type either has a codec or cannot be read.
-    return !row.InternalFormat && row.ReadFunction != nullptr;
+    return row != nullptr && !row->InternalFormat && row->ReadFunction != nullptr;
 }
 
-bool TZalmoIO::LoadFileByRow(const TZmFileFormatInfo& row, const std::u16string& file_name) {
+bool TZalmoIO::LoadFileByRow(const TZmFileFormatInfo* row, const std::u16string& name) {
     if (!BeginRowLoad(row)) {
         return FailWithNotice();
     }
-    TFileStream stream(file_name, fmOpenRead);
-    return RunRowLoad(row, stream, file_name);
+    TFileStream stream(name, fmOpenRead);
+    return RunRowLoad(*row, stream, name);
 }
 
-bool TZalmoIO::LoadStreamByRow(const TZmFileFormatInfo& row, TStream& stream) {
-    return BeginRowLoad(row) ? RunRowLoad(row, stream, {}) : FailWithNotice();
+bool TZalmoIO::LoadStreamByRow(const TZmFileFormatInfo* row, TStream& stream) {
+    return BeginRowLoad(row) ? RunRowLoad(*row, stream, {}) : FailWithNotice();
 }
 
 bool TZalmoIO::RunRowLoad(const TZmFileFormatInfo& row, TStream& stream,
-                          const std::u16string& file_name) {
-    return RunToNotice([&] {
-        TProgressRec progress = MakeProgress();
+                          const std::u16string& name) {
+    return RunToNotice(kAfterLoad, [&](bool& aborting) {
+        TProgressRec progress = MakeProgress(aborting);
         PrepareBitmap();
-        fAborting = false;
         TIOParams& params = *GetParams();
-        params.fFileName = file_name;
+        params.fFileName = name;
         params.fFileType = row.FileType;
+        const std::int64_t file_bytes = stream.GetSize();
         row.ReadFunction(stream, *fZmBitmap, params, progress, /*preview=*/false);
+        if (!aborting) {
+            AdjustDPI(file_bytes);
+        }
         Update();
-        fZmBitmap->Changed();
+        Notify({kNoticeBitmapChanged});
     });
 }
 
@@ -164,23 +207,21 @@ bool TZalmoIO::LoadFromFile(const std::u16string& file_name, std::int32_t file_t
     if (file_name.empty()) {
         return FailWithNotice();
     }
+    if (IsUrl(file_name)) {
+        return LoadFromURL(file_name);
+    }
     if (file_type == ioUnknown) {
         file_type = FindFileFormat(file_name, zmfmContentOnly);
     }
     // Types without a row include the videos, for which there is no player here.
-    const TZmFileFormatInfo* row = FindFormatInfo(ReaderTypeOf(file_type));
-    if (row == nullptr) {
-        return FailWithNotice();
-    }
-    if (row->InternalFormat) {
-        if (const auto codec = InternalLoadCodec(row->FileType)) {
-            return RunLoadFile(*codec, file_name);
-        }
-    }
-    return LoadFileByRow(*row, file_name);
+    const TZmFileFormatInfo* row = FindReaderRow(ReaderTypeOf(file_type));
+    return row == nullptr ? FailWithNotice() : LoadFileAs(row->FileType, file_name);
 }
 
 bool TZalmoIO::LoadFromFile(const std::u16string& file_name, bool check_unknown) {
+    if (IsUrl(file_name)) {
+        return LoadFromFile(file_name, ioUnknown);
+    }
     const std::u16string extension = AsciiLower(FileExtension(file_name));
     const std::int32_t named_type = extension == u".avi" ? ioAVI : ExtensionToFileType(extension);
     bool is_loaded = false;
@@ -222,16 +263,7 @@ bool TZalmoIO::LoadFromStream(TStream& stream, std::int32_t file_type) {
     if (file_type == ioUnknown) {
         return FailWithNotice();
     }
-    const TZmFileFormatInfo* row = FindFormatInfo(file_type);
-    if (row == nullptr) {
-        return Fail();
-    }
-    if (row->InternalFormat) {
-        if (const auto codec = InternalLoadCodec(file_type)) {
-            return RunLoad(*codec, stream, {});
-        }
-    }
-    return LoadStreamByRow(*row, stream);
+    return FindReaderRow(file_type) == nullptr ? Fail() : LoadStreamAs(file_type, stream);
 }
 
 bool TZalmoIO::LoadFromBuffer(const void* buffer, std::int64_t size_bytes, std::int32_t file_type) {
@@ -239,31 +271,90 @@ bool TZalmoIO::LoadFromBuffer(const void* buffer, std::int64_t size_bytes, std::
         return Fail();
     }
     TBorrowedMemoryStream stream(buffer, size_bytes);
+    const TInPlace in_place(*this);
     return LoadFromStream(stream, file_type);
 }
 
-bool TZalmoIO::LoadFromFileBMP(const std::u16string& file_name) {
-    return RunLoadFile(LoadCodecBMP(), file_name);
+bool TZalmoIO::LoadFromResource(const std::u16string& module_path,
+                                const std::u16string& resource_type,
+                                const std::u16string& resource_name, std::int32_t file_type) {
+    const TZmResourceExtractor module(module_path);
+    const std::int32_t type = module.IndexOfType(resource_type);
+    const std::int32_t name = type < 0 ? -1 : FindResourceName(module, type, resource_name);
+    const std::vector<std::uint8_t> bytes =
+        name < 0 ? std::vector<std::uint8_t>() : module.GetBuffer(type, name);
+    // The flag goes back also when the load raises.
+    struct TFlag {
+        TIOParams& params;
+        explicit TFlag(TIOParams& owner) : params(owner) { params.fIsResource = true; }
+        ~TFlag() { params.fIsResource = false; }
+    } const flag(*GetParams());
+    return LoadFromBuffer(bytes.data(), static_cast<std::int64_t>(bytes.size()), file_type);
 }
 
-bool TZalmoIO::LoadFromStreamBMP(TStream& stream) {
-    return RunLoad(LoadCodecBMP(), stream, {});
+bool TZalmoIO::LoadFromURL(const std::u16string& url) {
+    CheckAttachedBitmap(ioUnknown);
+    return RunOrFail([&] { return RunOrStart([this, url] { return LoadURLNow(url); }); });
 }
 
-bool TZalmoIO::LoadFromFilePNG(const std::u16string& file_name) {
-    return RunLoadFile(LoadCodecPNG(), file_name);
+bool TZalmoIO::LoadURLNow(const std::u16string& url) {
+    const TZmZalmoGlobalSettings& settings = ZmGlobalSettings();
+    platform::TUrlRequest request;
+    request.url = url;
+    request.proxy_address = settings.fProxyAddress;
+    request.proxy_user = settings.fProxyUser;
+    request.proxy_password = settings.fProxyPassword;
+    ClearAborting();
+    request.should_stop = [this] {
+        threads_.PausePoint();
+        return fAborting.load();
+    };
+    std::string error_text;
+    const auto bytes = platform::FetchUrl(request, error_text);
+    if (!bytes) {
+        return FailWithNotice();
+    }
+    TMemoryStream stream(std::move(*bytes));
+    std::int32_t type = FindStreamFormat(stream);
+    if (type == ioUnknown) {
+        type = FileNameToFileType(UrlPath(url));
+    }
+    const TInPlace in_place(*this);
+    return type == ioUnknown ? FailWithNotice() : LoadFromStream(stream, type);
 }
 
-bool TZalmoIO::LoadFromStreamPNG(TStream& stream) {
-    return RunLoad(LoadCodecPNG(), stream, {});
+std::int32_t TZalmoIO::SeekTarget(TZmIOSeekDestination destination) {
+    const TIOParams& params = *GetParams();
+    const std::int32_t last = std::max(params.GetImageCount(), 1) - 1;
+    switch (destination) {
+        case zmioSeekFirst: return 0;
+        case zmioSeekPrior: return std::clamp(params.GetImageIndex(), 1, last + 1) - 1;
+        case zmioSeekNext: return std::clamp(params.GetImageIndex(), -1, last - 1) + 1;
+        default: return last;
+    }
 }
 
-bool TZalmoIO::LoadFromFileJpeg(const std::u16string& file_name) {
-    return RunLoadFile(LoadCodecJpeg(), file_name);
+std::int32_t TZalmoIO::Seek(TZmIOSeekDestination destination, const std::u16string& file_name) {
+    if (!ParamsFromFile(file_name, std::int32_t{ioUnknown})) {
+        return -1;
+    }
+    const std::int32_t target = SeekTarget(destination);
+    const std::int32_t type = GetParams()->fFileType;
+    GetParams()->SetImageIndex(target);
+    return LoadFromFile(file_name, type) ? target : -1;
 }
 
-bool TZalmoIO::LoadFromStreamJpeg(TStream& stream) {
-    return RunLoad(LoadCodecJpeg(), stream, {});
+std::int32_t TZalmoIO::Seek(TZmIOSeekDestination destination, TStream& stream,
+                            std::int32_t file_type) {
+    const std::int64_t start = stream.GetPosition();
+    if (!ParamsFromStream(stream, file_type)) {
+        return -1;
+    }
+    stream.SetPosition(start);
+    const std::int32_t target = SeekTarget(destination);
+    const std::int32_t type = GetParams()->fFileType;
+    GetParams()->SetImageIndex(target);
+    return LoadFromStream(stream, type) ? target : -1;
 }
 
 }  // namespace zm

@@ -5,7 +5,7 @@
 #include <span>
 #include <string_view>
 
-#include "engine/io/zmbytereader.h"
+#include "engine/foundation/zmbytereader.h"
 
 namespace zm {
 

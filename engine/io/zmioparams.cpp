@@ -2,9 +2,11 @@
 
 #include <algorithm>
 #include <chrono>
+#include <cmath>
 
 #include "engine/bitmap/zmpixelformats.h"
 #include "engine/bitmap/zmxBitmaps.h"
+#include "engine/foundation/zmstrings.h"
 #include "engine/platform/clock.h"
 
 namespace zm {
@@ -23,6 +25,28 @@ TDateTime Today() {
 std::unique_ptr<TZmBitmap> CloneBitmap(TZmBitmap* source) {
     return source == nullptr ? nullptr : std::make_unique<TZmBitmap>(*source);
 }
+
+/// One coordinate by its four fields; `letters` are those of its negative and positive side.
+void FoldCoordinate(double& degrees, double& minutes, double& seconds, std::string& reference,
+                    std::string_view letters) {
+    constexpr double kSecondsPerMinute = 60;
+    constexpr double kSecondsPerDegree = 3600;
+    double total = degrees * kSecondsPerDegree + minutes * kSecondsPerMinute + seconds;
+    if (!std::isfinite(total) || (total == 0 && reference.empty())) {
+        return;
+    }
+    if (!reference.empty() && reference[0] == letters[0]) {
+        total = -total;
+    }
+    reference = letters[total < 0 ? 0 : 1];
+    total = std::abs(total);
+    degrees = std::floor(total / kSecondsPerDegree);
+    total -= degrees * kSecondsPerDegree;
+    minutes = std::floor(total / kSecondsPerMinute);
+    seconds = total - minutes * kSecondsPerMinute;
+}
+
+constexpr std::u16string_view kXmpKey = u"XMP";
 
 const char* DefaultPSTitle() {
     return "No Title";
@@ -53,6 +77,7 @@ TZmBitmap* TIOParams::AttachedBitmap() const {
 void TIOParams::SetDefaultParams() {
     static_cast<TZmIOFields&>(*this) = TZmIOFields{};
     ResetEXIF();
+    fDict.Clear();
     TakeSettings();
     fTGA_Date = Today();
     fImageIndex = 0;
@@ -99,6 +124,9 @@ void TIOParams::TakeSettings() {
 
 void TIOParams::ResetInfo(TZmMetaInfoItems items) {
     const TZmMetaInfoItems wanted = items.IsEmpty() ? kAllMetaInfoItems : items;
+    if (wanted.Contains(zmrIPTC)) {
+        fIPTC_Info.Clear();
+    }
     if (wanted.Contains(zmrJPEGMarkers)) {
         if (wanted.Contains(zmrICC)) {
             fJPEG_MarkerList.Clear();
@@ -119,7 +147,7 @@ void TIOParams::ResetInfo(TZmMetaInfoItems items) {
         ResetOtherTextMeta();
     }
     if (wanted.Contains(zmrXMP)) {
-        fXMP_Info.clear();
+        SetXMP_Info({});
     }
 }
 
@@ -158,6 +186,9 @@ TZmMetaInfoItems TIOParams::ContainsInfo() const {
     if (fEXIF_HasEXIFData) {
         items.Include(zmrEXIF);
     }
+    if (fIPTC_Info.Count() > 0) {
+        items.Include(zmrIPTC);
+    }
     if (fJPEG_MarkerList.Count() > 0) {
         items.Include(zmrJPEGMarkers);
     }
@@ -189,6 +220,7 @@ void TIOParams::Assign(const TIOParams& source) {
     static_cast<TZmIOFields&>(*this) = source;
     static_cast<TZmExifFields&>(*this) = source;
     fEXIF_Bitmap = CloneBitmap(source.fEXIF_Bitmap.get());
+    fDict.Assign(source.fDict);
     fImageIndex = source.fImageIndex;
     fImageCount = source.fImageCount;
     fDpiX = source.fDpiX;
@@ -280,6 +312,60 @@ void TIOParams::UpdateBPSAndSPP(TZmPixelFormat format) {
 void TIOParams::FreeColorMap() {
     fColorMap = {};
     fColorMapCount = 0;
+}
+
+void TIOParams::AdjustGPSCoordinates() {
+    constexpr std::string_view kLatitude = "SN";
+    constexpr std::string_view kLongitude = "WE";
+    FoldCoordinate(fEXIF_GPSLatitudeDegrees, fEXIF_GPSLatitudeMinutes, fEXIF_GPSLatitudeSeconds,
+                   fEXIF_GPSLatitudeRef, kLatitude);
+    FoldCoordinate(fEXIF_GPSLongitudeDegrees, fEXIF_GPSLongitudeMinutes, fEXIF_GPSLongitudeSeconds,
+                   fEXIF_GPSLongitudeRef, kLongitude);
+    FoldCoordinate(fEXIF_GPSDestLatitudeDegrees, fEXIF_GPSDestLatitudeMinutes,
+                   fEXIF_GPSDestLatitudeSeconds, fEXIF_GPSDestLatitudeRef, kLatitude);
+    FoldCoordinate(fEXIF_GPSDestLongitudeDegrees, fEXIF_GPSDestLongitudeMinutes,
+                   fEXIF_GPSDestLongitudeSeconds, fEXIF_GPSDestLongitudeRef, kLongitude);
+}
+
+bool TIOParams::OwnerIsAborting() const {
+    return attached_owner_ != nullptr && attached_owner_->GetAborting();
+}
+
+std::string TIOParams::ReadIPTCField(std::uint8_t record, std::uint8_t dataset) const {
+    return fIPTC_Info.GetStrings(fIPTC_Info.IndexOf(record, dataset));
+}
+
+void TIOParams::WriteIPTCField(std::uint8_t record, std::uint8_t dataset, std::string_view text) {
+    const std::int32_t index = fIPTC_Info.IndexOf(record, dataset);
+    if (index < 0) {
+        fIPTC_Info.AddStringItem(record, dataset, text);
+    } else {
+        fIPTC_Info.SetStrings(index, text);
+    }
+}
+
+void TIOParams::ClearIPTCField(std::uint8_t record, std::uint8_t dataset) {
+    fIPTC_Info.DeleteItem(fIPTC_Info.IndexOf(record, dataset));
+}
+
+std::string TIOParams::GetIPTC_Photoshop(std::uint8_t dataset) const {
+    return ReadIPTCField(kIptcApplicationRecord, dataset);
+}
+
+void TIOParams::SetIPTC_Photoshop(std::uint8_t dataset, std::string_view text) {
+    WriteIPTCField(kIptcApplicationRecord, dataset, text);
+}
+
+void TIOParams::SetXMP_Info(const std::string& packet) {
+    if (packet == fXMP_Info && !packet.empty()) {
+        return;
+    }
+    fXMP_Info = packet;
+    fDict.Erase(kXmpKey);
+    auto tree = std::make_unique<TZmDictionary>();
+    if (!packet.empty() && tree->Parse(Utf16FromUtf8(packet))) {
+        fDict.Insert(kXmpKey, std::move(tree));
+    }
 }
 
 void TIOParams::SetImageIndex(std::int32_t index) {

@@ -14,7 +14,7 @@ using TZmProgressEvent = std::function<void(void* sender, std::int32_t percent)>
 struct TProgressRec {
     TZmProgressEvent fOnProgress;
     void* Sender = nullptr;
-    std::int32_t val = 0;   ///< last percent reported
+    std::int32_t val = 0;  ///< last percent reported
     std::int32_t tot = 0;
     double per1 = 0;
     double per2 = 0;

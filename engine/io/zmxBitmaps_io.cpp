@@ -66,6 +66,12 @@ void TZmBitmap::AssignParamsFrom(TZmBitmap& source) {
     }
 }
 
+TZmBitmap::TZmBitmap(const std::u16string& file_name, TIOParams* params) : TZmBitmap() {
+    if (!Read(file_name, params, /*check_unknown=*/true)) {
+        FreeImage(/*free_alpha=*/true);
+    }
+}
+
 bool TZmBitmap::Read(const std::u16string& file_name, TIOParams* params, bool check_unknown) {
     const auto driver = MakeReader(*this, params);
     driver->LoadFromFile(file_name, check_unknown);

@@ -3,7 +3,17 @@
 #include <algorithm>
 #include <array>
 
+#include "engine/foundation/zmstreams.h"
+#include "engine/io/zmfieldstreams.h"
+
 namespace zm {
+
+namespace {
+
+constexpr std::uint8_t kListForm = 0;
+constexpr std::int32_t kLeastItemBytes = 5;  // type and length
+
+}  // namespace
 
 std::int32_t TZmMarkerList::AddMarker(std::uint8_t type, std::span<const std::uint8_t> data) {
     items_.push_back({type, {data.begin(), data.end()}});
@@ -63,6 +73,41 @@ std::span<const std::uint8_t> TZmMarkerList::GetMarkerData(std::int32_t index) c
 
 std::int32_t TZmMarkerList::GetMarkerLength(std::int32_t index) const {
     return static_cast<std::int32_t>(GetMarkerData(index).size());
+}
+
+std::unique_ptr<TMemoryStream> TZmMarkerList::GetMarkerStream(std::int32_t index) const {
+    const std::span<const std::uint8_t> data = GetMarkerData(index);
+    return std::make_unique<TMemoryStream>(std::vector<std::uint8_t>(data.begin(), data.end()));
+}
+
+void TZmMarkerList::SaveToStream(TStream& stream) const {
+    TZmFieldWriter writer(stream);
+    writer.U8(kListForm);
+    writer.S32(Count());
+    for (const TItem& item : items_) {
+        writer.U8(item.type);
+        writer.WriteBlock(item.data);
+    }
+}
+
+bool TZmMarkerList::LoadFromStream(TStream& stream) {
+    TZmFieldReader reader(stream);
+    return LoadFromReader(reader);
+}
+
+bool TZmMarkerList::LoadFromReader(TZmFieldReader& reader) {
+    Clear();
+    const std::uint8_t form = reader.U8();
+    const std::int32_t count = form == kListForm ? reader.ReadCount(kLeastItemBytes) : -1;
+    for (std::int32_t i = 0; i < count; ++i) {
+        TItem item;
+        item.type = reader.U8();
+        if (!reader.ReadBlock(item.data)) {
+            return false;
+        }
+        items_.push_back(std::move(item));
+    }
+    return count >= 0;
 }
 
 bool IsExifMarkerData(std::span<const std::uint8_t> data) {

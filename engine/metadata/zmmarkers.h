@@ -2,10 +2,15 @@
 
 #include <cstddef>
 #include <cstdint>
+#include <memory>
 #include <span>
 #include <vector>
 
 namespace zm {
+
+class TMemoryStream;
+class TStream;
+class TZmFieldReader;
 
 /// Codes of the markers that carry metadata in a JPEG file.
 inline constexpr std::uint8_t kMarkerApp0 = 0xE0;
@@ -37,11 +42,22 @@ public:
     void DeleteMarkerInstances(std::uint8_t type);
     /// Orders by type; equal types keep their order.
     void Sort();
+    void Assign(const TZmMarkerList& source) { *this = source; }
+
+    /// Stream form: a zero byte, a 32-bit count, and for each item its type, a 32-bit length and
+    /// its data; little-endian.
+    void SaveToStream(TStream& stream) const;
+    /// Replaces the contents. False when the stream ends inside the list or holds another form;
+    /// the items before that are kept.
+    bool LoadFromStream(TStream& stream);
+    bool LoadFromReader(TZmFieldReader& reader);
 
     std::uint8_t GetMarkerType(std::int32_t index) const;
     /// Valid until the list changes.
     std::span<const std::uint8_t> GetMarkerData(std::int32_t index) const;
     std::int32_t GetMarkerLength(std::int32_t index) const;
+    /// A stream over a copy of the data, at its start.
+    std::unique_ptr<TMemoryStream> GetMarkerStream(std::int32_t index) const;
 
 private:
     struct TItem {

@@ -21,4 +21,9 @@ public:
 /// Loads a library by path; nil on failure with the system's reason in `error_text`.
 std::unique_ptr<TLibrary> LoadLibraryFile(const std::u16string& path, std::string& error_text);
 
+/// Loads a library that the system or the program brings, by its file name alone. It is looked
+/// for in the system's folders and in the program's, never in the current one.
+std::unique_ptr<TLibrary> LoadInstalledLibrary(const std::string& file_name,
+                                               std::string& error_text);
+
 }  // namespace zm::platform

@@ -17,7 +17,7 @@
 namespace zm {
 namespace {
 
-constexpr std::int32_t kMinColors = 2;
+constexpr std::int32_t kMinColors = 1;
 constexpr std::int32_t kMaxColors = 1024;
 constexpr std::int32_t kNeuralMethod = 0;
 constexpr std::int32_t kBoxMethod = 1;
@@ -88,26 +88,39 @@ private:
     std::vector<std::int16_t> slots_;
 };
 
-// The answers given last, for methods whose search is long: neighbouring pixels ask alike.
-class TAnswerCache {
+// All answers given so far, for methods whose search is long. Colours near each other lie
+// together, in blocks of 8 levels a channel that are made when first asked for.
+class TAnswerMemo {
 public:
     template <typename Search>
     std::int32_t Get(TRGB color, const Search& search) {
-        TAnswer& answer = answers_[SpreadKey(KeyOf(color), kBits)];
-        if (answer.key != KeyOf(color)) {
-            answer = {KeyOf(color), search(color)};
+        TBlockNumber& number = block_numbers_[CellOf(color)];
+        if (number == 0) {
+            answers_.resize(answers_.size() + kBlockSize, kUnknown);
+            number = static_cast<TBlockNumber>(answers_.size() / kBlockSize);
         }
-        return answer.index;
+        const std::size_t at = std::size_t{number - 1u} * kBlockSize + PlaceOf(color);
+        if (answers_[at] == kUnknown) {
+            answers_[at] = static_cast<std::int16_t>(search(color));
+        }
+        return answers_[at];
     }
 
 private:
-    static constexpr std::uint32_t kBits = 12;
-    static constexpr std::uint32_t kNoKey = 0xFFFFFFFF;
-    struct TAnswer {
-        std::uint32_t key = kNoKey;
-        std::int32_t index = 0;
-    };
-    std::vector<TAnswer> answers_ = std::vector<TAnswer>(std::size_t{1} << kBits);
+    using TBlockNumber = std::uint16_t;
+    static constexpr std::size_t kCells = 32 * 32 * 32;
+    static constexpr std::size_t kBlockSize = 8 * 8 * 8;
+    static constexpr std::int16_t kUnknown = -1;
+
+    static std::size_t CellOf(TRGB color) {
+        return static_cast<std::size_t>(color.b >> 3 | color.g >> 3 << 5 | color.r >> 3 << 10);
+    }
+    static std::size_t PlaceOf(TRGB color) {
+        return static_cast<std::size_t>((color.b & 7) | (color.g & 7) << 3 | (color.r & 7) << 6);
+    }
+
+    std::vector<TBlockNumber> block_numbers_ = std::vector<TBlockNumber>(kCells);  // 0: none yet
+    std::vector<std::int16_t> answers_;
 };
 
 // The distinct colours of an image, or nothing when there are more than `max_colors`.
@@ -146,7 +159,7 @@ struct TZmQuantizer::TState {
     std::unique_ptr<TNeuralPalette> neural;
     std::unique_ptr<TBoxPalette> boxes;
     std::vector<TRGB> own_palette;  // of a zm8p source
-    TAnswerCache cache;
+    TAnswerMemo memo;
 
     void FillPalette(TZmBitmap& source, std::vector<TRGB>& color_map);
     bool TakeExactColors(TZmBitmap& source, std::vector<TRGB>& color_map);
@@ -236,13 +249,13 @@ std::int32_t TZmQuantizer::GetRGBIndex(TRGB color) {
         return color.r * state.fNCol / 256;
     }
     if (state.neural) {
-        return state.cache.Get(color, [&](TRGB c) { return state.neural->FindIndex(c); });
+        return state.memo.Get(color, [&](TRGB c) { return state.neural->FindIndex(c); });
     }
     if (state.boxes) {
         return state.boxes->FindIndex(color);
     }
     if (!state.own_palette.empty()) {
-        return state.cache.Get(color, [&](TRGB c) { return state.FindInOwnPalette(c); });
+        return state.memo.Get(color, [&](TRGB c) { return state.FindInOwnPalette(c); });
     }
     return 0;
 }

@@ -35,7 +35,7 @@ std::size_t Bin(std::int32_t level) {
 }  // namespace
 
 TBoxPalette::TBoxPalette(TZmBitmap& source, std::int32_t color_count) : histogram_(kCells, 0) {
-    ZM_ASSERT(color_count >= 2 && color_count <= 1024);
+    ZM_ASSERT(color_count >= 1 && color_count <= 1024);
     CountPixels(source);
     boxes_.reserve(static_cast<std::size_t>(color_count));
     boxes_.push_back(MakeWholeBox());
@@ -105,31 +105,36 @@ void TBoxPalette::UpdateStatistics(TBox& box) const {
     box.variance /= static_cast<double>(pixel_count_);
 }
 
-// The lower half's last level where the halves' means lie farthest apart for their sizes, looked
-// for between the middles of the box's limits and its mean; -1 when a half would be empty.
+// The lower half's last level: the best score of the trial cuts between the middles of the box's
+// limits and its mean; -1 when a half would be empty.
+// Required: the count runs from the box's low limit, but the weighted sum only from the first
+// trial cut, and is divided by the count of the whole box; palettes of existing jobs depend on it.
 std::int32_t TBoxPalette::FindCut(const TBox& box, std::size_t channel) {
     const std::int32_t low = box.low[channel];
     const std::int32_t high = box.high[channel];
     const double mean = box.mean[channel];
     const std::int32_t first = RoundHalfEven((low + mean) / 2);
-    const std::int32_t last = std::min(RoundHalfEven((mean + high) / 2), high - 2);
+    const std::int32_t last = std::min(RoundHalfEven((mean + high) / 2), high - 1);
+    const auto total = static_cast<double>(box.count);
     std::int64_t count = 0;
+    for (std::int32_t i = low; i < first; ++i) {
+        count += box.bins[channel][Bin(i)];
+    }
     std::int64_t weighted_sum = 0;
     double best_score = -1;
     std::int32_t cut = -1;
-    for (std::int32_t i = low; i <= last; ++i) {
+    for (std::int32_t i = first; i <= last; ++i) {
         count += box.bins[channel][Bin(i)];
         weighted_sum += i * box.bins[channel][Bin(i)];
-        if (i < first || count == 0 || count == box.count) {
-            continue;
+        if (count == box.count) {
+            break;
         }
         const double part = static_cast<double>(count);
-        const double difference = mean - static_cast<double>(weighted_sum) / part;
-        const double rest = static_cast<double>(box.count - count);
-        const double score = part / rest * difference * difference;
+        const double difference = mean - static_cast<double>(weighted_sum) / total;
+        const double score = part / (total - part) * difference * difference;
         if (score > best_score) {
             best_score = score;
-            cut = i;
+            cut = count > 0 ? i : -1;
         }
     }
     return cut;

@@ -5,7 +5,6 @@
 #include <algorithm>
 #include <cstddef>
 #include <cstdlib>
-#include <limits>
 #include <utility>
 
 #include "engine/bitmap/zmrgbrows.h"
@@ -17,21 +16,22 @@ namespace zm {
 namespace {
 
 constexpr std::int32_t kColorBits = 4;       // fraction of a channel
-constexpr std::int32_t kBetaShift = 10;      // decay of freq
 constexpr std::int32_t kInitialFreq = 65536;  // shared by all neurons
 constexpr std::int32_t kFreqStep = 64;
 constexpr std::int32_t kBiasStep = 65536;
-constexpr std::int32_t kBiasShift = 12;
 constexpr std::int32_t kInitialAlpha = 1024;  // stands for 1
 constexpr std::int32_t kRadiusShift = 6;
 constexpr std::int32_t kRadiusDecay = 30;
 constexpr std::int32_t kRadiusPowerShift = 18;
 constexpr std::int32_t kMaxNeurons = 1024;
-constexpr std::int32_t kIndexFactor = 2048;  // room for a neuron's number below its distance
 constexpr std::int64_t kMinPixelsToSkip = 2000;
 
 std::size_t At(std::int32_t index) {
     return static_cast<std::size_t>(index);
+}
+
+std::size_t WholeBlocks(std::int32_t neuron_count) {
+    return (At(neuron_count) + kContestBlock - 1) / kContestBlock * kContestBlock;
 }
 
 // Where the samples are taken: a walk by a step that shares no factor with the image's size.
@@ -67,6 +67,31 @@ private:
 
 }  // namespace
 
+TContestResult RunContestPlain(const TContestView& neurons, std::int32_t b, std::int32_t g,
+                               std::int32_t r) {
+    TContestResult result;
+    std::int32_t least_distance = kMaxInt32;
+    std::int32_t least_biased = kMaxInt32;
+    for (std::size_t i = 0; i < neurons.count; ++i) {
+        const std::int32_t distance = std::abs(neurons.blue[i] - b) +
+                                      std::abs(neurons.green[i] - g) +
+                                      std::abs(neurons.red[i] - r);
+        if (distance < least_distance) {
+            least_distance = distance;
+            result.closest = static_cast<std::int32_t>(i);
+        }
+        const std::int32_t biased = distance - (neurons.bias[i] >> kBiasShift);
+        if (biased < least_biased) {
+            least_biased = biased;
+            result.winner = static_cast<std::int32_t>(i);
+        }
+        const std::int32_t decay = neurons.freq[i] >> kBetaShift;
+        neurons.freq[i] -= decay;
+        neurons.bias[i] += decay << kBetaShift;
+    }
+    return result;
+}
+
 std::int32_t NeuralSamplingFactor(std::int32_t quality, std::int64_t pixel_count) {
     constexpr std::int32_t kMaxFactor = 30;
     if (quality != -1) {
@@ -91,14 +116,15 @@ std::int32_t NeuralStep(std::int64_t pixel_count) {
 
 TNeuralPalette::TNeuralPalette(TZmBitmap& source, std::int32_t color_count, std::int32_t quality)
     : count_(color_count),
-      blue_(At(color_count)),
-      green_(At(color_count)),
-      red_(At(color_count)),
-      freq_(At(color_count), kInitialFreq / color_count),
-      bias_(At(color_count), 0) {
-    ZM_ASSERT(color_count >= 2 && color_count <= kMaxNeurons);
+      blue_(WholeBlocks(color_count), kContestFarAway),
+      green_(blue_),
+      red_(blue_),
+      freq_(blue_.size(), 0),
+      bias_(blue_.size(), 0) {
+    ZM_ASSERT(color_count >= 1 && color_count <= kMaxNeurons);
     for (std::int32_t i = 0; i < count_; ++i) {
         blue_[At(i)] = green_[At(i)] = red_[At(i)] = i * 4096 / count_;
+        freq_[At(i)] = kInitialFreq / count_;
     }
     const std::int64_t pixel_count = std::int64_t{source.GetWidth()} * source.GetHeight();
     Train(source, NeuralSamplingFactor(quality, pixel_count));
@@ -142,31 +168,13 @@ void TNeuralPalette::RebuildRadiusPower() {
     }
 }
 
-// Distance and number of a neuron travel as one value, so that the smaller number wins a tie and
-// the loop has no branches.
 std::int32_t TNeuralPalette::Contest(std::int32_t b, std::int32_t g, std::int32_t r) {
-    std::int32_t closest = std::numeric_limits<std::int32_t>::max();
-    std::int32_t winner = closest;
-    const std::int32_t* __restrict blue = blue_.data();
-    const std::int32_t* __restrict green = green_.data();
-    const std::int32_t* __restrict red = red_.data();
-    std::int32_t* __restrict freq = freq_.data();
-    std::int32_t* __restrict bias = bias_.data();
-    const std::int32_t count = count_;  // a local, which the stores cannot touch
-    for (std::int32_t i = 0; i < count; ++i) {
-        const std::int32_t distance =
-            std::abs(blue[i] - b) + std::abs(green[i] - g) + std::abs(red[i] - r);
-        closest = std::min(closest, distance * kIndexFactor + i);
-        const std::int32_t biased = distance - (bias[i] >> kBiasShift);
-        winner = std::min(winner, biased * kIndexFactor + i);
-        const std::int32_t decay = freq[i] >> kBetaShift;
-        freq[i] -= decay;
-        bias[i] += decay << kBetaShift;
-    }
-    closest &= kIndexFactor - 1;
-    freq[closest] += kFreqStep;
-    bias[closest] -= kBiasStep;
-    return winner & (kIndexFactor - 1);
+    const TContestView neurons{blue_.data(), green_.data(), red_.data(),
+                               freq_.data(), bias_.data(),  blue_.size()};
+    const TContestResult result = RunContest(neurons, b, g, r);
+    freq_[At(result.closest)] += kFreqStep;
+    bias_[At(result.closest)] -= kBiasStep;
+    return result.winner;
 }
 
 void TNeuralPalette::MoveWinner(std::int32_t neuron, const TEntry& sample) {

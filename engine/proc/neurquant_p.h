@@ -1,6 +1,7 @@
 #pragma once
 
 #include <array>
+#include <cstddef>
 #include <cstdint>
 #include <vector>
 
@@ -18,11 +19,45 @@ std::int32_t NeuralSamplingFactor(std::int32_t quality, std::int64_t pixel_count
 /// Distance in pixels between samples, prime to 3 * pixel_count.
 std::int32_t NeuralStep(std::int64_t pixel_count);
 
+/// Shifts of the contest: frequencies decay by 1 in 2^kBetaShift, biases count 1 in 2^kBiasShift.
+inline constexpr int kBetaShift = 10;
+inline constexpr int kBiasShift = 12;
+/// A neuron's number travels in the low bits of its distance, so that the smaller one wins a tie.
+inline constexpr int kContestNumberBits = 11;
+/// Neurons come in whole blocks of this many.
+inline constexpr std::size_t kContestBlock = 16;
+/// Channel value of the neurons that fill the last block: too far away to win anything.
+inline constexpr std::int32_t kContestFarAway = 200000;
+
+/// The arrays of a contest; `count` is a multiple of kContestBlock.
+struct TContestView {
+    const std::int32_t* blue;
+    const std::int32_t* green;
+    const std::int32_t* red;
+    std::int32_t* freq;
+    std::int32_t* bias;
+    std::size_t count;
+};
+
+struct TContestResult {
+    std::int32_t closest = 0;  ///< the neuron of the least distance
+    std::int32_t winner = 0;   ///< the neuron of the least distance less bias
+    friend bool operator==(const TContestResult&, const TContestResult&) = default;
+};
+
+/// Finds both and lets all frequencies decay into the biases. Values are -4080 to 4080 around
+/// the sample, biases below 2^27.
+TContestResult RunContestPlain(const TContestView& neurons, std::int32_t b, std::int32_t g,
+                               std::int32_t r);
+/// The same in vectors, the same numbers.
+TContestResult RunContest(const TContestView& neurons, std::int32_t b, std::int32_t g,
+                          std::int32_t r);
+
 /// A one-dimensional self-organising map trained with samples of the image, in integer
 /// arithmetic: channels have 4 fractional bits, the learning rate 10, radius 6.
 class TNeuralPalette {
 public:
-    /// Trains the network at once. `color_count` is 2 to 1024; the image is not empty.
+    /// Trains the network at once. `color_count` is 1 to 1024; the image is not empty.
     TNeuralPalette(TZmBitmap& source, std::int32_t color_count, std::int32_t quality);
     /// Entry i is neuron i.
     void WritePalette(std::vector<TRGB>& color_map) const;
@@ -63,7 +98,7 @@ private:
 /// Splits the colour cube, at 5 bits a channel, into boxes of small variance.
 class TBoxPalette {
 public:
-    /// Counts and splits at once. `color_count` is 2 to 1024; the image is not empty.
+    /// Counts and splits at once. `color_count` is 1 to 1024; the image is not empty.
     TBoxPalette(TZmBitmap& source, std::int32_t color_count);
     std::int32_t GetBoxCount() const { return static_cast<std::int32_t>(boxes_.size()); }
     /// Entry i is the mean colour of box i; entries behind the last box are left alone.

@@ -8,7 +8,9 @@
 
 #include "engine/bitmap/zmxBitmaps.h"
 #include "engine/foundation/zmdefs.h"
+#include "engine/proc/zmdither.h"
 #include "engine/proc/zmoperations.h"
+#include "engine/proc/zmpalettes.h"
 
 namespace zm {
 
@@ -161,7 +163,35 @@ public:
     void ResampleTo(TZmBitmap* target, std::int32_t new_width, std::int32_t new_height,
                     TResampleFilter filter, bool maintain_aspect_ratio);
 
+    // Rotation and flips of the whole bitmap (engines: the rotation header). Selections are
+    // ignored; an angle of 0, or no finite number, does nothing.
+    /// A background of -1 is the processor's own colour.
+    void Rotate(double angle, TZmAntialiasMode mode, TColor background);
+    void Rotate(double angle, bool antialias, TZmAntialiasMode mode, TColor background);
+    void Flip(TFlipDir direction);
+    TColor GetBackground() const { return fBackground; }
+    /// Colour of what a growing image leaves free; black at first.
+    void SetBackground(TColor color) { fBackground = color; }
+
+    // Colours and formats.
+    /// Reduces the image to at most 3 to 1024 colours (other counts do nothing), found by
+    /// TZmQuantizer; it becomes zm24RGB. zmThreshold takes the found colour of each pixel,
+    /// zmOrdered and zmDithering spread what is missing (zmdtOrdered8x8, zmdtErrorDiffusion).
+    /// Colours that are in the palette stay.
+    void ConvertTo(std::int32_t num_colors, TZmDitherMethod dither_method);
+    /// The same with given colours, 1 to 256, which become the palette of a zm8p image.
+    void ConvertToPalette(const std::vector<TRGB>& colors, TZmDitherMethod dither_method);
+    /// Converts to a format. For zm8p the palette type and the dither type apply (zmptMedianCut:
+    /// 256 colours found for the image; a zm8p image then keeps its own). zm1g needs zmptFixedBW:
+    /// zmdtSolid cuts at the automatic level, zmdtOrdered8x8 as the format conversion does. Other
+    /// formats ignore both types. False for what cannot be converted so, which
+    /// `check_parameters_only` only asks, and when there is no room.
+    bool ConvertTo(TZmPixelFormat format, TZmPaletteType palette_type,
+                   TZmDitherType dither_type, bool check_parameters_only);
+
 private:
+    void ReduceColors(const std::u16string& caption, std::int32_t operation,
+                      const std::function<void(TZmBitmap& image)>& reduce);
     bool MakeConsistent(const TZmPixelFormatSet& allowed, bool check_view);
     void RequireBitmap() const;
     std::unique_ptr<TZmBitmap> CopyState(TZmUndoSource source);

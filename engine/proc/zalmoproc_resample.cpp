@@ -5,6 +5,7 @@
 #include "engine/foundation/zmnumbers.h"
 #include "engine/proc/zalmoproc.h"
 #include "engine/proc/zmresample.h"
+#include "engine/proc/zmresample_p.h"
 
 namespace zm {
 namespace {
@@ -22,8 +23,8 @@ bool PrepareTarget(TZmBitmap& source, TZmBitmap& target, TZmImageSize size) {
     return true;
 }
 
-/// A new bitmap for the image that is to replace the one of `owner` takes its place settings. A
-/// platform bitmap is filled from memory.
+}  // namespace
+
 void TakePlaceSettings(TZmBitmap& owner, TZmBitmap& result) {
     if (owner.GetLocation() != zmTBitmap) {
         result.SetLocation(owner.GetLocation());
@@ -32,8 +33,6 @@ void TakePlaceSettings(TZmBitmap& owner, TZmBitmap& result) {
     result.SetBitAlignment(owner.GetBitAlignment());
     result.SetMemoryAllocator(owner.GetMemoryAllocator());
 }
-
-}  // namespace
 
 void TZmBitmap::TakeOver(TZmBitmap& source) {
     if (GetLocation() == zmTBitmap) {

@@ -12,13 +12,16 @@ struct TOperationRow {
     const char16_t* caption;
 };
 
-constexpr std::array<TOperationRow, 6> kOperations{{
+constexpr std::array<TOperationRow, 9> kOperations{{
+    {kOperationConvertColors, u"Convert to %d colors"},
     {kOperationFlipHorizontal, u"Flip Horizontal"},
     {kOperationFlipVertical, u"Flip Vertical"},
     {kOperationNegative, u"Negative"},
     {kOperationResample, u"Resize Image"},
     {kOperationRotate, u"Rotate"},
     {kOperationText, u"Insert Text"},
+    {kOperationConvertPixels, u"Convert Pixels"},
+    {kOperationConvertToPalette, u"Convert to Palette"},
 }};
 
 }  // namespace

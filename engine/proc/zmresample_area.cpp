@@ -38,13 +38,6 @@ double CubicOuter(double u) {
     return -(v * v * v) + 5 * (v * v) - 8 * v + 4;
 }
 
-/// Four-point cubic with parameter -1 between b and c, limited to 0 .. limit.
-double Cubic(double a, double b, double c, double d, double t, double limit) {
-    const double value = a * CubicOuter(1 + t) + b * CubicInner(t) + c * CubicInner(t - 1) +
-                         d * CubicOuter(t - 2);
-    return value < 0 ? 0 : value > limit ? limit : value;
-}
-
 /// Sample offsets of a source column's neighbours in a row, limited to the image.
 struct TColumns {
     std::size_t left = 0;
@@ -212,7 +205,7 @@ template <typename Sample>
 double TAreaEngine<Sample>::CubicInRow(const TRow& row, const TColumns& at, std::size_t channel,
                                        double fx) const {
     const Sample* samples = row.samples.data() + channel;
-    return Cubic(samples[at.left], samples[at.here], samples[at.right], samples[at.right2], fx,
+    return LimitedCubic(samples[at.left], samples[at.here], samples[at.right], samples[at.right2], fx,
                  kLimit);
 }
 
@@ -225,12 +218,12 @@ double TAreaEngine<Sample>::CubicValue(const TColumns& at, std::size_t channel, 
             const double b = RoundHalfEven(CubicInRow(*current_, at, channel, fx));
             const double c = RoundHalfEven(CubicInRow(*next_, at, channel, fx));
             const double d = RoundHalfEven(CubicInRow(*next2_, at, channel, fx));
-            return Cubic(a, b, c, d, fy, kLimit);
+            return LimitedCubic(a, b, c, d, fy, kLimit);
         }
         case kModeES: return CubicInRow(*current_, at, channel, fx);
         case kModeSE: {
             const std::size_t i = at.here + channel;
-            return Cubic(previous_->samples[i], current_->samples[i], next_->samples[i],
+            return LimitedCubic(previous_->samples[i], current_->samples[i], next_->samples[i],
                          next2_->samples[i], fy, kLimit);
         }
         default: return current_->samples[at.here + channel];
@@ -360,6 +353,16 @@ void TAreaEngine<Sample>::Run() {
 
 }  // namespace
 
+std::array<double, 4> CubicWeights(double t) {
+    return {CubicOuter(1 + t), CubicInner(t), CubicInner(t - 1), CubicOuter(t - 2)};
+}
+
+double LimitedCubic(double a, double b, double c, double d, double t, double limit) {
+    const std::array<double, 4> weights = CubicWeights(t);
+    const double value = a * weights[0] + b * weights[1] + c * weights[2] + d * weights[3];
+    return value < 0 ? 0 : value > limit ? limit : value;
+}
+
 std::vector<double> MakeAreaPieces(double step, std::int32_t source_size,
                                    std::int32_t target_size) {
     const std::int64_t count = static_cast<std::int64_t>(source_size) + target_size;
@@ -393,7 +396,7 @@ bool ResampleAreaPlain(TZmBitmap& source, TZmBitmap& target, TZmBitmap* alpha,
 bool ResampleArea(TZmBitmap& source, TZmBitmap& target, TZmBitmap* alpha,
                   TAreaInterpolation interpolation, const TResampleListener& listener) {
     if (HasFastArea(source, target, alpha, interpolation)) {
-        return ResampleAreaFast(source, target, listener);
+        return ResampleAreaFast(source, target, interpolation, listener);
     }
     return ResampleAreaPlain(source, target, alpha, interpolation, listener);
 }

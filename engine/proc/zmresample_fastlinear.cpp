@@ -19,6 +19,9 @@
 namespace zm {
 namespace {
 
+/// Means over more rows or columns than this keep to whole-number division.
+constexpr std::int32_t kMaxMeanLength = 4096;
+
 /// Where one target column comes from.
 struct TColumnSpan {
     std::int32_t left = 0;
@@ -50,7 +53,7 @@ template <typename Sample, std::size_t kChannels>
 class TFastLinear {
 public:
     TFastLinear(TZmBitmap& source, TZmBitmap& target, const TRect* rect,
-                const TResampleListener& listener);
+                const TResampleListener& listener, TResampleForm form);
     void Run();
 
 private:
@@ -61,10 +64,17 @@ private:
     };
 
     const std::vector<std::int32_t>& FilteredRow(std::int32_t index);
+    void PrepareMeans();
+    void FilterRow(const Sample* in, std::int32_t* out);
     void ShrinkRow(const Sample* in, std::int32_t* out) const;
     void EnlargeRow(const Sample* in, std::int32_t* out) const;
+    void EnlargeRowFast(const Sample* in, std::int32_t* out) const;
     void MeanRow(std::int32_t y);
+    void MeanRows(std::int32_t top, std::int32_t bottom);
+    void MeanRowsFast(std::int32_t top, std::int32_t bottom);
     void BlendRow(std::int32_t y);
+    void BlendRows(const std::int32_t* a, const std::int32_t* b, double f);
+    void BlendBytes(const std::int32_t* a, const std::int32_t* b, double f);
     void WriteRow(std::int32_t y);
 
     TZmBitmap& source_;
@@ -72,11 +82,15 @@ private:
     std::int32_t source_height_;
     std::int32_t source_width_;
     std::int32_t target_height_;
+    bool is_fast_;
     TRect rect_;
     double scale_x_;
     double scale_y_;
     std::vector<TColumnSpan> spans_;
     std::array<TFilteredRow, 2> rows_;
+    std::vector<TMeanSpan> means_;         ///< fast form of shrinking zm24RGB
+    std::vector<std::uint8_t> row_copy_;   ///< for it: a row with a byte behind
+    std::vector<std::int32_t> fast_sums_;  ///< fast form of vertical means
     std::vector<std::int64_t> sums_;
     std::vector<Sample> output_;
     TPercentReporter reporter_;
@@ -85,12 +99,14 @@ private:
 
 template <typename Sample, std::size_t kChannels>
 TFastLinear<Sample, kChannels>::TFastLinear(TZmBitmap& source, TZmBitmap& target,
-                                            const TRect* rect, const TResampleListener& listener)
+                                            const TRect* rect, const TResampleListener& listener,
+                                            TResampleForm form)
     : source_(source),
       target_(target),
       source_height_(source.GetHeight()),
       source_width_(source.GetWidth()),
       target_height_(target.GetHeight()),
+      is_fast_(form == TResampleForm::kFast),
       rect_(LimitRect(rect, target.GetWidth(), target.GetHeight())),
       scale_x_(static_cast<double>(target.GetWidth()) / source.GetWidth()),
       scale_y_(static_cast<double>(target.GetHeight()) / source.GetHeight()),
@@ -105,10 +121,29 @@ TFastLinear<Sample, kChannels>::TFastLinear(TZmBitmap& source, TZmBitmap& target
                              target.GetWidth());
     }
     for (TFilteredRow& row : rows_) {
-        row.samples = MakeWorkBuffer<std::int32_t>(samples);
+        row.samples = MakeWorkBuffer<std::int32_t>(samples + 1);
     }
+    PrepareMeans();
     sums_ = MakeWorkBuffer<std::int64_t>(scale_y_ > 1 ? 0 : samples);
     output_ = MakeWorkBuffer<Sample>(samples);
+}
+
+/// The spans for the vector loop, where that applies.
+template <typename Sample, std::size_t kChannels>
+void TFastLinear<Sample, kChannels>::PrepareMeans() {
+    const auto is_long = [](const TColumnSpan& span) {
+        return span.right - span.left >= kMaxMeanLength;
+    };
+    if (!is_fast_ || kChannels != 3 || sizeof(Sample) != 1 || scale_x_ > 1 ||
+        std::any_of(spans_.begin(), spans_.end(), is_long)) {
+        return;
+    }
+    means_.reserve(spans_.size());
+    for (const TColumnSpan& span : spans_) {
+        const std::int32_t count = span.right - span.left + 1;
+        means_.push_back(TMeanSpan{span.left, count, 1.0f / static_cast<float>(count)});
+    }
+    row_copy_.assign(static_cast<std::size_t>(source_width_) * kChannels + 1, 0);
 }
 
 /// Each channel becomes the truncating mean of its span.
@@ -141,6 +176,34 @@ void TFastLinear<Sample, kChannels>::EnlargeRow(const Sample* in, std::int32_t* 
     }
 }
 
+/// EnlargeRow with the rounding that the compiler can put into vectors; the same double
+/// arithmetic.
+template <typename Sample, std::size_t kChannels>
+void TFastLinear<Sample, kChannels>::EnlargeRowFast(const Sample* in, std::int32_t* out) const {
+    for (const TColumnSpan& span : spans_) {
+        const std::int32_t next = std::min(span.left + 1, source_width_ - 1);
+        const Sample* a = in + static_cast<std::size_t>(span.left) * kChannels;
+        const Sample* b = in + static_cast<std::size_t>(next) * kChannels;
+        for (std::size_t c = 0; c < kChannels; ++c) {
+            *out++ = static_cast<std::int32_t>(RoundToWhole(a[c] + (b[c] - a[c]) * span.frac));
+        }
+    }
+}
+
+template <typename Sample, std::size_t kChannels>
+void TFastLinear<Sample, kChannels>::FilterRow(const Sample* in, std::int32_t* out) {
+    if (!means_.empty()) {
+        std::memcpy(row_copy_.data(), in, row_copy_.size() - 1);
+        MeanSpans24(row_copy_.data(), means_.data(), means_.size(), out);
+    } else if (scale_x_ <= 1) {
+        ShrinkRow(in, out);
+    } else if (is_fast_) {
+        EnlargeRowFast(in, out);
+    } else {
+        EnlargeRow(in, out);
+    }
+}
+
 template <typename Sample, std::size_t kChannels>
 const std::vector<std::int32_t>& TFastLinear<Sample, kChannels>::FilteredRow(std::int32_t index) {
     for (const TFilteredRow& row : rows_) {
@@ -152,11 +215,7 @@ const std::vector<std::int32_t>& TFastLinear<Sample, kChannels>::FilteredRow(std
     row.index = index;
     const auto* in = reinterpret_cast<const Sample*>(source_.GetScanLine(index));
     if (in != nullptr) {
-        if (scale_x_ > 1) {
-            EnlargeRow(in, row.samples.data());
-        } else {
-            ShrinkRow(in, row.samples.data());
-        }
+        FilterRow(in, row.samples.data());
     }
     reporter_.Report(++units_done_);
     return row.samples;
@@ -169,6 +228,15 @@ void TFastLinear<Sample, kChannels>::MeanRow(std::int32_t y) {
     const std::int32_t top = std::min(RoundHalfEven(y / scale_y_), source_height_ - 1);
     const std::int32_t bottom =
         std::clamp(RoundHalfEven(next / scale_y_), top, source_height_ - 1);
+    if (is_fast_ && sizeof(Sample) == 1 && bottom - top < kMaxMeanLength) {
+        MeanRowsFast(top, bottom);
+    } else {
+        MeanRows(top, bottom);
+    }
+}
+
+template <typename Sample, std::size_t kChannels>
+void TFastLinear<Sample, kChannels>::MeanRows(std::int32_t top, std::int32_t bottom) {
     std::fill(sums_.begin(), sums_.end(), 0);
     for (std::int32_t row = top; row <= bottom; ++row) {
         const std::vector<std::int32_t>& samples = FilteredRow(row);
@@ -182,16 +250,66 @@ void TFastLinear<Sample, kChannels>::MeanRow(std::int32_t y) {
     }
 }
 
+/// MeanRows for bytes: the sums stay small, and the division becomes a product.
+template <typename Sample, std::size_t kChannels>
+void TFastLinear<Sample, kChannels>::MeanRowsFast(std::int32_t top, std::int32_t bottom) {
+    fast_sums_.assign(output_.size(), 0);
+    for (std::int32_t row = top; row <= bottom; ++row) {
+        const std::int32_t* samples = FilteredRow(row).data();
+        for (std::size_t i = 0; i < fast_sums_.size(); ++i) {
+            fast_sums_[i] += samples[i];
+        }
+    }
+    const TQuotient quotient(bottom - top + 1);
+    for (std::size_t i = 0; i < fast_sums_.size(); ++i) {
+        output_[i] = quotient(static_cast<float>(fast_sums_[i]));
+    }
+}
+
 /// Vertical enlarging: a blend of two filtered rows.
 template <typename Sample, std::size_t kChannels>
 void TFastLinear<Sample, kChannels>::BlendRow(std::int32_t y) {
     const double position = y / scale_y_;
     const std::int32_t top = std::min(TruncToInt(position), source_height_ - 1);
     const double f = position - top;
-    const std::vector<std::int32_t>& a = FilteredRow(top);
-    const std::vector<std::int32_t>& b = FilteredRow(std::min(top + 1, source_height_ - 1));
+    const std::int32_t* a = FilteredRow(top).data();
+    const std::int32_t* b = FilteredRow(std::min(top + 1, source_height_ - 1)).data();
+    if (is_fast_ && sizeof(Sample) == 1) {
+        BlendBytes(a, b, f);
+    } else {
+        BlendRows(a, b, f);
+    }
+}
+
+template <typename Sample, std::size_t kChannels>
+void TFastLinear<Sample, kChannels>::BlendRows(const std::int32_t* a, const std::int32_t* b,
+                                               double f) {
     for (std::size_t i = 0; i < output_.size(); ++i) {
         output_[i] = ClampSample<Sample>(RoundHalfEven(a[i] + (b[i] - a[i]) * f));
+    }
+}
+
+/// BlendRows for bytes in single precision; blocks with a value near a tie are computed again. A
+/// fraction of few bits makes that arithmetic exact; otherwise three roundings of numbers below
+/// 512 lie between rows and value.
+template <typename Sample, std::size_t kChannels>
+void TFastLinear<Sample, kChannels>::BlendBytes(const std::int32_t* a, const std::int32_t* b,
+                                                double f) {
+    if constexpr (sizeof(Sample) == 1) {
+        TBlendRows rows;
+        rows.fraction = static_cast<float>(f);
+        rows.tie_start = BitsBehindPoint(f) <= kMaxExactBits ? 0.5f : 0.5f - 0.0002f;
+        for (std::size_t first = 0; first < output_.size(); first += kTieBlock) {
+            const std::size_t count = std::min(kTieBlock, output_.size() - first);
+            rows.upper = a + first;
+            rows.lower = b + first;
+            if (!BlendIntRows(rows, count, output_.data() + first)) {
+                continue;
+            }
+            for (std::size_t i = first; i < first + count; ++i) {
+                output_[i] = Clamp8(RoundHalfEven(a[i] + (b[i] - a[i]) * f));
+            }
+        }
     }
 }
 
@@ -225,7 +343,7 @@ void TFastLinear<Sample, kChannels>::Run() {
 }  // namespace
 
 bool ResampleFastLinear(TZmBitmap& source, TZmBitmap& target, const TRect* inclusive_rect,
-                        const TResampleListener& listener) {
+                        const TResampleListener& listener, TResampleForm form) {
     if (source.IsEmpty() || target.IsEmpty()) {
         return false;
     }
@@ -240,11 +358,11 @@ bool ResampleFastLinear(TZmBitmap& source, TZmBitmap& target, const TRect* inclu
     if (source.GetWidth() == target.GetWidth() && source.GetHeight() == target.GetHeight()) {
         target.AssignEx(&source, /*with_params=*/false);
     } else if (format == zm24RGB) {
-        TFastLinear<std::uint8_t, 3>(source, target, inclusive_rect, listener).Run();
+        TFastLinear<std::uint8_t, 3>(source, target, inclusive_rect, listener, form).Run();
     } else if (format == zm16g) {
-        TFastLinear<std::uint16_t, 1>(source, target, inclusive_rect, listener).Run();
+        TFastLinear<std::uint16_t, 1>(source, target, inclusive_rect, listener, form).Run();
     } else {
-        TFastLinear<std::uint8_t, 1>(source, target, inclusive_rect, listener).Run();
+        TFastLinear<std::uint8_t, 1>(source, target, inclusive_rect, listener, form).Run();
     }
     return true;
 }

@@ -7,6 +7,8 @@
 #include <algorithm>
 #include <array>
 #include <cmath>
+#include <cstdlib>
+#include <cstring>
 #include <memory>
 #include <numbers>
 #include <vector>
@@ -93,17 +95,12 @@ constexpr std::array<TKernel, 9> kKernels{{
     {KernelLinear, 1.0},
 }};
 
-/// One tap of a kernel.
-struct TContributor {
-    std::int32_t pixel = 0;   ///< source coordinate, inside the image
-    std::int32_t weight = 0;  ///< 256 is 1.0
-};
-
 /// The taps of one target column or row.
 struct TCList {
     const TContributor* p = nullptr;
     std::int32_t n = 0;
     std::int32_t divisor = 256;
+    const float* weights = nullptr;  ///< those of `p`
 };
 
 /// The tap lists of one direction.
@@ -111,18 +108,29 @@ class TTapTable {
 public:
     TTapTable(const TKernel& kernel, std::int32_t source_size, std::int32_t target_size);
     std::int32_t Count() const { return static_cast<std::int32_t>(divisors_.size()); }
+    /// Sums of bytes are whole numbers that single precision holds, and TQuotient divides them.
+    bool FitsFloat() const { return fits_float_; }
+    TTapRow Row() const {
+        return TTapRow{taps_.data(), weights_.data(), starts_.data(), quotients_.data(),
+                       quotients_.size()};
+    }
     TCList operator[](std::int32_t index) const {
         const auto i = static_cast<std::size_t>(index);
         return TCList{taps_.data() + starts_[i],
-                      static_cast<std::int32_t>(starts_[i + 1] - starts_[i]), divisors_[i]};
+                      static_cast<std::int32_t>(starts_[i + 1] - starts_[i]), divisors_[i],
+                      weights_.data() + starts_[i]};
     }
 
 private:
     void AddTaps(const TKernel& kernel, double center, double width, double fscale);
     void AddTap(std::int64_t pixel, std::int32_t weight);
+    void EndList(std::size_t list);
 
     std::int64_t source_size_;
+    bool fits_float_ = true;
     std::vector<TContributor> taps_;
+    std::vector<float> weights_;
+    std::vector<TQuotient> quotients_;
     std::vector<std::size_t> starts_;
     std::vector<std::int32_t> divisors_;
 };
@@ -139,16 +147,23 @@ TTapTable::TTapTable(const TKernel& kernel, std::int32_t source_size, std::int32
     divisors_ = MakeWorkBuffer<std::int32_t>(target_size);
     for (std::int32_t i = 0; i < target_size; ++i) {
         AddTaps(kernel, i / scale, width, fscale);
-        const auto list = static_cast<std::size_t>(i);
-        starts_[list + 1] = taps_.size();
-        std::int32_t sum = 0;
-        for (std::size_t tap = starts_[list]; tap < taps_.size(); ++tap) {
-            sum += taps_[tap].weight;
-        }
-        // A sum of 0 divides by 256. (Shifting the sum right by 8 bits, as the vertical pass
-        // may be told, differs for negative sums only, and those become 0.)
-        divisors_[list] = sum != 0 ? sum : 256;
+        EndList(static_cast<std::size_t>(i));
     }
+}
+
+void TTapTable::EndList(std::size_t list) {
+    starts_[list + 1] = taps_.size();
+    std::int32_t sum = 0;
+    std::int64_t largest = 0;
+    for (std::size_t tap = starts_[list]; tap < taps_.size(); ++tap) {
+        sum += taps_[tap].weight;
+        largest += std::abs(std::int64_t{taps_[tap].weight}) * 255;
+    }
+    // A sum of 0 divides by 256. (Shifting the sum right by 8 bits, as the vertical pass may be
+    // told, differs for negative sums only, and those become 0.)
+    divisors_[list] = sum != 0 ? sum : 256;
+    quotients_.emplace_back(divisors_[list]);
+    fits_float_ = fits_float_ && largest <= kMaxFloatSum && std::abs(sum) <= kMaxFloatDivisor;
 }
 
 void TTapTable::AddTaps(const TKernel& kernel, double center, double width, double fscale) {
@@ -172,6 +187,7 @@ void TTapTable::AddTap(std::int64_t pixel, std::int32_t weight) {
     }
     pixel = std::clamp<std::int64_t>(pixel, 0, source_size_ - 1);
     taps_.push_back(TContributor{static_cast<std::int32_t>(pixel), weight});
+    weights_.push_back(static_cast<float>(weight));
 }
 
 template <typename Sample, std::size_t kChannels>
@@ -191,6 +207,59 @@ void FilterRow(const Sample* in, Sample* out, const TTapTable& contrib) {
     }
 }
 
+/// A source row as numbers and a filtered row, each with one element more: three channels are
+/// filtered as four.
+struct TFloatRow {
+    std::vector<float> samples;
+    std::vector<std::uint8_t> bytes;
+};
+
+/// FilterRow for bytes in single precision, the same bytes. `room` serves one row at a time.
+template <std::size_t kChannels>
+void FilterRowFast(const std::uint8_t* in, std::int32_t width, std::uint8_t* out,
+                   const TTapTable& contrib, TFloatRow& room) {
+    const std::size_t count = static_cast<std::size_t>(width) * kChannels;
+    for (std::size_t i = 0; i < count; ++i) {
+        room.samples[i] = in[i];
+    }
+    if constexpr (kChannels == 3) {
+        FilterPixels24(contrib.Row(), room.samples.data(), room.bytes.data());
+        std::memcpy(out, room.bytes.data(), room.bytes.size() - 1);
+    } else {
+        for (std::int32_t x = 0; x < contrib.Count(); ++x) {
+            const TCList list = contrib[x];
+            float sum = 0;
+            for (std::int32_t i = 0; i < list.n; ++i) {
+                sum += list.weights[i] * room.samples[static_cast<std::size_t>(list.p[i].pixel)];
+            }
+            out[x] = TQuotient(list.divisor)(sum);
+        }
+    }
+}
+
+/// A row of bytes by the faster form, where it applies.
+template <std::size_t kChannels>
+void FilterByteRow(const std::uint8_t* in, std::int32_t width, std::uint8_t* out,
+                   const TTapTable& contrib, TFloatRow& room) {
+    if (room.samples.empty()) {
+        FilterRow<std::uint8_t, kChannels>(in, out, contrib);
+    } else {
+        FilterRowFast<kChannels>(in, width, out, contrib, room);
+    }
+}
+
+/// Room for FilterByteRow; empty where the plain form is to run.
+TFloatRow MakeFloatRow(const TTapTable& contrib, std::int32_t width, std::int32_t channels,
+                       TResampleForm form) {
+    TFloatRow room;
+    if (form == TResampleForm::kFast && contrib.FitsFloat()) {
+        room.samples = MakeWorkBuffer<float>(static_cast<std::int64_t>(width) * channels + 1);
+        room.bytes = MakeWorkBuffer<std::uint8_t>(
+            static_cast<std::int64_t>(contrib.Count()) * channels + 1);
+    }
+    return room;
+}
+
 /// The sums of one target row over the rows of the work plane.
 template <typename Sample>
 void SumRows(TZmBitmap& work, const TCList& list, std::vector<std::int32_t>& sums) {
@@ -205,6 +274,72 @@ void SumRows(TZmBitmap& work, const TCList& list, std::vector<std::int32_t>& sum
         for (std::size_t k = 0; k < sums.size(); ++k) {
             sums[k] += row[k] * weight;
         }
+    }
+}
+
+/// sums[i] += the rows' samples times their weights.
+template <std::size_t kRows>
+void AddFloatRows(const std::uint8_t* const* rows, const float* weights, float* __restrict sums,
+                  std::size_t count) {
+    for (std::size_t i = 0; i < count; ++i) {
+        float sum = sums[i];
+        for (std::size_t k = 0; k < kRows; ++k) {
+            sum += weights[k] * static_cast<float>(rows[k][i]);
+        }
+        sums[i] = sum;
+    }
+}
+
+/// SumRows for bytes in single precision, the same numbers. Four rows are taken at a time where
+/// the plane's rows stay valid.
+void SumRowsFast(TZmBitmap& work, const TCList& list, std::vector<float>& sums) {
+    constexpr std::int32_t kAtOnce = 4;
+    std::fill(sums.begin(), sums.end(), 0.0f);
+    const bool rows_stay_valid = work.GetLocation() != zmFile;
+    std::int32_t i = 0;
+    while (rows_stay_valid && i + kAtOnce <= list.n) {
+        std::array<const std::uint8_t*, kAtOnce> rows{};
+        for (std::size_t k = 0; k < rows.size(); ++k) {
+            rows[k] = work.GetScanLine(list.p[i + static_cast<std::int32_t>(k)].pixel);
+        }
+        if (std::find(rows.begin(), rows.end(), nullptr) != rows.end()) {
+            break;
+        }
+        AddFloatRows<kAtOnce>(rows.data(), list.weights + i, sums.data(), sums.size());
+        i += kAtOnce;
+    }
+    for (; i < list.n; ++i) {
+        const std::uint8_t* row = work.GetScanLine(list.p[i].pixel);
+        if (row != nullptr) {
+            AddFloatRows<1>(&row, list.weights + i, sums.data(), sums.size());
+        }
+    }
+}
+
+/// FilterColumns for bytes, the same bytes.
+template <bool kGrayToColor>
+void FilterColumnsFast(TZmBitmap& work, TZmBitmap& target, const TTapTable& contrib,
+                       TPercentReporter& reporter) {
+    std::vector<float> sums = MakeWorkBuffer<float>(
+        static_cast<std::int64_t>(work.GetWidth()) * work.GetChannelCount());
+    for (std::int32_t y = 0; y < target.GetHeight(); ++y) {
+        const TCList list = contrib[y];
+        SumRowsFast(work, list, sums);
+        std::uint8_t* out = target.GetScanLine(y);
+        if (out == nullptr) {
+            continue;
+        }
+        const TQuotient quotient(list.divisor);
+        if constexpr (kGrayToColor) {
+            for (const float sum : sums) {
+                out = std::fill_n(out, 3, quotient(sum));
+            }
+        } else {
+            for (std::size_t i = 0; i < sums.size(); ++i) {
+                out[i] = quotient(sums[i]);
+            }
+        }
+        reporter.Report(static_cast<std::int64_t>(y) + work.GetHeight() + 1);
     }
 }
 
@@ -235,6 +370,7 @@ void FilterColumns(TZmBitmap& work, TZmBitmap& target, const TTapTable& contrib,
 /// What all horizontal workers share.
 struct TResampleHorizSharedFields {
     std::int32_t ThreadsCount = 1;
+    TResampleForm form = TResampleForm::kPlain;
     const TTapTable* contrib = nullptr;
     TZmBitmap* Src = nullptr;
     TZmBitmap* Work = nullptr;
@@ -258,6 +394,8 @@ public:
           thread_index_(thread_index) {}
 
     void Execute() override {
+        const std::int32_t width = shared_.Src->GetWidth();
+        TFloatRow room = MakeFloatRow(*shared_.contrib, width, 3, shared_.form);
         for (std::int32_t y = start_y_; y < start_y_ + row_count_; ++y) {
             const auto row = static_cast<std::size_t>(y);
             const bool collected = !shared_.src_rows.empty();
@@ -266,7 +404,7 @@ public:
             std::uint8_t* out = collected ? shared_.work_rows[row]
                                           : shared_.Work->GetScanLine(y);
             if (in != nullptr && out != nullptr) {
-                FilterRow<std::uint8_t, 3>(in, out, *shared_.contrib);
+                FilterByteRow<3>(in, width, out, *shared_.contrib, room);
             }
             if (thread_index_ == 0) {
                 const std::int64_t rows = static_cast<std::int64_t>(shared_.ThreadsCount) * y;
@@ -299,9 +437,10 @@ void CollectRows(TResampleHorizSharedFields& shared) {
 }
 
 void FilterRowsOfColor(TZmBitmap& source, TZmBitmap& work, const TTapTable& contrib,
-                       TPercentReporter& reporter) {
+                       TResampleForm form, TPercentReporter& reporter) {
     TResampleHorizSharedFields shared;
     shared.ThreadsCount = CountThreads(source, work);
+    shared.form = form;
     shared.contrib = &contrib;
     shared.Src = &source;
     shared.Work = &work;
@@ -324,8 +463,9 @@ void FilterRowsOfColor(TZmBitmap& source, TZmBitmap& work, const TTapTable& cont
 /// samples of 0 and 255.
 template <typename Sample>
 void FilterRowsOfGray(TZmBitmap& source, TZmBitmap& work, const TTapTable& contrib,
-                      TPercentReporter& reporter) {
+                      TResampleForm form, TPercentReporter& reporter) {
     const bool bits = source.GetPixelFormat() == zm1g;
+    TFloatRow room = MakeFloatRow(contrib, source.GetWidth(), 1, form);
     std::vector<Sample> unpacked(bits ? static_cast<std::size_t>(source.GetWidth()) : 0);
     for (std::int32_t y = 0; y < source.GetHeight(); ++y) {
         const std::uint8_t* in = source.GetScanLine(y);
@@ -337,7 +477,11 @@ void FilterRowsOfGray(TZmBitmap& source, TZmBitmap& work, const TTapTable& contr
             unpacked[x] = (in[x >> 3] >> (7 - (x & 7)) & 1) != 0 ? 255 : 0;
         }
         const auto* samples = bits ? unpacked.data() : reinterpret_cast<const Sample*>(in);
-        FilterRow<Sample, 1>(samples, reinterpret_cast<Sample*>(out), contrib);
+        if constexpr (sizeof(Sample) == 1) {
+            FilterByteRow<1>(samples, source.GetWidth(), out, contrib, room);
+        } else {
+            FilterRow<Sample, 1>(samples, reinterpret_cast<Sample*>(out), contrib);
+        }
         reporter.Report(static_cast<std::int64_t>(y) + 1);
     }
 }
@@ -347,10 +491,35 @@ TZmPixelFormat WorkFormat(TZmPixelFormat source_format) {
     return source_format == zm1g ? zm8g : source_format;
 }
 
+void FilterAllRows(TZmBitmap& source, TZmBitmap& work, const TTapTable& columns, TResampleForm form,
+                   TPercentReporter& reporter) {
+    switch (source.GetPixelFormat()) {
+        case zm24RGB: FilterRowsOfColor(source, work, columns, form, reporter); break;
+        case zm16g: FilterRowsOfGray<std::uint16_t>(source, work, columns, form, reporter); break;
+        default: FilterRowsOfGray<std::uint8_t>(source, work, columns, form, reporter); break;
+    }
+}
+
+void FilterAllColumns(TZmPixelFormat format, TZmBitmap& work, TZmBitmap& target,
+                      const TTapTable& rows, TResampleForm form, TPercentReporter& reporter) {
+    const bool fast = form == TResampleForm::kFast && rows.FitsFloat();
+    if (format == zm16g) {
+        FilterColumns<std::uint16_t, false>(work, target, rows, reporter);
+    } else if (format == zm1g && fast) {
+        FilterColumnsFast<true>(work, target, rows, reporter);
+    } else if (format == zm1g) {
+        FilterColumns<std::uint8_t, true>(work, target, rows, reporter);
+    } else if (fast) {
+        FilterColumnsFast<false>(work, target, rows, reporter);
+    } else {
+        FilterColumns<std::uint8_t, false>(work, target, rows, reporter);
+    }
+}
+
 }  // namespace
 
 bool ResampleKernel(TZmBitmap& source, TZmBitmap& target, TResampleFilter filter,
-                    const TResampleListener& listener) {
+                    const TResampleListener& listener, TResampleForm form) {
     const TZmPixelFormat format = source.GetPixelFormat();
     const bool known = format == zm24RGB || format == zm8g || format == zm16g || format == zm1g;
     if (!known || filter < rfTriangle || filter > rfLinear || source.IsEmpty() ||
@@ -366,22 +535,10 @@ bool ResampleKernel(TZmBitmap& source, TZmBitmap& target, TResampleFilter filter
     TPercentReporter reporter(listener, per1);
     {
         const TTapTable columns(kernel, source.GetWidth(), target.GetWidth());
-        if (format == zm24RGB) {
-            FilterRowsOfColor(source, work, columns, reporter);
-        } else if (format == zm16g) {
-            FilterRowsOfGray<std::uint16_t>(source, work, columns, reporter);
-        } else {
-            FilterRowsOfGray<std::uint8_t>(source, work, columns, reporter);
-        }
+        FilterAllRows(source, work, columns, form, reporter);
     }
     const TTapTable rows(kernel, source.GetHeight(), target.GetHeight());
-    if (format == zm16g) {
-        FilterColumns<std::uint16_t, false>(work, target, rows, reporter);
-    } else if (format == zm1g) {
-        FilterColumns<std::uint8_t, true>(work, target, rows, reporter);
-    } else {
-        FilterColumns<std::uint8_t, false>(work, target, rows, reporter);
-    }
+    FilterAllColumns(format, work, target, rows, form, reporter);
     return true;
 }
 

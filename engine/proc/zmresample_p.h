@@ -1,5 +1,7 @@
 #pragma once
 
+#include <algorithm>
+#include <cstddef>
 #include <cstdint>
 #include <type_traits>
 #include <vector>
@@ -81,6 +83,56 @@ constexpr Sample ClampSample(std::int32_t value) {
     }
 }
 
+/// Within these limits a sum of bytes times weights, and half more, is exact in single precision,
+/// and TQuotient right.
+inline constexpr std::int64_t kMaxFloatSum = 1 << 22;
+inline constexpr std::int32_t kMaxFloatDivisor = 8192;
+
+/// The truncated quotient by a divisor, limited to a byte, as a product. Half a unit away from
+/// zero keeps whole quotients off the rounding: the exact value then lies 0.5 / divisor or more
+/// from an integer, that is 6e-5, and the product's error is below 256 / 2^23, that is 3.1e-5.
+/// Larger quotients are limited, and so are all of the other sign.
+class TQuotient {
+public:
+    explicit TQuotient(std::int32_t divisor)
+        : half_(divisor < 0 ? -0.5f : 0.5f), reciprocal_(1.0f / static_cast<float>(divisor)) {}
+    float Half() const { return half_; }
+    float Reciprocal() const { return reciprocal_; }
+    std::uint8_t operator()(float sum) const {
+        const float value = (sum + half_) * reciprocal_;
+        return static_cast<std::uint8_t>(
+            static_cast<std::int32_t>(std::min(std::max(value, 0.0f), 255.0f)));
+    }
+
+private:
+    float half_;
+    float reciprocal_;
+};
+
+/// Rounds to the nearest integer, ties to even, values within 2^22 for float and 2^31 for
+/// double: beyond the shift there is
+/// no fraction left.
+inline float RoundToWhole(float value) {
+    constexpr float kShift = 12582912.0f;
+    return (value + kShift) - kShift;
+}
+inline double RoundToWhole(double value) {
+    constexpr double kShift = 6755399441055744.0;
+    return (value + kShift) - kShift;
+}
+
+/// Samples that are checked for ties at a time.
+inline constexpr std::size_t kTieBlock = 256;
+
+/// Bits behind the point that a value may have to count as exact.
+inline constexpr int kMaxExactBits = 10;
+/// Bits behind the point of a value; a large number when it has more than kMaxExactBits.
+int BitsBehindPoint(double value);
+
+/// Gives a new bitmap, which is to replace the image of `owner` or to stand beside it, the place
+/// settings of `owner`. The image of a platform bitmap is made in memory.
+void TakePlaceSettings(TZmBitmap& owner, TZmBitmap& result);
+
 /// Brings a target into a format, keeping its size; the pixels are then undefined.
 [[nodiscard]] bool FitTargetFormat(TZmBitmap& target, TZmPixelFormat format);
 
@@ -102,25 +154,72 @@ enum class TAreaInterpolation : std::uint8_t { kLinear, kCubic };
                                      TAreaInterpolation interpolation,
                                      const TResampleListener& listener);
 
-/// Whether a fast form stands for the plain one here: rfBilinear on zm8g and zm24RGB, both
-/// sides shrinking, or both enlarging without partial alpha.
+/// Whether a fast form stands for the plain one here: both sides shrinking, or both enlarging
+/// (linearly without partial alpha, and not zm32RGB).
 bool HasFastArea(TZmBitmap& source, TZmBitmap& target, TZmBitmap* alpha,
                  TAreaInterpolation interpolation);
 /// The fast form; gives the same bytes. Only where HasFastArea says so.
 [[nodiscard]] bool ResampleAreaFast(TZmBitmap& source, TZmBitmap& target,
+                                    TAreaInterpolation interpolation,
                                     const TResampleListener& listener);
+
+/// The plain form of an engine, with its divisions, or the fast one with the same bytes.
+enum class TResampleForm : std::uint8_t { kPlain, kFast };
 
 /// Two-pass separable filter with integer weights, rfTriangle to rfLinear: zm24RGB (worker
 /// threads), zm8g, zm16g to the same format and zm1g to zm24RGB.
 [[nodiscard]] bool ResampleKernel(TZmBitmap& source, TZmBitmap& target, TResampleFilter filter,
-                                  const TResampleListener& listener);
+                                  const TResampleListener& listener,
+                                  TResampleForm form = TResampleForm::kFast);
 
 /// Integer-plane linear filter, shrinking by means: zm24RGB, zm8g, zm16g to the same format and
 /// zm1g to zm24RGB. `inclusive_rect` limits the target pixels computed; nil, or one with right
 /// and bottom -1, means all. (A zm1g source computes all in any case.)
 [[nodiscard]] bool ResampleFastLinear(TZmBitmap& source, TZmBitmap& target,
                                       const TRect* inclusive_rect,
-                                      const TResampleListener& listener);
+                                      const TResampleListener& listener,
+                                      TResampleForm form = TResampleForm::kFast);
+
+/// One tap of a kernel.
+struct TContributor {
+    std::int32_t pixel = 0;   ///< source coordinate, inside the image
+    std::int32_t weight = 0;  ///< 256 is 1.0
+};
+
+/// The taps of a row of target pixels: those of pixel x, with their weights once more as floats,
+/// from starts[x] up to starts[x + 1].
+struct TTapRow {
+    const TContributor* taps = nullptr;
+    const float* weights = nullptr;
+    const std::size_t* starts = nullptr;
+    const TQuotient* quotients = nullptr;
+    std::size_t count = 0;
+};
+/// Filters three-byte pixels given as floats. Reads one number behind the last pixel and writes
+/// one byte behind the last one. The sums are exact within kMaxFloatSum.
+void FilterPixels24(const TTapRow& row, const float* samples, std::uint8_t* out);
+
+/// A span of source columns, with the reciprocal of its length.
+struct TMeanSpan {
+    std::int32_t left = 0;
+    std::int32_t count = 0;
+    float reciprocal = 0;
+};
+/// Truncating means of spans of three-byte pixels, of kMaxFloatDivisor pixels at most. Reads one
+/// byte behind the last span and writes one number behind the last mean.
+void MeanSpans24(const std::uint8_t* in, const TMeanSpan* spans, std::size_t count,
+                 std::int32_t* out);
+
+/// Two rows of integers of -1024 to 1024 and a fraction between them.
+struct TBlendRows {
+    const std::int32_t* upper = nullptr;
+    const std::int32_t* lower = nullptr;
+    float fraction = 0;
+    float tie_start = 0.5f;
+};
+/// Writes blended, rounded and limited samples; true when a value lies further than `tie_start`
+/// from its integer.
+bool BlendIntRows(const TBlendRows& rows, std::size_t count, std::uint8_t* out);
 
 /// The zm1g form of ResampleFastLinear.
 [[nodiscard]] bool ResampleBitsFastLinear(TZmBitmap& source, TZmBitmap& target);

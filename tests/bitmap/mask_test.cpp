@@ -1,5 +1,6 @@
 #include <gtest/gtest.h>
 
+#include "engine/bitmap/zmbitmapmemory_p.h"
 #include "engine/bitmap/zmmask.h"
 
 namespace zm::test {
@@ -94,6 +95,31 @@ TEST(Mask, SyncFullLooksAtPixelsOnly) {
     }
     mask.SyncFull();
     EXPECT_TRUE(mask.GetFull());  // the clear bits behind the last pixel do not count
+}
+
+TEST(Mask, WithoutRoomDoesNothing) {
+    TZmMask mask;
+    ASSERT_TRUE(mask.AllocateBits(100, 100, 8));
+    mask.SetPixel(3, 3, 9);
+    SetLargestBitmapBlock(5000);
+    TZmMask other;
+    ASSERT_TRUE(other.AllocateBits(100, 100, 8));  // the rows come later
+    other.SetPixel(1, 1, 255);
+    other.Fill(255);
+    other.SetRectangle(2, 2, 5, 5, 255);
+    other.Negative(255);
+    other.SyncRect();
+    other.SyncFull();
+    EXPECT_TRUE(other.IsEmpty());
+    EXPECT_FALSE(other.GetFull());
+    EXPECT_EQ(other.CreateResampledMask(5, 5), nullptr);
+    mask.TranslateBitmap(1, 1, true);
+    EXPECT_FALSE(mask.Resize(101, 101));
+    EXPECT_EQ(mask.CreateResampledMask(101, 101), nullptr);
+    EXPECT_EQ(mask.GetPixel(3, 3), 9);
+    other.Assign(mask);
+    EXPECT_EQ(other.GetWidth(), 0);
+    SetLargestBitmapBlock(-1);
 }
 
 TEST(Mask, AssignCopiesAll) {

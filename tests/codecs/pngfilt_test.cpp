@@ -206,6 +206,75 @@ TEST(PngReader, TextsComeInOrderFromBothSidesOfTheImage) {
     EXPECT_EQ(loaded.params.fPNG_TextValues, (TStringList{"one", "small", "\xC3\xA4", "three"}));
 }
 
+/// A profile that the library takes: a head of 128 bytes and an empty table of tags, with bytes
+/// behind them that do not compress, since it refuses very small chunks.
+TBytes SmallProfile() {
+    TBytes profile(252);
+    profile[3] = 252;
+    for (std::uint32_t i = 132; i < 252; ++i) {
+        profile[i] = static_cast<std::uint8_t>(i * 2654435761u >> 24);
+    }
+    const auto put = [&profile](std::size_t at, const std::string& text) {
+        std::copy(text.begin(), text.end(), profile.begin() + static_cast<std::ptrdiff_t>(at));
+    };
+    profile[8] = 2;
+    put(12, "mntrRGB XYZ ");
+    put(36, "acsp");
+    profile[70] = 0xF6;  // the white of the connection space
+    profile[71] = 0xD6;
+    profile[73] = 1;
+    profile[78] = 0xD3;
+    profile[79] = 0x2D;
+    return profile;
+}
+
+TEST(PngReader, MetadataChunksAreKeptFromBothSidesOfTheImage) {
+    const TBytes exif = {'I', 'I', 42, 0, 8, 0, 0, 0, 0, 0, 0, 0, 0, 0};
+    TBytes packed = BytesOf(std::string("Mine\0\0", 6));
+    const TBytes deflated = Deflate(SmallProfile());
+    packed.insert(packed.end(), deflated.begin(), deflated.end());
+    TPngPicture picture{2, 2, 8, 2, false, PngChunk("iCCP", packed), PngChunk("eXIf", exif)};
+    const TBytes wide = PngChunk("iTXt", BytesOf(std::string("Wide\0\0\0en\0W\0\xC3\xA4", 14)));
+    TBytes packet = BytesOf(std::string("XML:com.adobe.xmp\0\1\0\0\0", 22));
+    const TBytes deflated_packet = Deflate(BytesOf("<x:xmpmeta/>"));
+    packet.insert(packet.end(), deflated_packet.begin(), deflated_packet.end());
+    picture.before_data.insert(picture.before_data.end(), wide.begin(), wide.end());
+    const TBytes xmp = PngChunk("iTXt", packet);
+    picture.after_data.insert(picture.after_data.end(), xmp.begin(), xmp.end());
+    TLoaded loaded;
+    loaded.params.fPNG_Chunks.Add({kPngChunkExif, "stale", "", "", {1}});
+    Load(loaded, picture.Build());
+    ASSERT_FALSE(loaded.progress.aborting);
+    TZmPngChunkList& chunks = loaded.params.fPNG_Chunks;
+    ASSERT_EQ(chunks.Count(), 4);
+    EXPECT_EQ(*chunks.Find(kPngChunkExif), (TZmPngChunk{kPngChunkExif, "", "", "", exif}));
+    EXPECT_EQ(*chunks.Find(kPngChunkProfile),
+              (TZmPngChunk{kPngChunkProfile, "Mine", "", "", SmallProfile()}));
+    EXPECT_EQ(*chunks.Find(kPngChunkText),
+              (TZmPngChunk{kPngChunkText, "Wide", "en", "W", BytesOf("\xC3\xA4")}));
+    ASSERT_NE(chunks.FindXmp(), nullptr);
+    EXPECT_EQ(chunks.FindXmp()->data, BytesOf("<x:xmpmeta/>"));
+
+    TIOParams copy;
+    copy.Assign(loaded.params);
+    copy.fPNG_Chunks.Delete(kPngChunkExif);
+    EXPECT_EQ(copy.fPNG_Chunks.Find(kPngChunkExif), nullptr);
+    EXPECT_EQ(copy.fPNG_Chunks.Count(), 3);
+    copy.fPNG_Chunks.DeleteXmp();
+    EXPECT_EQ(copy.fPNG_Chunks.FindXmp(), nullptr);
+    copy.fPNG_Chunks.Delete(kPngChunkProfile);
+    EXPECT_EQ(copy.fPNG_Chunks.Find(kPngChunkProfile), nullptr);
+    ASSERT_EQ(copy.fPNG_Chunks.Count(), 1);
+    copy.fPNG_Chunks.DeletePlainTexts();
+    EXPECT_EQ(copy.fPNG_Chunks.Count(), 0);
+    EXPECT_EQ(chunks.Count(), 4);
+
+    loaded.params.fGetMetaData = false;
+    Load(loaded, picture.Build());
+    EXPECT_EQ(chunks.Count(), 0);
+    EXPECT_EQ(loaded.params.fPNG_TextKeys, (TStringList{"Wide", "XML:com.adobe.xmp"}));
+}
+
 TEST(PngReader, BackgroundByColorType) {
     struct {
         int color_type;

@@ -9,6 +9,7 @@
 #include <vector>
 
 #include "engine/foundation/zmdefs.h"
+#include "engine/io/zmstreamprovider.h"
 
 namespace zm {
 namespace {
@@ -195,6 +196,27 @@ TEST(BufferedWriteStream, TellsThatTheTargetIsFull) {
     EXPECT_LT(writer.Write(bytes.data() + 8, 20), 20);
     EXPECT_TRUE(writer.HasFailed());
     EXPECT_EQ(0, writer.Write(bytes.data(), 1));
+}
+
+TEST(StreamProvider, ForwardsAndStaysSilent) {
+    TMemoryStream stream(std::vector<std::uint8_t>{10, 20, 30});
+    TZmVCLStreamProvider provider(&stream);
+    EXPECT_EQ(3, provider.size());
+    EXPECT_EQ(10, provider.silent_getc());
+    EXPECT_EQ(2, provider.seek(1, 1));
+    EXPECT_EQ(30, provider.silent_getc());
+    EXPECT_TRUE(provider.eof());
+    EXPECT_EQ(-1, provider.silent_getc());
+    EXPECT_EQ(1, provider.seek(-2, 2));
+    EXPECT_EQ(1, provider.silent_write("x", 1));
+    EXPECT_EQ(2, provider.seek(9, 3));  // no such origin
+    EXPECT_EQ(0, provider.seek(0, 0));
+    EXPECT_EQ(0, provider.tell());
+    TZmBufferedWriteStream raising(&stream, 16);
+    TZmVCLStreamProvider silent(&raising);
+    std::uint8_t byte = 0;
+    EXPECT_EQ(0, silent.silent_read(&byte, 1));
+    EXPECT_EQ(-1, silent.silent_getc());
 }
 
 }  // namespace

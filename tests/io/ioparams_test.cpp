@@ -6,7 +6,7 @@
 #include <vector>
 
 #include "engine/bitmap/zmxBitmaps.h"
-#include "engine/io/zmbytereader.h"
+#include "engine/foundation/zmbytereader.h"
 #include "engine/foundation/zmsettings.h"
 #include "engine/io/zmimagelimits.h"
 #include "engine/io/zmprogress.h"
@@ -226,6 +226,24 @@ TEST_F(IOParams, LoadingForDisplayChoosesScaleAndSpeed) {
     EXPECT_FALSE(params.fRAW_GetEmbeddedJpeg);
     EXPECT_EQ(800, params.fRAW_EmbeddedJpegMinWidth);
     EXPECT_EQ(zmrlDefault, params.fRAW_EmbeddedJpegLoading);
+}
+
+TEST_F(IOParams, CoordinatesAreFoldedIntoTheirRanges) {
+    TIOParams params;
+    params.fEXIF_GPSLatitudeDegrees = 41.5;
+    params.fEXIF_GPSLatitudeMinutes = 61;
+    params.fEXIF_GPSLatitudeSeconds = 75.25;
+    params.fEXIF_GPSLatitudeRef = "South";
+    params.fEXIF_GPSDestLongitudeDegrees = -1;
+    params.fEXIF_GPSDestLongitudeRef = "E";
+    params.AdjustGPSCoordinates();
+    EXPECT_EQ(42, params.fEXIF_GPSLatitudeDegrees);
+    EXPECT_EQ(32, params.fEXIF_GPSLatitudeMinutes);
+    EXPECT_EQ(15.25, params.fEXIF_GPSLatitudeSeconds);
+    EXPECT_EQ("S", params.fEXIF_GPSLatitudeRef);
+    EXPECT_EQ(1, params.fEXIF_GPSDestLongitudeDegrees);
+    EXPECT_EQ("W", params.fEXIF_GPSDestLongitudeRef);
+    EXPECT_EQ("", params.fEXIF_GPSLongitudeRef);
 }
 
 TEST(MarkerList, KeepsOrderAndBearsIndicesOutside) {

@@ -321,9 +321,50 @@ TEST_F(ActionsTest, OneBitAndPaletteImagesTakeTheirKindOfBorder) {
     }
 }
 
-TEST_F(ActionsTest, RotateAndDrawingReportNothing) {
+TEST_F(ActionsTest, RotateTurnsClockwiseAndFlips) {
+    const struct {
+        const char16_t* text;
+        double angle;  // of the bitmap, 0 for a flip
+        TFlipDir flip;
+    } kCases[] = {{u"angle=90", -90, fdNone},
+                  {u"action=0\r\nangle= -30 ", 30, fdNone},
+                  {u"angle={degrees}", -7, fdNone},
+                  {u"angle=-2147483648", 2147483648.0, fdNone},
+                  {u"angle=360", 360, fdNone},
+                  {u"action=1\r\nangle=90", 0, fdHorizontal},
+                  {u"action=2", 0, fdVertical}};
+    plugin.host.variables[u"degrees"] = u"7";
+    for (const auto& c : kCases) {
+        auto picture = Open(zm24RGB, 15, 9);
+        ASSERT_TRUE(Exec(gaRotateImage, c.text)) << Utf8FromUtf16(c.text);
+        picture->Rotate(c.angle, zmrBilinear, 0xFFFFFF);
+        picture->Flip(c.flip);
+        ExpectSamePixels(*picture, *Image());
+    }
+    ExpectNothingReported();
+    auto picture = Open(zm24RGB, 3, 2);
+    const TRGB last = picture->GetPixels(0, 1);
+    ASSERT_TRUE(Exec(gaRotateImage, u"angle=90"));
+    ExpectSize(2, 3, u"quarter turn");
+    EXPECT_EQ(Image()->GetPixels(0, 0), last) << "clockwise";
+    Open(zm24RGB, 15, 9);
+    ASSERT_TRUE(Exec(gaRotateImage, u"angle=45"));
+    EXPECT_EQ(Image()->GetPixels(0, 0), kWhite);
+}
+
+TEST_F(ActionsTest, RotateByNothingFailsSilently) {
     auto picture = Open(zm24RGB, 5, 4);
-    EXPECT_FALSE(Exec(gaRotateImage, u"angle=90"));
+    plugin.host.variables[u"word"] = u"left";
+    for (const char16_t* text : {u"", u"angle=0", u"angle=x", u"angle={word}", u"angle=90.5",
+                                 u"action=3\r\nangle=90", u"action=-1\r\nangle=90"}) {
+        EXPECT_FALSE(Exec(gaRotateImage, text)) << Utf8FromUtf16(text);
+    }
+    ExpectNothingReported();
+    ExpectSamePixels(*picture, *Image());
+}
+
+TEST_F(ActionsTest, DrawingReportsNothing) {
+    auto picture = Open(zm24RGB, 5, 4);
     EXPECT_FALSE(Exec(gaTextOnImage, u"text=x"));
     EXPECT_FALSE(Exec(gaImageOnImage, u"image_file=" + folder.Name("open1.bmp")));
     ExpectNothingReported();

@@ -1,5 +1,8 @@
 #pragma once
 
+#include <gtest/gtest.h>
+
+#include <cstddef>
 #include <cstdint>
 #include <memory>
 #include <vector>
@@ -65,6 +68,57 @@ inline TMatrix ValuesOf(TZmBitmap& bitmap) {
 inline std::unique_ptr<TZmBitmap> TargetFor(TZmBitmap& source, std::int32_t width,
                                             std::int32_t height) {
     return std::make_unique<TZmBitmap>(width, height, source.GetPixelFormat());
+}
+
+/// A picture in borrowed memory: rows of odd length with guard bytes at both ends of the block.
+class TGuardedPicture {
+public:
+    TGuardedPicture(TZmPixelFormat format, std::int32_t width, std::int32_t height,
+                    std::size_t offset)
+        : offset_(kGuard + offset) {
+        bitmap_.SetBitAlignment(8);
+        const auto row = static_cast<std::size_t>(width) *
+                         static_cast<std::size_t>(PixelFormatInfo(format).bit_count) / 8;
+        size_ = row * static_cast<std::size_t>(height);
+        block_.assign(offset_ + size_ + kGuard, kMark);
+        bitmap_.EncapsulateMemory(block_.data() + offset_, width, height, format,
+                                  /*do_free_image=*/true, zmboTOPLEFT);
+    }
+    TZmBitmap& Bitmap() { return bitmap_; }
+    void ExpectGuardsIntact() const {
+        for (std::size_t i = 0; i < block_.size(); ++i) {
+            if (i < offset_ || i >= offset_ + size_) {
+                ASSERT_EQ(block_[i], kMark) << "guard byte " << i;
+            }
+        }
+    }
+
+private:
+    static constexpr std::size_t kGuard = 64;
+    static constexpr std::uint8_t kMark = 0xA5;
+    std::size_t offset_;
+    std::size_t size_ = 0;
+    std::vector<std::uint8_t> block_;
+    TZmBitmap bitmap_;
+};
+
+/// What a picture holds: noise, or values near rounding ties.
+enum TContent : std::uint8_t { kNoiseContent, kTwoLevels, kSteps, kContentCount };
+
+inline void FillContent(TZmBitmap& bitmap, TContent content, std::uint32_t seed) {
+    const std::int64_t bytes =
+        static_cast<std::int64_t>(bitmap.GetWidth()) * bitmap.GetBitCount() / 8;
+    std::uint32_t state = seed;
+    for (std::int32_t y = 0; y < bitmap.GetHeight(); ++y) {
+        std::uint8_t* row = bitmap.GetScanLine(y);
+        for (std::int64_t i = 0; i < bytes; ++i) {
+            state = state * 1664525u + 1013904223u;
+            const auto byte = static_cast<std::uint8_t>(state >> 24);
+            row[i] = content == kNoiseContent ? byte
+                     : content == kTwoLevels  ? (byte < 128 ? 0 : 255)
+                                              : static_cast<std::uint8_t>(byte & 1);
+        }
+    }
 }
 
 inline const TResampleListener kNobody;

@@ -139,7 +139,8 @@ TEST(ResampleDispatcherTest, EveryFilterSurvivesThinPictures) {
     for (const TThinCase& test :
          {TThinCase{{1, 1}, {3, 2}}, TThinCase{{1, 300}, {300, 1}}, TThinCase{{300, 1}, {1, 300}},
           TThinCase{{2, 2}, {1, 1}}, TThinCase{{1, 20000}, {2, 1}}, TThinCase{{1, 2}, {1, 20000}},
-          TThinCase{{65535, 1}, {1, 2}}}) {
+          TThinCase{{65535, 1}, {1, 2}}, TThinCase{{1, 2}, {65535, 1}},
+          TThinCase{{2, 1}, {1, 65535}}}) {
         for (const TZmPixelFormat format : {zm1g, zm8p, zm8g, zm16g, zm24RGB, zm32RGB, zm48RGB}) {
             const auto source = MakeGradient(format, test.from.width, test.from.height);
             for (int filter = 0; filter < kResampleFilterCount; ++filter) {
@@ -378,17 +379,51 @@ TEST(ZalmoProcResampleTest, ResampleToLeavesTheAttachedBitmap) {
     EXPECT_EQ(target.GetWidth(), 10);
 }
 
-TEST(ZalmoProcResampleTest, FailingListenerLeavesTheBitmap) {
-    const auto image = MakeNoise(zm24RGB, 300, 300, 2);
-    const auto before = MakeNoise(zm24RGB, 300, 300, 2);
-    TZalmoProc proc(image.get());
-    proc.SetOnProgress([](void*, std::int32_t percent) {
-        if (percent >= 30) {
+/// Resamples with a listener that stops at its `stop`-th call; false when it was not called so
+/// often.
+bool StopsAt(TZmBitmap& image, std::int32_t stop, TZmImageSize to, TResampleFilter filter) {
+    TZalmoProc proc(&image);
+    std::int32_t calls = 0;
+    proc.SetOnProgress([&](void*, std::int32_t) {
+        if (++calls == stop) {
             throw EZmException("stop");
         }
     });
-    for (const TResampleFilter filter : {rfBilinear, rfLanczos3, rfFastLinear}) {
-        EXPECT_THROW(proc.Resample(150, 100, filter, false), EZmException) << int{filter};
+    try {
+        proc.Resample(to.width, to.height, filter, false);
+    } catch (const EZmException&) {
+        return true;
+    }
+    return false;
+}
+
+TEST(ZalmoProcResampleTest, StoppingAtAnyStepLeavesTheBitmap) {
+    for (const TZmPixelFormat format : {zm8g, zm16g, zm24RGB, zm32RGB}) {
+        const auto before = MakeNoise(format, 20, 18, 2);
+        for (const TResampleFilter filter : {rfBilinear, rfBicubic, rfLanczos3, rfFastLinear}) {
+            for (const TZmImageSize to : {TZmImageSize{13, 9}, TZmImageSize{33, 27},
+                                          TZmImageSize{9, 30}}) {
+                const auto image = MakeNoise(format, 20, 18, 2);
+                std::int32_t stop = 1;
+                while (StopsAt(*image, stop, to, filter)) {
+                    ASSERT_EQ(image->GetPixelFormat(), format);
+                    ExpectSamePixels(*before, *image);
+                    ASSERT_FALSE(testing::Test::HasFailure())
+                        << format << ' ' << filter << " step " << stop;
+                    ++stop;
+                }
+                EXPECT_GE(stop, to.height) << format << ' ' << filter;
+                EXPECT_EQ(image->GetWidth(), to.width) << "the last run was not stopped";
+            }
+        }
+    }
+}
+
+TEST(ZalmoProcResampleTest, StoppingFromAWorkerThreadLeavesTheBitmap) {
+    const auto image = MakeNoise(zm24RGB, 300, 300, 2);
+    const auto before = MakeNoise(zm24RGB, 300, 300, 2);
+    for (const std::int32_t stop : {1, 30, 60}) {
+        ASSERT_TRUE(StopsAt(*image, stop, {150, 100}, rfLanczos3)) << stop;
         ExpectSamePixels(*before, *image);
     }
 }

@@ -22,6 +22,16 @@ private:
     void* handle_;
 };
 
+std::unique_ptr<TLibrary> OpenLibrary(const std::string& name, std::string& error_text) {
+    void* const handle = ::dlopen(name.c_str(), RTLD_NOW | RTLD_LOCAL);
+    if (handle == nullptr) {
+        const char* const reason = ::dlerror();
+        error_text = reason != nullptr ? reason : "unknown reason";
+        return nullptr;
+    }
+    return std::make_unique<TLinuxLibrary>(handle);
+}
+
 }  // namespace
 
 std::u16string ModulePathOf(const void* address) {
@@ -47,14 +57,16 @@ std::u16string ProgramPath() {
 
 std::unique_ptr<TLibrary> LoadLibraryFile(const std::u16string& path, std::string& error_text) {
     // An absolute path, because a bare name would be looked for in the system's folders.
-    const std::string native = NativeName(AbsolutePath(path));
-    void* const handle = ::dlopen(native.c_str(), RTLD_NOW | RTLD_LOCAL);
-    if (handle == nullptr) {
-        const char* const reason = ::dlerror();
-        error_text = reason != nullptr ? reason : "unknown reason";
+    return OpenLibrary(NativeName(AbsolutePath(path)), error_text);
+}
+
+std::unique_ptr<TLibrary> LoadInstalledLibrary(const std::string& file_name,
+                                               std::string& error_text) {
+    if (file_name.find('/') != std::string::npos) {
+        error_text = "not a bare file name";
         return nullptr;
     }
-    return std::make_unique<TLinuxLibrary>(handle);
+    return OpenLibrary(file_name, error_text);
 }
 
 }  // namespace zm::platform

@@ -4,6 +4,7 @@
 
 #include <vector>
 
+#include "engine/foundation/zmstrings.h"
 #include "engine/platform/files.h"
 #include "engine/platform/win32/support_p.h"
 
@@ -39,8 +40,8 @@ std::u16string PathOf(HMODULE module) {
 
 std::u16string ModulePathOf(const void* address) {
     HMODULE module = nullptr;
-    const DWORD flags = GET_MODULE_HANDLE_EX_FLAG_FROM_ADDRESS |
-                        GET_MODULE_HANDLE_EX_FLAG_UNCHANGED_REFCOUNT;
+    const DWORD flags =
+        GET_MODULE_HANDLE_EX_FLAG_FROM_ADDRESS | GET_MODULE_HANDLE_EX_FLAG_UNCHANGED_REFCOUNT;
     if (GetModuleHandleExW(flags, static_cast<const wchar_t*>(address), &module) == FALSE) {
         return {};
     }
@@ -53,10 +54,25 @@ std::u16string ProgramPath() {
 
 std::unique_ptr<TLibrary> LoadLibraryFile(const std::u16string& path, std::string& error_text) {
     // An absolute path and no search in other folders for what the library itself needs.
-    const HMODULE module = LoadLibraryExW(WideOf(AbsolutePath(path)), nullptr,
-                                          LOAD_WITH_ALTERED_SEARCH_PATH);
+    const HMODULE module =
+        LoadLibraryExW(WideOf(AbsolutePath(path)), nullptr, LOAD_WITH_ALTERED_SEARCH_PATH);
     if (module == nullptr) {
         error_text = ErrorText(GetLastError());
+        return nullptr;
+    }
+    return std::make_unique<TWin32Library>(module);
+}
+
+std::unique_ptr<TLibrary> LoadInstalledLibrary(const std::string& file_name,
+                                               std::string& error_text) {
+    constexpr DWORD kProgramAndSystem =
+        LOAD_LIBRARY_SEARCH_APPLICATION_DIR | LOAD_LIBRARY_SEARCH_SYSTEM32;
+    const std::u16string name = Utf16FromUtf8(file_name);
+    const bool is_bare = name.find_first_of(u"/\\:") == std::u16string::npos;
+    const HMODULE module =
+        is_bare ? LoadLibraryExW(WideOf(name), nullptr, kProgramAndSystem) : nullptr;
+    if (module == nullptr) {
+        error_text = is_bare ? ErrorText(GetLastError()) : "not a bare file name";
         return nullptr;
     }
     return std::make_unique<TWin32Library>(module);

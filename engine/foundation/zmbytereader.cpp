@@ -1,4 +1,4 @@
-#include "engine/io/zmbytereader.h"
+#include "engine/foundation/zmbytereader.h"
 
 namespace zm {
 

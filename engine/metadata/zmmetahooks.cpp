@@ -1,0 +1,10 @@
+#include "engine/metadata/zmmetahooks.h"
+
+namespace zm {
+
+TZmMetadataHooks& MetadataHooks() {
+    static TZmMetadataHooks hooks;
+    return hooks;
+}
+
+}  // namespace zm

@@ -1,0 +1,41 @@
+#include "engine/metadata/zmpngchunks.h"
+
+#include <algorithm>
+
+namespace zm {
+
+namespace {
+
+constexpr std::string_view kXmpKeyword = "XML:com.adobe.xmp";
+
+}  // namespace
+
+bool IsXmpChunk(const TZmPngChunk& chunk) {
+    return chunk.kind == kPngChunkText && chunk.key == kXmpKeyword;
+}
+
+const TZmPngChunk* TZmPngChunkList::Find(TZmPngChunkKind kind) const {
+    const auto found = std::ranges::find(items_, kind, &TZmPngChunk::kind);
+    return found == items_.end() ? nullptr : &*found;
+}
+
+const TZmPngChunk* TZmPngChunkList::FindXmp() const {
+    const auto found = std::ranges::find_if(items_, IsXmpChunk);
+    return found == items_.end() ? nullptr : &*found;
+}
+
+void TZmPngChunkList::Delete(TZmPngChunkKind kind) {
+    std::erase_if(items_, [kind](const TZmPngChunk& chunk) { return chunk.kind == kind; });
+}
+
+void TZmPngChunkList::DeleteXmp() {
+    std::erase_if(items_, IsXmpChunk);
+}
+
+void TZmPngChunkList::DeletePlainTexts() {
+    std::erase_if(items_, [](const TZmPngChunk& chunk) {
+        return chunk.kind == kPngChunkText && !IsXmpChunk(chunk);
+    });
+}
+
+}  // namespace zm

@@ -1,0 +1,338 @@
+#include <gtest/gtest.h>
+
+#include <array>
+#include <string>
+#include <vector>
+
+#include "engine/bitmap/zmxBitmaps.h"
+#include "engine/foundation/zmsettings.h"
+#include "engine/foundation/zmstreams.h"
+#include "engine/io/zalmoio.h"
+#include "engine/io/zmfileformats.h"
+#include "tests/support/testfiles.h"
+#include "tests/support/testimages.h"
+
+// Headers without images, images in a row, images from modules and as text, and what the driver
+// does around a codec.
+namespace zm {
+namespace {
+
+using TBytes = std::vector<std::uint8_t>;
+
+constexpr std::int32_t kManyType = 9001;
+
+/// A file of three images: the pixel tells which one was asked for.
+void ReadOneOfThree(TStream&, TZmBitmap& bitmap, TIOParams& params, TProgressRec& progress,
+                    bool preview) {
+    params.SetImageCount(3);
+    params.fWidth = params.fHeight = 1;
+    if (preview) {
+        return;
+    }
+    *progress.Aborting = !bitmap.Allocate(1, 1, zm8g);
+    bitmap.SetPixels_zm8(0, 0, static_cast<std::uint8_t>(params.GetImageIndex()));
+}
+
+class DriverSources : public ::testing::Test {
+protected:
+    void SetUp() override {
+        image_ = test::MakeGradient(zm24RGB, 12, 9);
+        io_ = TZalmoIO::CreateFromBitmap(image_.get());
+        io_->SetOnFinishWork([this](void*) { ++finish_count_; });
+    }
+    void TearDown() override { DestroySingletonInstance(); }
+
+    TBytes SavedAs(std::int32_t type) {
+        TMemoryStream stream;
+        EXPECT_TRUE(io_->SaveToStream(stream, type));
+        return stream.Bytes();
+    }
+
+    test::TempFolder folder_;
+    std::unique_ptr<TZmBitmap> image_;
+    std::unique_ptr<TZalmoIO> io_;
+    int finish_count_ = 0;
+};
+
+TEST_F(DriverSources, ParametersComeWithoutTheImage) {
+    io_->GetParams()->SetDpiX(123);
+    io_->GetParams()->SetDpiY(124);
+    for (const std::int32_t type : {ioBMP, ioPNG, ioJPEG, ioWBMP}) {
+        const TBytes bytes = SavedAs(type);
+        const auto size = static_cast<std::int64_t>(bytes.size());
+        TZmBitmap bitmap(3, 2, zm8g);
+        const auto reader = TZalmoIO::CreateFromBitmap(&bitmap);
+        EXPECT_TRUE(reader->ParamsFromBuffer(bytes.data(), size, type)) << type;
+        EXPECT_EQ(12, reader->GetParams()->fWidth) << type;
+        EXPECT_EQ(9, reader->GetParams()->fHeight) << type;
+        EXPECT_EQ(type, reader->GetParams()->fFileType);
+        EXPECT_EQ(type == ioWBMP ? 300 : 123, reader->GetParams()->GetDpiX()) << type;
+        EXPECT_EQ(3, bitmap.GetWidth());
+        EXPECT_FALSE(reader->ParamsFromBuffer(bytes.data(), 3, type)) << type;
+        EXPECT_EQ(0, reader->GetParams()->fFileType);
+        EXPECT_TRUE(reader->GetAborting());
+
+        const std::u16string name = folder_.Name("a.bin");
+        test::WriteFileBytes(folder_.File("a.bin"), bytes);
+        TIOParams params;
+        EXPECT_TRUE(params.Read(name, std::int32_t{type})) << type;
+        EXPECT_EQ(name, params.fFileName);
+        EXPECT_EQ(type != ioWBMP, params.Read(name, /*use_extension=*/true)) << type;
+        TBorrowedMemoryStream stream(bytes.data(), size);
+        EXPECT_EQ(type != ioWBMP, params.Read(stream, 0)) << type;
+        EXPECT_EQ(type == ioWBMP ? 0 : 12, params.fWidth * (params.fFileType != 0)) << type;
+        EXPECT_TRUE(params.Read(bytes.data(), size, type));
+    }
+}
+
+TEST_F(DriverSources, ParametersOfWhatIsNoImage) {
+    const TBytes text{'t', 'e', 'x', 't'};
+    TBorrowedMemoryStream stream(text.data(), 4);
+    io_->GetParams()->fFileType = ioPNG;
+    EXPECT_FALSE(io_->ParamsFromStream(stream, 0));
+    EXPECT_EQ(0, io_->GetParams()->fFileType);
+    EXPECT_EQ(1, finish_count_);
+    EXPECT_FALSE(io_->ParamsFromStreamFormat(stream, 0));
+    EXPECT_FALSE(io_->ParamsFromFileFormat(folder_.Name("a"), 0));
+    EXPECT_FALSE(io_->ParamsFromStream(stream, ioHEIF));
+    EXPECT_FALSE(io_->ParamsFromBuffer(nullptr, 4, ioPNG));
+    EXPECT_EQ(1, finish_count_);
+    EXPECT_THROW(io_->ParamsFromFile(folder_.Name("none"), std::int32_t{ioPNG}), EFOpenError);
+    EXPECT_TRUE(io_->GetAborting());
+}
+
+TEST_F(DriverSources, SeekStaysWithinTheImages) {
+    auto row = std::make_shared<TZmFileFormatInfo>();
+    row->FileType = kManyType;
+    row->Extensions = "MANY";
+    row->ReadFunction = ReadOneOfThree;
+    RegisterFileFormat(row);
+    test::WriteFileBytes(folder_.File("a.many"), {1});
+    struct TStep {
+        TZmIOSeekDestination destination;
+        std::int32_t expected;
+    };
+    for (const TStep& step :
+         {TStep{zmioSeekPrior, 0}, TStep{zmioSeekNext, 1}, TStep{zmioSeekNext, 2},
+          TStep{zmioSeekNext, 2}, TStep{zmioSeekPrior, 1}, TStep{zmioSeekLast, 2},
+          TStep{zmioSeekFirst, 0}}) {
+        EXPECT_EQ(step.expected, io_->Seek(step.destination, folder_.Name("a.many")));
+        EXPECT_EQ(step.expected, image_->GetPixels_zm8(0, 0));
+    }
+    TMemoryStream stream(TBytes{1, 2, 3});
+    stream.SetPosition(1);
+    EXPECT_EQ(2, io_->Seek(zmioSeekLast, stream, kManyType));
+    EXPECT_EQ(2, io_->GetParams()->fGIF_ImageIndex);
+    EXPECT_EQ(-1, io_->Seek(zmioSeekLast, stream, ioPNG));
+}
+
+TEST_F(DriverSources, StreamHeadersLetImagesFollowOneAnother) {
+    io_->SetStreamHeaders(true);
+    TMemoryStream stream;
+    stream.WriteBuffer("head", 4);
+    ASSERT_TRUE(io_->SaveToStreamJpeg(stream));
+    const std::int64_t second = stream.GetPosition();
+    ASSERT_TRUE(image_->Crop(0, 0, 4, 3, kCropNoFill));
+    ASSERT_TRUE(io_->SaveToStreamJpeg(stream));
+    const std::int64_t end = stream.GetPosition();
+
+    const auto length = static_cast<std::uint8_t>((second - 16) & 0xFF);
+    const auto high = static_cast<std::uint8_t>((second - 16) >> 8);
+    const TBytes header{'J', 'F', 'I', 'F', 0, 0, 0, 0, length, high, 0, 0, 0xFF, 0xD8};
+    EXPECT_EQ(header, TBytes(stream.Bytes().begin() + 4, stream.Bytes().begin() + 18));
+
+    stream.SetPosition(4);
+    TZalmoIO reader;
+    reader.SetStreamHeaders(true);
+    ASSERT_TRUE(reader.LoadFromStream(stream, 0));
+    EXPECT_EQ(12, reader.GetZmBitmap()->GetWidth());
+    EXPECT_EQ(second, stream.GetPosition());
+    ASSERT_TRUE(reader.LoadFromStreamJpeg(stream));
+    EXPECT_EQ(5, reader.GetZmBitmap()->GetWidth());
+    EXPECT_EQ(end, stream.GetPosition());
+
+    stream.SetPosition(16);  // plain data are taken as they are
+    EXPECT_TRUE(reader.LoadFromStreamJpeg(stream));
+    EXPECT_EQ(12, reader.GetZmBitmap()->GetWidth());
+
+    // An aborted save leaves no header.
+    TMemoryStream aborted;
+    io_->SetOnProgress([this](void*, std::int32_t) { io_->SetAborting(true); });
+    EXPECT_FALSE(io_->SaveToStreamJpeg(aborted));
+    EXPECT_EQ(TBytes(12), TBytes(aborted.Bytes().begin(), aborted.Bytes().begin() + 12));
+    io_->SetOnProgress({});
+    // Files have none.
+    ASSERT_TRUE(io_->SaveToFileJpeg(folder_.Name("a.jpg")));
+    EXPECT_EQ(0xFF, test::ReadFileBytes(folder_.File("a.jpg"))[0]);
+}
+
+TEST_F(DriverSources, UnequalResolutionsAreMadeEqual) {
+    struct TRow {
+        std::int32_t width, height, dpi_x, dpi_y;
+        std::int32_t new_width, new_height, new_dpi;
+    };
+    for (const TRow& row :
+         {TRow{100, 50, 200, 100, 100, 100, 200}, TRow{50, 100, 100, 300, 150, 100, 300},
+          TRow{9, 9, 300, 100, 3, 9, 100},  // equal sides: the width follows
+          TRow{7, 5, 150, 100, 7, 7, 150}}) {
+        for (const bool is_filtered : {false, true}) {
+            const auto image = test::MakeGradient(zm24RGB, row.width, row.height);
+            test::AddNoiseAlpha(*image, 7);
+            const auto writer = TZalmoIO::CreateFromBitmap(image.get());
+            writer->GetParams()->SetDpiX(row.dpi_x);
+            writer->GetParams()->SetDpiY(row.dpi_y);
+            TMemoryStream stream;
+            ASSERT_TRUE(writer->SaveToStreamPNG(stream));
+            stream.SetPosition(0);
+            TZalmoIO reader;
+            reader.SetAutoAdjustDPI(true);
+            reader.SetFilteredAdjustDPI(is_filtered);
+            ASSERT_TRUE(reader.LoadFromStreamPNG(stream));
+            TZmBitmap& loaded = *reader.GetZmBitmap();
+            EXPECT_EQ(row.new_width, loaded.GetWidth());
+            EXPECT_EQ(row.new_height, loaded.GetHeight());
+            EXPECT_EQ(row.new_width, reader.GetParams()->fWidth);
+            EXPECT_EQ(row.new_height, reader.GetParams()->fHeight);
+            EXPECT_EQ(row.new_dpi, reader.GetParams()->GetDpiX());
+            EXPECT_EQ(row.new_dpi, reader.GetParams()->GetDpiY());
+            ASSERT_TRUE(loaded.HasAlphaChannel());
+            EXPECT_EQ(row.new_width, loaded.GetAlphaChannel()->GetWidth());
+            EXPECT_EQ(image->GetAlpha(0, 0), loaded.GetAlpha(0, 0));
+            if (!is_filtered) {
+                EXPECT_EQ(image->GetPixels_zm24RGB(0, 0), loaded.GetPixels_zm24RGB(0, 0));
+            }
+        }
+    }
+}
+
+TEST_F(DriverSources, ResolutionsAloneDoNotAskForMemory) {
+    TMemoryStream stream;
+    io_->GetParams()->SetDpiX(65535);
+    io_->GetParams()->SetDpiY(1);
+    image_->Allocate(65000, 2, zm24RGB);
+    image_->Fill(TRGBA{});
+    ASSERT_TRUE(io_->SaveToStreamPNG(stream));
+    stream.SetPosition(0);
+    ZmGlobalSettings().fDefaultDPIY = 2;
+    TZalmoIO reader;
+    reader.SetAutoAdjustDPI(true);
+    ASSERT_TRUE(reader.LoadFromStreamPNG(stream));
+    EXPECT_EQ(2, reader.GetZmBitmap()->GetHeight());
+}
+
+TEST_F(DriverSources, TextForms) {
+    TMemoryStream hex;
+    ASSERT_TRUE(io_->SaveToText(hex, ioWBMP, zmtfHex));
+    EXPECT_EQ("00000c09", std::string(hex.Bytes().begin(), hex.Bytes().begin() + 8));
+    TMemoryStream base64;
+    ASSERT_TRUE(image_->Crop(0, 0, 0, 0, kCropNoFill));
+    image_->Fill(TRGBA{255, 255, 255, 255});
+    ASSERT_TRUE(io_->SaveToText(base64, ioWBMP, zmtfBase64));  // bytes 00 00 01 01 80
+    EXPECT_EQ("AAABAYA=", std::string(base64.Bytes().begin(), base64.Bytes().end()));
+    ASSERT_TRUE(io_->SaveToText(folder_.Name("a.txt"), ioWBMP, zmtfBase64));
+    EXPECT_EQ(8u, test::ReadFileBytes(folder_.File("a.txt")).size());
+    EXPECT_THROW(io_->SaveToText(hex, ioWBMP, static_cast<TZmTextFormat>(9)), EZmException);
+}
+
+TEST_F(DriverSources, WhatNeedsAViewOrAScreenFails) {
+    io_->SetAborting(false);
+    EXPECT_FALSE(io_->CaptureFromScreen());
+    EXPECT_TRUE(io_->GetAborting());
+    EXPECT_FALSE(io_->OpenAVIFile(u"a.avi"));
+    EXPECT_FALSE(io_->LoadFromFile(u"a.avi", /*check_unknown=*/false));
+    EXPECT_EQ(-1, io_->InsertToFileTIFF(u"a.tif"));
+    EXPECT_FALSE(io_->LoadFromFilePDF(u"a.pdf"));
+    EXPECT_THROW(io_->SaveToFileZMN(u"a.zmn"), EZmException);
+}
+
+TEST_F(DriverSources, PluginsStandInForSvgAndPdf) {
+    auto row = std::make_shared<TZmFileFormatInfo>();
+    row->FileType = kPluginSvgReaderType;
+    row->ReadFunction = ReadOneOfThree;
+    RegisterFileFormat(row);
+    auto pdf = std::make_shared<TZmFileFormatInfo>(*row);
+    pdf->FileType = kPluginPdfWriteType;
+    RegisterFileFormat(pdf);
+    test::WriteFileBytes(folder_.File("a.svg"), {1});
+    EXPECT_TRUE(io_->LoadFromFile(folder_.Name("a.svg"), std::int32_t{ioSVG}));
+    EXPECT_EQ(kPluginSvgReaderType, io_->GetParams()->fFileType);
+    io_->GetParams()->fDict.Insert(u"PDF:Password", u"secret");
+    EXPECT_TRUE(io_->LoadFromFilePDF(folder_.Name("a.svg")));
+    EXPECT_EQ(u"secret", io_->GetParams()->fDict.GetString(u"PDF:Password"));
+}
+
+TEST_F(DriverSources, NoticesOfALoadComeInOrder) {
+    std::string order;
+    const TBytes bytes = SavedAs(ioBMP);
+    image_->SetOnChanged([&](void*) { order += "changed "; });
+    io_->SetOnImageLoaded([&](void*) { order += "loaded "; });
+    io_->SetOnFinishWork([&](void*) { order += "finished "; });
+    EXPECT_TRUE(io_->LoadFromBuffer(bytes.data(), static_cast<std::int64_t>(bytes.size()), 0));
+    EXPECT_TRUE(order.ends_with("changed loaded finished ")) << order;
+    order.clear();
+    EXPECT_FALSE(io_->LoadFromBuffer(bytes.data(), 60, ioBMP));
+    EXPECT_TRUE(order.ends_with("loaded finished ")) << order;
+}
+
+// A module of the smallest kind: one section with one resource, type "PICS", name "SEA".
+TBytes ModuleWith(const TBytes& data) {
+    TBytes file(0x400, 0);
+    const auto put = [&file](std::size_t at, std::uint32_t value, int bytes) {
+        for (int i = 0; i < bytes; ++i) {
+            file[at + static_cast<std::size_t>(i)] = static_cast<std::uint8_t>(value >> (8 * i));
+        }
+    };
+    put(0, 0x5A4D, 2);
+    put(0x3C, 0x40, 4);  // offset of the PE header
+    put(0x40, 0x4550, 4);
+    put(0x44, 0x14C, 2);  // i386
+    put(0x46, 1, 2);      // sections
+    put(0x54, 0xE0, 2);   // size of the optional header
+    put(0x56, 0x2102, 2);
+    put(0x58, 0x10B, 2);             // PE32
+    put(0x58 + 92, 16, 4);           // data directories
+    put(0x58 + 96 + 16, 0x1000, 4);  // the resources' address and size
+    put(0x58 + 96 + 20, 0x200, 4);
+    const std::size_t section = 0x58 + 0xE0;
+    std::copy_n(".rsrc", 5, file.begin() + static_cast<std::ptrdiff_t>(section));
+    put(section + 8, 0x1000, 4);   // virtual size
+    put(section + 12, 0x1000, 4);  // address
+    put(section + 16, 0x1000, 4);  // size in the file
+    put(section + 20, 0x200, 4);   // place in the file
+    const std::size_t root = 0x200;
+    put(root + 12, 1, 2);  // one named entry
+    put(root + 16, 0x80000060, 4);
+    put(root + 20, 0x80000018, 4);
+    put(root + 0x18 + 12, 1, 2);
+    put(root + 0x18 + 16, 0x80000070, 4);
+    put(root + 0x18 + 20, 0x80000030, 4);
+    put(root + 0x30 + 14, 1, 2);  // one numbered entry: the language
+    put(root + 0x30 + 16, 0x409, 4);
+    put(root + 0x30 + 20, 0x48, 4);
+    put(root + 0x48, 0x1100, 4);  // the data's address
+    put(root + 0x4C, static_cast<std::uint32_t>(data.size()), 4);
+    put(root + 0x60, 4, 2);
+    put(root + 0x70, 3, 2);
+    for (std::size_t i = 0; i < 4; ++i) {
+        put(root + 0x62 + 2 * i, static_cast<std::uint32_t>("PICS"[i]), 2);
+        put(root + 0x72 + 2 * i, static_cast<std::uint32_t>("SEA"[i]), 2);
+    }
+    file.resize(0x300);
+    file.insert(file.end(), data.begin(), data.end());
+    file.resize(0x1200, 0);
+    return file;
+}
+
+TEST_F(DriverSources, ResourcesOfModules) {
+    test::WriteFileBytes(folder_.File("pics.dll"), ModuleWith(SavedAs(ioPNG)));
+    TZalmoIO reader;
+    EXPECT_TRUE(reader.LoadFromResource(folder_.Name("pics.dll"), u"pics", u"sea", 0));
+    test::ExpectSamePixels(*image_, *reader.GetZmBitmap());
+    EXPECT_FALSE(reader.GetParams()->fIsResource);
+    EXPECT_FALSE(reader.LoadFromResource(folder_.Name("pics.dll"), u"pics", u"lake", 0));
+    EXPECT_FALSE(reader.LoadFromResource(folder_.Name("none.dll"), u"pics", u"sea", 0));
+    EXPECT_TRUE(reader.GetAborting());
+}
+
+}  // namespace
+}  // namespace zm
