@@ -1,6 +1,6 @@
 #include <gtest/gtest.h>
 
-#include <atomic>
+#include <algorithm>
 #include <cstdlib>
 #include <new>
 #include <vector>
@@ -19,15 +19,19 @@ namespace {
 
 thread_local std::int64_t t_allocations_left = -1;  // negative: no failure
 
-void* AllocateOrFail(std::size_t size) {
+void* AllocateOrNil(std::size_t size) noexcept {
     if (t_allocations_left == 0) {
         t_allocations_left = -1;
-        throw std::bad_alloc();
+        return nullptr;
     }
     if (t_allocations_left > 0) {
         --t_allocations_left;
     }
-    void* const block = std::malloc(size > 0 ? size : 1);
+    return std::malloc(size > 0 ? size : 1);
+}
+
+void* AllocateOrFail(std::size_t size) {
+    void* const block = AllocateOrNil(size);
     if (block == nullptr) {
         throw std::bad_alloc();
     }
@@ -41,6 +45,12 @@ void* operator new(std::size_t size) {
 }
 void* operator new[](std::size_t size) {
     return AllocateOrFail(size);
+}
+void* operator new(std::size_t size, const std::nothrow_t&) noexcept {
+    return AllocateOrNil(size);
+}
+void* operator new[](std::size_t size, const std::nothrow_t&) noexcept {
+    return AllocateOrNil(size);
 }
 void operator delete(void* block) noexcept {
     std::free(block);
