@@ -123,14 +123,9 @@ bool TQVImageList::Rotate(const IStepParams& params) {
             bitmap->Rotate(-static_cast<double>(angle), zmrBilinear, kWhite);
             return true;
         }
-        case kActionFlipHorizontally:
-            bitmap->Flip(fdHorizontal);
-            return true;
-        case kActionFlipVertically:
-            bitmap->Flip(fdVertical);
-            return true;
-        default:
-            return false;
+        case kActionFlipHorizontally: bitmap->Flip(fdHorizontal); return true;
+        case kActionFlipVertically: bitmap->Flip(fdVertical); return true;
+        default: return false;
     }
 }
 

@@ -235,8 +235,8 @@ double ProgramSeconds(const std::string& command) {
     double best = std::numeric_limits<double>::max();
     for (int run = 0; run < 3; ++run) {
         bool is_run = false;
-        const double seconds = SecondsOf(
-            [&] { is_run = std::system((command + " >/dev/null 2>&1").c_str()) == 0; });
+        const double seconds =
+            SecondsOf([&] { is_run = std::system((command + " >/dev/null 2>&1").c_str()) == 0; });
         if (!is_run) {
             return 0;
         }
@@ -299,18 +299,20 @@ void BM_JpegDecode(benchmark::State& state) {
 
 void BM_JpegEncode(benchmark::State& state) {
     const TScratchFile scratch("zmbench.ppm", "P6 4000 3000 255\n", PictureRgb());
-    Compare(state, EncodeJpeg, [] { Save(ioJPEG); },
-            "cjpeg -quality 80 -dct int " + scratch.Name());
+    Compare(
+        state, EncodeJpeg, [] { Save(ioJPEG); }, "cjpeg -quality 80 -dct int " + scratch.Name());
 }
 
 void BM_PngDecode(benchmark::State& state) {
     const TBytes& file = PngFile();
-    Compare(state, [&file] { DecodePng(file); }, [&file] { Load(file, ioPNG); }, {});
+    Compare(
+        state, [&file] { DecodePng(file); }, [&file] { Load(file, ioPNG); }, {});
 }
 
 void BM_PngAlphaDecode(benchmark::State& state) {
     const TBytes& file = PngAlphaFile();
-    Compare(state, [&file] { DecodePng(file); }, [&file] { Load(file, ioPNG); }, {});
+    Compare(
+        state, [&file] { DecodePng(file); }, [&file] { Load(file, ioPNG); }, {});
 }
 
 void BM_PngEncode(benchmark::State& state) {

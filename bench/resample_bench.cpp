@@ -31,8 +31,8 @@ std::unique_ptr<TZmBitmap> MakePicture(std::int32_t width, std::int32_t height) 
         std::uint8_t* row = bitmap->GetScanLine(y);
         for (std::int32_t i = 0; i < width * 3; ++i) {
             noise = noise * 1664525u + 1013904223u;
-            row[i] = static_cast<std::uint8_t>((i * 255 / (width * 3) + y / 8 + (noise >> 28)) &
-                                               255);
+            row[i] =
+                static_cast<std::uint8_t>((i * 255 / (width * 3) + y / 8 + (noise >> 28)) & 255);
         }
     }
     return bitmap;
@@ -50,8 +50,7 @@ void BM_MemcpyLarge(benchmark::State& state) {
 }
 BENCHMARK(BM_MemcpyLarge)->Unit(benchmark::kMillisecond);
 
-void Resample(benchmark::State& state, TZmImageSize from, TZmImageSize to,
-              TResampleFilter filter) {
+void Resample(benchmark::State& state, TZmImageSize from, TZmImageSize to, TResampleFilter filter) {
     const auto source = MakePicture(from.width, from.height);
     TZmBitmap target(to.width, to.height, zm24RGB);
     for (auto _ : state) {
@@ -83,10 +82,8 @@ BENCHMARK_CAPTURE(Resample, BicubicEnlarge, kSmall, kLarge, rfBicubic)
     ->Unit(benchmark::kMillisecond);
 BENCHMARK_CAPTURE(Resample, BicubicEnlargeUneven, kSmall, kUnevenLarge, rfBicubic)
     ->Unit(benchmark::kMillisecond);
-BENCHMARK_CAPTURE(Resample, NearestShrink, kLarge, kSmall, rfNone)
-    ->Unit(benchmark::kMillisecond);
-BENCHMARK_CAPTURE(Resample, NearestEnlarge, kSmall, kLarge, rfNone)
-    ->Unit(benchmark::kMillisecond);
+BENCHMARK_CAPTURE(Resample, NearestShrink, kLarge, kSmall, rfNone)->Unit(benchmark::kMillisecond);
+BENCHMARK_CAPTURE(Resample, NearestEnlarge, kSmall, kLarge, rfNone)->Unit(benchmark::kMillisecond);
 BENCHMARK_CAPTURE(Resample, FastLinearShrink, kLarge, kSmall, rfFastLinear)
     ->Unit(benchmark::kMillisecond);
 BENCHMARK_CAPTURE(Resample, FastLinearEnlarge, kSmall, kLarge, rfFastLinear)
@@ -130,7 +127,11 @@ void BM_Lanczos3Threads(benchmark::State& state) {
     }
     ZmGlobalSettings().fImageProcMaxThreads = old_count;
 }
-BENCHMARK(BM_Lanczos3Threads)->ArgName("threads")->Arg(1)->Arg(2)->MeasureProcessCPUTime()
+BENCHMARK(BM_Lanczos3Threads)
+    ->ArgName("threads")
+    ->Arg(1)
+    ->Arg(2)
+    ->MeasureProcessCPUTime()
     ->Unit(benchmark::kMillisecond);
 
 /// The plain forms, for the gain of the fast ones.
@@ -173,8 +174,8 @@ BENCHMARK(BM_Lanczos3Plain)->Unit(benchmark::kMillisecond);
 
 void BM_BilinearPlain(benchmark::State& state) {
     const bool shrink = state.range(0) != 0;
-    const auto source = shrink ? MakePicture(kLargeWidth, kLargeHeight)
-                               : MakePicture(kSmallWidth, kSmallHeight);
+    const auto source =
+        shrink ? MakePicture(kLargeWidth, kLargeHeight) : MakePicture(kSmallWidth, kSmallHeight);
     const TZmImageSize to = shrink ? kSmall : kLarge;
     TZmBitmap target(to.width, to.height, zm24RGB);
     for (auto _ : state) {

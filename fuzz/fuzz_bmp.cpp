@@ -74,13 +74,13 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size
     if (!has_limits || size > kMaxInputBytes) {
         return 0;
     }
-    Load(data, size, {.native = false, .ignore_alpha = false, .no_file_header = false,
-                      .params_only = false});
-    Load(data, size, {.native = true, .ignore_alpha = true, .no_file_header = false,
-                      .params_only = false});
-    Load(data, size, {.native = false, .ignore_alpha = false, .no_file_header = true,
-                      .params_only = false});
-    Load(data, size, {.native = false, .ignore_alpha = false, .no_file_header = false,
-                      .params_only = true});
+    Load(data, size,
+         {.native = false, .ignore_alpha = false, .no_file_header = false, .params_only = false});
+    Load(data, size,
+         {.native = true, .ignore_alpha = true, .no_file_header = false, .params_only = false});
+    Load(data, size,
+         {.native = false, .ignore_alpha = false, .no_file_header = true, .params_only = false});
+    Load(data, size,
+         {.native = false, .ignore_alpha = false, .no_file_header = false, .params_only = true});
     return 0;
 }

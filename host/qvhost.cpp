@@ -173,9 +173,7 @@ bool THostJob::RunStep(std::int32_t action_index, std::int32_t step_number,
     TLongBool result = kLongFalse;
     std::u16string exception_text;
     const bool returned = platform::CallCatchingHostExceptions(
-        [&] {
-            result = host_.plugin_info_->ActionsInfo->ExecAction(action_index, params.Get());
-        },
+        [&] { result = host_.plugin_info_->ActionsInfo->ExecAction(action_index, params.Get()); },
         exception_text);
     if (!returned) {
         SetError(0, exception_text);
@@ -194,9 +192,7 @@ void THostJob::Stop() {
         TCallParams params(step.text, task_id_, step.step_number);
         std::u16string ignored_text;  // a job's end has nobody left to tell
         static_cast<void>(platform::CallCatchingHostExceptions(
-            [&] {
-                host_.plugin_info_->ActionsInfo->JobStop(step.action_index, params.Get());
-            },
+            [&] { host_.plugin_info_->ActionsInfo->JobStop(step.action_index, params.Get()); },
             ignored_text));
     }
 }

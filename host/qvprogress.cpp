@@ -25,9 +25,8 @@ TProgressView::TProgressView(const TRunRequest& request, bool is_terminal, bool 
 void TProgressView::DrawBar() const {
     const std::size_t total = request_.files.size();
     const std::size_t filled = total == 0 ? kBarWidth : kBarWidth * ended_ / total;
-    platform::WriteStderr("\r[" + std::string(filled, '#') +
-                          std::string(kBarWidth - filled, '.') + "] " + std::to_string(ended_) +
-                          "/" + std::to_string(total));
+    platform::WriteStderr("\r[" + std::string(filled, '#') + std::string(kBarWidth - filled, '.') +
+                          "] " + std::to_string(ended_) + "/" + std::to_string(total));
 }
 
 void TProgressView::EraseBar() const {
@@ -36,10 +35,9 @@ void TProgressView::EraseBar() const {
 
 std::string TProgressView::FailureText(const TRunRequest& request, const TJobOutcome& outcome) {
     const TRunStep& step = request.steps[outcome.failed_step];
-    std::string text = FileLabel(request, outcome.index) + ": step " +
-                       std::to_string(outcome.failed_step + 1) + " (" +
-                       Utf8FromUtf16(step.action_name) + ", line " + std::to_string(step.line) +
-                       ") failed";
+    std::string text =
+        FileLabel(request, outcome.index) + ": step " + std::to_string(outcome.failed_step + 1) +
+        " (" + Utf8FromUtf16(step.action_name) + ", line " + std::to_string(step.line) + ") failed";
     if (outcome.code != 0) {
         text += ", code " + std::to_string(outcome.code);
     }

@@ -106,8 +106,7 @@ bool CollectFiles(const TOptions& options, std::vector<std::u16string>& files,
 }
 
 bool ParseSettings(const std::vector<std::string>& settings,
-                   std::map<std::u16string, std::u16string>& variables,
-                   std::string& error_text) {
+                   std::map<std::u16string, std::u16string>& variables, std::string& error_text) {
     for (const std::string& setting : settings) {
         const std::size_t equals = setting.find('=');
         if (equals == std::string::npos || equals == 0) {
@@ -156,8 +155,8 @@ int RunResolved(const TOptions& options, const THost& host, TRunRequest& request
         return UsageError("cannot make the output folder " + options.output);
     }
     TProgressView view(request, platform::StderrIsTerminal(), options.quiet);
-    const std::size_t failures = RunJobs(
-        host, request, [&view](const TJobOutcome& outcome) { view.JobEnded(outcome); });
+    const std::size_t failures =
+        RunJobs(host, request, [&view](const TJobOutcome& outcome) { view.JobEnded(outcome); });
     view.Finish(failures);
     return failures == 0 ? kExitDone : kExitStepFailed;
 }

@@ -95,8 +95,7 @@ std::size_t RunJobs(const THost& host, const TRunRequest& request, const TJobEnd
     return failures;
 }
 
-std::vector<std::u16string> DescribeSteps(const THost& host,
-                                          const std::vector<TRunStep>& steps) {
+std::vector<std::u16string> DescribeSteps(const THost& host, const std::vector<TRunStep>& steps) {
     std::vector<std::u16string> lines;
     for (const TRunStep& step : steps) {
         lines.push_back(IntegerToText(static_cast<std::int64_t>(lines.size()) + 1) + u". " +

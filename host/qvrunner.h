@@ -16,8 +16,8 @@ namespace zm::qvrun {
 struct TRunStep {
     std::int32_t action_index = 0;
     std::u16string action_name;
-    std::u16string text;      ///< key=value lines
-    std::int32_t line = 0;    ///< in the job file
+    std::u16string text;    ///< key=value lines
+    std::int32_t line = 0;  ///< in the job file
 };
 
 /// Finds the plug-in's action for each step, by name or by ActionID, without case. False with
@@ -30,18 +30,18 @@ struct TRunRequest {
     std::vector<std::u16string> files;  ///< one job each
     std::u16string output_folder;
     std::map<std::u16string, std::u16string> user_variables;
-    std::int32_t workers = 1;           ///< jobs at a time, at least 1
-    bool report_steps = false;          ///< collect the description of each step as it runs
+    std::int32_t workers = 1;   ///< jobs at a time, at least 1
+    bool report_steps = false;  ///< collect the description of each step as it runs
 };
 
 /// What became of one job.
 struct TJobOutcome {
-    std::size_t index = 0;              ///< in TRunRequest::files
+    std::size_t index = 0;  ///< in TRunRequest::files
     bool succeeded = false;
-    std::size_t failed_step = 0;        ///< in TRunRequest::steps, when it did not
-    std::int32_t code = 0;              ///< the step's last error; 0 when it reported none
-    std::u16string text;                ///< its text, or why there is none
-    std::vector<std::u16string> log;    ///< lines that the plug-in wrote to the host's log
+    std::size_t failed_step = 0;      ///< in TRunRequest::steps, when it did not
+    std::int32_t code = 0;            ///< the step's last error; 0 when it reported none
+    std::u16string text;              ///< its text, or why there is none
+    std::vector<std::u16string> log;  ///< lines that the plug-in wrote to the host's log
     std::vector<std::u16string> step_descriptions;
 };
 

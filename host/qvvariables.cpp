@@ -40,17 +40,25 @@ std::optional<std::u16string> VariableValue(std::u16string_view name,
         found != variables.user.end()) {
         return found->second;
     }
-    if (name == u"file") return variables.file;
-    if (name == u"dir") return FolderValue(variables.file);
-    if (name == u"name") return NameValue(variables.file);
-    if (name == u"ext") return ExtensionValue(variables.file);
-    if (name == u"out") return variables.out;
-    if (name == u"index") return IntegerToText(variables.index);
-    if (name == u"date") return variables.date;
-    if (name == u"time") return variables.time;
+    if (name == u"file")
+        return variables.file;
+    if (name == u"dir")
+        return FolderValue(variables.file);
+    if (name == u"name")
+        return NameValue(variables.file);
+    if (name == u"ext")
+        return ExtensionValue(variables.file);
+    if (name == u"out")
+        return variables.out;
+    if (name == u"index")
+        return IntegerToText(variables.index);
+    if (name == u"date")
+        return variables.date;
+    if (name == u"time")
+        return variables.time;
     if (name.starts_with(kEnvironmentPrefix)) {
-        const auto value = platform::EnvironmentVariable(
-            Utf8FromUtf16(name.substr(kEnvironmentPrefix.size())));
+        const auto value =
+            platform::EnvironmentVariable(Utf8FromUtf16(name.substr(kEnvironmentPrefix.size())));
         return Utf16FromUtf8(value.value_or(""));
     }
     return std::nullopt;
@@ -66,8 +74,7 @@ std::u16string Digits(std::int32_t number, std::size_t width) {
 
 void SetVariablesClock(TJobVariables& variables) {
     const platform::TLocalTime now = platform::LocalNow();
-    variables.date =
-        Digits(now.year, 4) + u"-" + Digits(now.month, 2) + u"-" + Digits(now.day, 2);
+    variables.date = Digits(now.year, 4) + u"-" + Digits(now.month, 2) + u"-" + Digits(now.day, 2);
     variables.time =
         Digits(now.hour, 2) + u"-" + Digits(now.minute, 2) + u"-" + Digits(now.second, 2);
 }
@@ -77,8 +84,7 @@ std::u16string ExpandJobText(std::u16string_view text, const TJobVariables& vari
     std::size_t position = 0;
     while (position < text.size()) {
         const std::size_t open = text.find(u'{', position);
-        const std::size_t close =
-            open == std::u16string_view::npos ? open : text.find(u'}', open);
+        const std::size_t close = open == std::u16string_view::npos ? open : text.find(u'}', open);
         if (close == std::u16string_view::npos) {
             break;
         }

@@ -10,11 +10,11 @@ namespace zm::qvrun {
 
 /// What the variables of one job stand for.
 struct TJobVariables {
-    std::u16string file;    ///< {file}; {dir}, {name} and {ext} are its parts
-    std::u16string out;     ///< {out}: the output folder, without a trailing separator
-    std::int32_t index = 1; ///< {index}: number of the job, from 1
-    std::u16string date;    ///< {date}: year-month-day at the start of the job, 2026-11-21
-    std::u16string time;    ///< {time}: hour-minute-second, 14-05-09, fit for file names
+    std::u16string file;     ///< {file}; {dir}, {name} and {ext} are its parts
+    std::u16string out;      ///< {out}: the output folder, without a trailing separator
+    std::int32_t index = 1;  ///< {index}: number of the job, from 1
+    std::u16string date;     ///< {date}: year-month-day at the start of the job, 2026-11-21
+    std::u16string time;     ///< {time}: hour-minute-second, 14-05-09, fit for file names
     std::map<std::u16string, std::u16string> user;  ///< --set; they win over all others
 };
 

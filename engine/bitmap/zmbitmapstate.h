@@ -8,19 +8,28 @@
 #include <vector>
 
 #include "engine/bitmap/zmbasebitmap.h"
+#include "engine/bitmap/zmfont.h"
 #include "engine/bitmap/zmplatformbitmap.h"
 #include "engine/foundation/zmdefs.h"
 #include "engine/foundation/zmutils_filebuffer.h"
 
 namespace zm {
 
+class TCanvas;
 class TIOParams;
 class TZmBitmap;
+class TZmCanvas;
 class TZmMask;
 
-/// Deleter of an object whose class lives on a higher floor; defined there.
+/// Deleters of objects whose classes live on higher floors; defined there.
 struct TIOParamsDeleter {
     void operator()(TIOParams* params) const;
+};
+struct TCanvasDeleter {
+    void operator()(TCanvas* canvas) const;
+};
+struct TZmCanvasDeleter {
+    void operator()(TZmCanvas* canvas) const;
 };
 
 /// Supplies the rows of a virtual bitmap.
@@ -85,6 +94,13 @@ protected:
     TZmMemoryAllocator fMemoryAllocator = zmmaAuto;
     bool fFullReallocate = true;
     std::int32_t fCanvasCurrentAlpha = -1;
+    TFont fCanvasFont;  // the canvases borrow it
+    std::unique_ptr<TCanvas, TCanvasDeleter> fCanvas;
+    std::unique_ptr<TZmCanvas, TZmCanvasDeleter> fZmCanvas;  // draws on fCanvas
+    TZmBitmap* fROIOriginalBitmap = nullptr;
+    TRect fROIOriginalRect{};
+    TZmCanvas* fROICanvas = nullptr;
+    bool fROIAlphaCompositing = false;
     TZmNotifyEvent fOnChanged;
     TZmBitmapProgressEvent fOnProgress;
     bool fModified = false;

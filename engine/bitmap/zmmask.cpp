@@ -62,8 +62,7 @@ void TZmMask::ResetRect() {
     fY2 = 0;
 }
 
-bool TZmMask::AllocateBits(std::int32_t width, std::int32_t height,
-                           std::int32_t bits_per_pixel) {
+bool TZmMask::AllocateBits(std::int32_t width, std::int32_t height, std::int32_t bits_per_pixel) {
     FreeBits();
     if (width < 1 || height < 1 || (bits_per_pixel != 1 && bits_per_pixel != 8)) {
         return false;

@@ -13,7 +13,7 @@ class TZmBitmap;
 
 /// Where and how the outline of a mask is shown on a canvas.
 struct TZmMaskView {
-    std::int32_t left = 0;   ///< canvas position of the mask's corner
+    std::int32_t left = 0;  ///< canvas position of the mask's corner
     std::int32_t top = 0;
     double zoom = 1.0;       ///< canvas pixels a mask pixel
     std::int32_t phase = 0;  ///< shift of the dashes in pixels; a timer that counts it animates
@@ -93,8 +93,7 @@ public:
     void CopyZmBitmap(TZmBitmap* dest, TZmBitmap* source, std::int32_t left, std::int32_t top);
     /// The same between the alpha planes; `dest` gets one when needed. A source without a plane
     /// leaves everything.
-    void CopyZmBitmapAlpha(TZmBitmap* dest, TZmBitmap* source, std::int32_t left,
-                           std::int32_t top);
+    void CopyZmBitmapAlpha(TZmBitmap* dest, TZmBitmap* source, std::int32_t left, std::int32_t top);
     /// The same between platform bitmaps.
     void CopyBitmap(TBitmap* dest, TBitmap* source, std::int32_t left, std::int32_t top);
     /// Lowers the mask to the values of a plane of 8 bits a pixel (zm8g, zm8p; others do nothing)

@@ -78,23 +78,15 @@ using TMixRow = void (*)(const std::uint8_t* source, std::uint8_t* dest,
 /// Nil for formats whose pixels are no channels that can be mixed.
 TMixRow FindMixRow(TZmPixelFormat format) {
     switch (format) {
-        case zm8g:
-            return MixRow<std::uint8_t, 1>;
-        case zm16g:
-            return MixRow<std::uint16_t, 1>;
-        case zm24RGB:
-            return MixRow<std::uint8_t, 3>;
-        case zm32f:
-            return MixFloatRow;
+        case zm8g: return MixRow<std::uint8_t, 1>;
+        case zm16g: return MixRow<std::uint16_t, 1>;
+        case zm24RGB: return MixRow<std::uint8_t, 3>;
+        case zm32f: return MixFloatRow;
         case zmCMYK:
-        case zm32RGB:
-            return MixRow<std::uint8_t, 4>;
-        case zm48RGB:
-            return MixRow<std::uint16_t, 3>;
-        case zmCIELab:
-            return MixLabRow;
-        default:
-            return nullptr;
+        case zm32RGB: return MixRow<std::uint8_t, 4>;
+        case zm48RGB: return MixRow<std::uint16_t, 3>;
+        case zmCIELab: return MixLabRow;
+        default: return nullptr;
     }
 }
 
@@ -106,8 +98,8 @@ void TakeBits(const std::uint8_t* source, std::int32_t source_x, std::uint8_t* d
             const std::int32_t to = dest_x + i;
             const int bit = 0x80 >> (to & 7);
             const bool value = (source[x >> 3] >> (7 - (x & 7)) & 1) != 0;
-            dest[to >> 3] = static_cast<std::uint8_t>(value ? dest[to >> 3] | bit
-                                                            : dest[to >> 3] & ~bit);
+            dest[to >> 3] =
+                static_cast<std::uint8_t>(value ? dest[to >> 3] | bit : dest[to >> 3] & ~bit);
         }
     }
 }

@@ -30,8 +30,8 @@ public:
     TZoomedRows(TZmMask& mask, const TZmMaskView& view, std::int32_t width)
         : mask_(mask), view_(view), columns_(static_cast<std::size_t>(width) + 2) {
         for (std::size_t i = 0; i < columns_.size(); ++i) {
-            columns_[i] = MaskPlace(static_cast<std::int64_t>(i) - 1, view.left, view.zoom,
-                                    mask.GetWidth());
+            columns_[i] =
+                MaskPlace(static_cast<std::int64_t>(i) - 1, view.left, view.zoom, mask.GetWidth());
         }
     }
 
@@ -53,8 +53,8 @@ private:
 /// Calls `visit(x, y)` for the canvas pixels of one side of the outline, row by row. A pixel is
 /// of the outline when one of its four neighbours is of the other kind.
 template <typename Visit>
-void VisitOutline(TZmMask& mask, const TZmMaskView& view, std::int32_t width,
-                  std::int32_t height, TSide side, Visit&& visit) {
+void VisitOutline(TZmMask& mask, const TZmMaskView& view, std::int32_t width, std::int32_t height,
+                  TSide side, Visit&& visit) {
     const TZoomedRows rows(mask, view, width);
     std::vector<char> above;
     std::vector<char> row;
@@ -67,8 +67,8 @@ void VisitOutline(TZmMask& mask, const TZmMaskView& view, std::int32_t width,
         row.swap(below);
         rows.Load(std::int64_t{y} + 1, below);
         for (std::size_t i = 1; i + 1 < row.size(); ++i) {
-            if (row[i] == kind && (row[i - 1] != kind || row[i + 1] != kind ||
-                                   above[i] != kind || below[i] != kind)) {
+            if (row[i] == kind && (row[i - 1] != kind || row[i + 1] != kind || above[i] != kind ||
+                                   below[i] != kind)) {
                 visit(static_cast<std::int32_t>(i - 1), y);
             }
         }

@@ -292,8 +292,7 @@ std::unique_ptr<TZmMask> TZmMask::CreateResampledMask(std::int32_t NewWidth,
     }
     const std::vector<std::int32_t> columns = MakeNearestTable(NewWidth, fWidth);
     for (std::int32_t y = 0; y < NewHeight; ++y) {
-        const auto source_row =
-            static_cast<std::int32_t>(std::int64_t{y} * fHeight / NewHeight);
+        const auto source_row = static_cast<std::int32_t>(std::int64_t{y} * fHeight / NewHeight);
         const std::uint8_t* const from = GetScanLine(source_row);
         std::uint8_t* const to = mask->GetScanLine(y);
         if (from == nullptr) {

@@ -9,9 +9,9 @@
 namespace zm {
 
 struct TZmPixelFormatRow {
-    std::int32_t bit_count;      ///< bits per pixel
+    std::int32_t bit_count;  ///< bits per pixel
     std::int32_t channel_count;
-    const char* name;            ///< for messages and tests
+    const char* name;  ///< for messages and tests
 };
 
 /// Row of a format; ordinals above zm32RGB give the row of zmnull.

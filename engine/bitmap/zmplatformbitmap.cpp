@@ -13,16 +13,11 @@ constexpr std::int32_t kRowAlignmentBits = 32;
 
 std::int32_t BitsOf(TBitmapPixelFormat format) {
     switch (format) {
-        case pf1bit:
-            return 1;
-        case pf8bit:
-            return 8;
-        case pf24bit:
-            return 24;
-        case pf32bit:
-            return 32;
-        default:
-            return 0;
+        case pf1bit: return 1;
+        case pf8bit: return 8;
+        case pf24bit: return 24;
+        case pf32bit: return 32;
+        default: return 0;
     }
 }
 

@@ -16,8 +16,7 @@ enum TBitmapPixelFormat : std::uint8_t { pfNone, pf1bit, pf8bit, pf24bit, pf32bi
 class TBitmap {
 public:
     /// Changes layout and size; pixels become 0. False without room, and the size is then 0.
-    [[nodiscard]] bool SetSize(std::int32_t width, std::int32_t height,
-                               TBitmapPixelFormat format);
+    [[nodiscard]] bool SetSize(std::int32_t width, std::int32_t height, TBitmapPixelFormat format);
     std::int32_t GetWidth() const { return width_; }
     std::int32_t GetHeight() const { return height_; }
     TBitmapPixelFormat GetPixelFormat() const { return format_; }

@@ -22,7 +22,8 @@ class TZmBitmap;
 class TZmQuantizer {
 public:
     /// Fills `color_map` (resized to `color_count` entries, limited to 1 to 1024; entries not in
-    /// use are black; who writes a palette to a file asks for 256 at most). The bitmap is only read, and only here.
+    /// use are black; who writes a palette to a file asks for 256 at most). The bitmap is only
+    /// read, and only here.
     TZmQuantizer(TZmBitmap& source, std::vector<TRGB>& color_map, std::int32_t color_count);
     ~TZmQuantizer();
     TZmQuantizer(const TZmQuantizer&) = delete;

@@ -18,8 +18,8 @@ struct TZmRenderTransfer;
 /// edge on. An empty table counts as none.
 using TZmLookupTable = std::vector<std::int32_t>;
 
-/// What TZmBitmap can draw, in a class of its own for the length of the list: TZmBitmap is the one
-/// class that derives from it. `this` is the source of every drawing.
+/// What TZmBitmap can draw, in a class of its own for the length of the list: TZmBitmap alone
+/// derives from it, by way of TZmBitmapSurface. `this` is the source of every drawing.
 ///
 /// A rectangle of the source is drawn into a rectangle of a destination at any scale. Rectangles
 /// are given by position and size; they may lie anywhere, are clipped to both images, and draw

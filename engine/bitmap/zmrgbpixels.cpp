@@ -71,8 +71,8 @@ void LoadRGBPixels(const std::uint8_t* row, std::int32_t x, std::int32_t width,
     } else if (convert != nullptr && has_whole_bytes && has_palette) {
         TZmRowContext context = layout.context;
         context.palette = layout.palette;
-        convert(row + PixelOffset(x, layout.format), reinterpret_cast<std::uint8_t*>(pixels),
-                width, context);
+        convert(row + PixelOffset(x, layout.format), reinterpret_cast<std::uint8_t*>(pixels), width,
+                context);
     } else {
         for (std::int32_t i = 0; i < width; ++i) {
             pixels[i] = RowPixelToRGB(row, x + i, layout.format, layout.palette);

@@ -30,8 +30,7 @@ const TRGB* TZmRgbRows::GetRow(std::int32_t y) {
         return converted_.data();
     }
     for (std::int32_t x = 0; x < width_; ++x) {
-        converted_[static_cast<std::size_t>(x)] =
-            RowPixelToRGB(row, x, format_, context_.palette);
+        converted_[static_cast<std::size_t>(x)] = RowPixelToRGB(row, x, format_, context_.palette);
     }
     return converted_.data();
 }

@@ -118,8 +118,7 @@ std::array<double, 256> MakeLinearTable() {
     std::array<double, 256> table{};
     for (std::size_t i = 0; i < table.size(); ++i) {
         const double channel = static_cast<double>(i) / 255.0;
-        table[i] = channel > 0.04045 ? std::pow((channel + 0.055) / 1.055, 2.4)
-                                     : channel / 12.92;
+        table[i] = channel > 0.04045 ? std::pow((channel + 0.055) / 1.055, 2.4) : channel / 12.92;
     }
     return table;
 }

@@ -37,8 +37,7 @@ TZmBitmapState::~TZmBitmapState() = default;
 
 TZmBitmap::TZmBitmap() = default;
 
-TZmBitmap::TZmBitmap(std::int32_t width, std::int32_t height, TZmPixelFormat format)
-    : TZmBitmap() {
+TZmBitmap::TZmBitmap(std::int32_t width, std::int32_t height, TZmPixelFormat format) : TZmBitmap() {
     Allocate(width, height, format);
 }
 
@@ -71,13 +70,13 @@ TZmBitmap::TZmBitmap(TBitmap& source, const TRect& rect) : TZmBitmap() {
     part.SwitchTo(this);
 }
 
-TZmBitmap::TZmBitmap(void* memory, std::int32_t width, std::int32_t height,
-                     TZmPixelFormat format)
+TZmBitmap::TZmBitmap(void* memory, std::int32_t width, std::int32_t height, TZmPixelFormat format)
     : TZmBitmap() {
     EncapsulateMemory(memory, width, height, format, /*do_free_image=*/false, zmboTOPLEFT);
 }
 
 TZmBitmap::~TZmBitmap() {
+    FinishROI();
     FreeImage(/*free_alpha=*/true);
 }
 
@@ -323,7 +322,9 @@ void TZmBitmap::SwitchTo(TZmBitmap* target) {
         return;
     }
     target->FreeImage(/*free_alpha=*/true);
+    DropCanvases();
     target->MovePixelsFrom(*this);
+    target->fCanvasFont = fCanvasFont;
     // A plane never gets a plane; whether an object is one is its owner's affair.
     target->fAlphaChannel = target->fIsAlpha ? nullptr : std::move(fAlphaChannel);
     fAlphaChannel.reset();

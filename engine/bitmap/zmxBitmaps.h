@@ -8,7 +8,7 @@
 #include "engine/bitmap/zmbitmapenums.h"
 #include "engine/bitmap/zmbitmapstate.h"
 #include "engine/bitmap/zmpixelformats.h"
-#include "engine/bitmap/zmrender.h"
+#include "engine/bitmap/zmsurface.h"
 #include "engine/foundation/zmdefs.h"
 
 namespace zm {
@@ -32,10 +32,10 @@ inline constexpr TColor kCropNoFill = 0x1FFFFFFF;
 /// Alpha is no channel of the pixel but a second bitmap of format `zm8g`, 255 opaque, owned by
 /// the image. Typed pixel access and rows do not test their arguments in release builds.
 ///
-/// Drawing and the display adjustments are members of the base class.
+/// Drawing, the display adjustments, canvases and clipboard are members of the base classes.
 ///
 /// Not thread-safe, not even for reading rows of a file-backed image through GetScanLine.
-class TZmBitmap : public TZmBitmapRendering {
+class TZmBitmap : public TZmBitmapSurface {
 public:
     // Construction.
     TZmBitmap();
@@ -184,8 +184,7 @@ public:
     TZmBitmap* GetAlphaChannel() override;
     /// The plane or nil; never creates one.
     TZmBitmap* GetAlphaChannelRaw() override { return fAlphaChannel.get(); }
-    static std::unique_ptr<TZmBitmap> CreateAsAlphaChannel(std::int32_t width,
-                                                           std::int32_t height,
+    static std::unique_ptr<TZmBitmap> CreateAsAlphaChannel(std::int32_t width, std::int32_t height,
                                                            TZmLocation location);
     bool HasAlphaChannel() const { return fAlphaChannel != nullptr; }
     /// Frees the plane; with `merge` zm24RGB pixels first take the background by their alpha.
@@ -261,16 +260,14 @@ public:
     /// colour value; zm32f the float.
     void Fill(double value);
     void Fill(TRGBA value);
-    void FillRect(std::int32_t x1, std::int32_t y1, std::int32_t x2, std::int32_t y2,
-                  double value);
+    void FillRect(std::int32_t x1, std::int32_t y1, std::int32_t x2, std::int32_t y2, double value);
     /// Fills with a gradient, each channel of the format on a straight line between the two
     /// colours, rounded to the nearest, ties to even. In zm1g and zm8p colours go along the line
     /// and pixels take the nearer of black and white, or the nearest palette entry. The alpha
     /// plane stays. GradientFillRect starts and ends at the rectangle's sides, also outside.
     void GradientFill(TColor start_color, TColor end_color, TZmGradientDirection direction);
     void GradientFillRect(std::int32_t x1, std::int32_t y1, std::int32_t x2, std::int32_t y2,
-                          TColor start_color, TColor end_color,
-                          TZmGradientDirection direction);
+                          TColor start_color, TColor end_color, TZmGradientDirection direction);
 
     // Processing and I/O, defined in the rooms above.
     /// Mirrors / turns in place, by degrees counter-clockwise (engines: the rotation header). An
@@ -311,8 +308,7 @@ public:
     std::int32_t CalcRAWSize();
     bool SaveRAWToBufferOrStream(void* Buffer, std::int64_t buffer_bytes, TStream* Stream,
                                  bool StreamHasSize);
-    bool LoadRAWFromBufferOrStream(const void* Buffer, std::int64_t buffer_bytes,
-                                   TStream* Stream);
+    bool LoadRAWFromBufferOrStream(const void* Buffer, std::int64_t buffer_bytes, TStream* Stream);
     bool CopyFromTDibBitmap(TZmDibbitmap* source);
     bool CopyToTDibBitmap(TZmDibbitmap* dest, std::int32_t source_x, std::int32_t source_y,
                           std::int32_t sourceWidth, std::int32_t sourceHeight);
@@ -345,6 +341,7 @@ public:
 
 private:
     friend class TZmBitmapStorageTest;
+    friend class TZmBitmapSurface;
 
     bool AllocateStorage();
     bool AllocateNewStorage(std::int32_t width, std::int32_t height, TZmPixelFormat format);
@@ -357,6 +354,7 @@ private:
     void FreeMemoryBlock();
     void FreeFragments();
     void FreePixels();
+    void DropCanvases();
     void UnMapRows();
     void BuildBitmapScanlines();
     void ResetAfterSwitch();
@@ -387,8 +385,8 @@ private:
                         const double* fill_value);
     bool TakeCropped(TZmBitmap& cropped);
     bool TakeRaw(TZmBitmap& loaded);
-    void CopyRowsTo(TZmBitmap& dest, const TRect& area, std::int32_t shift_x,
-                    std::int32_t shift_y, const TRect* frame);
+    void CopyRowsTo(TZmBitmap& dest, const TRect& area, std::int32_t shift_x, std::int32_t shift_y,
+                    const TRect* frame);
     bool ResizePixels(std::int32_t new_width, std::int32_t new_height);
     void UpdateTBitmapPalette();
 };

@@ -46,8 +46,7 @@ void AlphaFromMaskRow(const std::uint8_t* mask_row, std::int32_t bits_per_pixel,
 
 }  // namespace
 
-std::unique_ptr<TZmBitmap> TZmBitmap::CreateAsAlphaChannel(std::int32_t width,
-                                                           std::int32_t height,
+std::unique_ptr<TZmBitmap> TZmBitmap::CreateAsAlphaChannel(std::int32_t width, std::int32_t height,
                                                            TZmLocation location) {
     auto plane = std::make_unique<TZmBitmap>();
     plane->fIsAlpha = true;

@@ -50,8 +50,8 @@ void StepFromRow(const TDistances& finished, TDistances& row) {
 void StepToNeighbours(const TDistances& finished, TDistances& row) {
     const std::size_t last = row.size() - 1;
     for (std::size_t x = 0; x <= last; ++x) {
-        const std::int32_t beside = std::min(finished[x == 0 ? 0 : x - 1],
-                                             finished[x == last ? last : x + 1]);
+        const std::int32_t beside =
+            std::min(finished[x == 0 ? 0 : x - 1], finished[x == last ? last : x + 1]);
         row[x] = std::min({row[x], finished[x] + 1, beside + 1});
     }
     for (std::size_t x = 1; x <= last; ++x) {

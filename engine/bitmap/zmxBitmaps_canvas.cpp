@@ -149,8 +149,8 @@ void TZmBitmap::CropPixelsFrom(TZmBitmap& source, std::int32_t x1, std::int32_t 
     } else if (fill_value != nullptr) {
         FillAround(*this, PictureIn(columns, lines), *fill_value);
     }
-    source.CopyRectTo(this, columns.source, lines.source, columns.dest, lines.dest,
-                      columns.length, lines.length, /*copy_alpha=*/false);
+    source.CopyRectTo(this, columns.source, lines.source, columns.dest, lines.dest, columns.length,
+                      lines.length, /*copy_alpha=*/false);
 }
 
 /// Gives this new image the plane of `source`, cropped at the same corner; grown parts take
@@ -209,16 +209,16 @@ bool TZmBitmap::CropAlpha() {
         return false;
     }
     const TRect rect = FindOpaqueRect(*plane, fWidth, fHeight);
-    const bool is_whole = rect.left == 0 && rect.top == 0 && rect.right == fWidth - 1 &&
-                          rect.bottom == fHeight - 1;
+    const bool is_whole =
+        rect.left == 0 && rect.top == 0 && rect.right == fWidth - 1 && rect.bottom == fHeight - 1;
     return rect.left <= rect.right && !is_whole && Crop(rect, kCropNoFill);
 }
 
 // Canvas size.
 
-bool TZmBitmap::Resize(std::int32_t new_width, std::int32_t new_height,
-                       double background_value, std::int32_t fill_alpha,
-                       TZmHorizAlign horiz_align, TZmVertAlign vert_align) {
+bool TZmBitmap::Resize(std::int32_t new_width, std::int32_t new_height, double background_value,
+                       std::int32_t fill_alpha, TZmHorizAlign horiz_align,
+                       TZmVertAlign vert_align) {
     if (new_width < 1 || new_height < 1) {
         return false;
     }
@@ -230,16 +230,15 @@ bool TZmBitmap::Resize(std::int32_t new_width, std::int32_t new_height,
     if (IsEmpty()) {
         return false;
     }
-    const auto [x1, x2] = AlignAxis(fWidth, new_width, horiz_align == zmhCenter,
-                                    horiz_align == zmhRight);
-    const auto [y1, y2] = AlignAxis(fHeight, new_height, vert_align == zmvCenter,
-                                    vert_align == zmvBottom);
+    const auto [x1, x2] =
+        AlignAxis(fWidth, new_width, horiz_align == zmhCenter, horiz_align == zmhRight);
+    const auto [y1, y2] =
+        AlignAxis(fHeight, new_height, vert_align == zmvCenter, vert_align == zmvBottom);
     return CropTo(TRect{x1, y1, x2, y2}, &background_value, fill_alpha);
 }
 
 bool TZmBitmap::Resize(std::int32_t add_left, std::int32_t add_top, std::int32_t add_right,
-                       std::int32_t add_bottom, double background_value,
-                       std::int32_t fill_alpha) {
+                       std::int32_t add_bottom, double background_value, std::int32_t fill_alpha) {
     if (IsEmpty()) {
         return false;
     }

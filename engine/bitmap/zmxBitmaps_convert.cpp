@@ -268,20 +268,11 @@ bool TZmBitmap::ConvertPixelsFrom(TZmBitmap& source) {
         }
     }
     switch (FindRoute(source.fPixelFormat, fPixelFormat)) {
-        case kRouteRows:
-            ConvertRowsFrom(source);
-            break;
-        case kRouteOneBit:
-            ConvertToOneBitFrom(source);
-            break;
-        case kRouteGrayRange:
-            ConvertGrayRangeFrom(source);
-            break;
-        case kRouteQuantize:
-            QuantizeFrom(source);
-            break;
-        default:
-            break;
+        case kRouteRows: ConvertRowsFrom(source); break;
+        case kRouteOneBit: ConvertToOneBitFrom(source); break;
+        case kRouteGrayRange: ConvertGrayRangeFrom(source); break;
+        case kRouteQuantize: QuantizeFrom(source); break;
+        default: break;
     }
     UpdateTBitmapPalette();
     return true;

@@ -45,21 +45,15 @@ TPixelPattern PatternOfColor(TRGB rgb, TZmPixelFormat format) {
 TPixelPattern MakePattern(TZmPixelFormat format, double value) {
     const std::int32_t integer = TruncToInt(value);
     switch (format) {
-        case zm1g:
-            return PatternOf(static_cast<std::uint8_t>(value != 0 ? 255 : 0));
-        case zm16g:
-            return PatternOf(static_cast<std::uint16_t>(integer));
-        case zm24RGB:
-            return PatternOf(RGBFromColor(integer));
-        case zm32f:
-            return PatternOf(static_cast<float>(value));
+        case zm1g: return PatternOf(static_cast<std::uint8_t>(value != 0 ? 255 : 0));
+        case zm16g: return PatternOf(static_cast<std::uint16_t>(integer));
+        case zm24RGB: return PatternOf(RGBFromColor(integer));
+        case zm32f: return PatternOf(static_cast<float>(value));
         case zmCMYK:
         case zm48RGB:
         case zmCIELab:
-        case zm32RGB:
-            return PatternOfColor(RGBFromColor(integer), format);
-        default:
-            return PatternOf(static_cast<std::uint8_t>(integer));
+        case zm32RGB: return PatternOfColor(RGBFromColor(integer), format);
+        default: return PatternOf(static_cast<std::uint8_t>(integer));
     }
 }
 
@@ -78,8 +72,7 @@ std::vector<std::uint8_t> MakePatternRow(const TPixelPattern& pattern, std::size
 /// Rows that are about to be overwritten whole need not be read from a file first.
 class TWriteOnlyAccess {
 public:
-    TWriteOnlyAccess(TZmDataAccess& access, bool is_whole_rows)
-        : access_(access), saved_(access) {
+    TWriteOnlyAccess(TZmDataAccess& access, bool is_whole_rows) : access_(access), saved_(access) {
         access_ = is_whole_rows ? zmdWrite : access;
     }
     ~TWriteOnlyAccess() { access_ = saved_; }

@@ -23,12 +23,9 @@ public:
         const std::int64_t columns = std::int64_t{rect_.right} - rect_.left;
         const std::int64_t lines = std::int64_t{rect_.bottom} - rect_.top;
         switch (direction_) {
-            case zmgHorizontal:
-                return columns;
-            case zmgVertical:
-                return lines;
-            default:
-                return columns + lines;
+            case zmgHorizontal: return columns;
+            case zmgVertical: return lines;
+            default: return columns + lines;
         }
     }
 
@@ -36,21 +33,15 @@ public:
         const std::int64_t column = std::int64_t{x} - rect_.left;
         const std::int64_t line = std::int64_t{y} - rect_.top;
         switch (direction_) {
-            case zmgHorizontal:
-                return column;
-            case zmgVertical:
-                return line;
-            case zmgDiagonal2:
-                return std::int64_t{rect_.right} - x + line;
-            default:
-                return column + line;
+            case zmgHorizontal: return column;
+            case zmgVertical: return line;
+            case zmgDiagonal2: return std::int64_t{rect_.right} - x + line;
+            default: return column + line;
         }
     }
 
     /// Change of the place from one column to the next.
-    int Step() const {
-        return direction_ == zmgVertical ? 0 : direction_ == zmgDiagonal2 ? -1 : 1;
-    }
+    int Step() const { return direction_ == zmgVertical ? 0 : direction_ == zmgDiagonal2 ? -1 : 1; }
 
 private:
     TRect rect_;
@@ -85,9 +76,8 @@ void WriteChannels(const std::uint8_t* start, const std::uint8_t* end, std::uint
     }
 }
 
-void WriteGradientPixel(TZmPixelFormat format, const TZmPixelBytes& start,
-                        const TZmPixelBytes& end, std::uint8_t* pixel, std::int64_t place,
-                        std::int64_t length) {
+void WriteGradientPixel(TZmPixelFormat format, const TZmPixelBytes& start, const TZmPixelBytes& end,
+                        std::uint8_t* pixel, std::int64_t place, std::int64_t length) {
     const auto bytes = static_cast<std::size_t>(PixelFormatInfo(format).bit_count) / 8;
     switch (format) {
         case zm16g:
@@ -102,8 +92,7 @@ void WriteGradientPixel(TZmPixelFormat format, const TZmPixelBytes& start,
             WriteChannels<std::int8_t>(start.data() + 1, end.data() + 1, pixel + 1, 2, place,
                                        length);
             break;
-        default:
-            WriteChannels<std::uint8_t>(start.data(), end.data(), pixel, bytes, place, length);
+        default: WriteChannels<std::uint8_t>(start.data(), end.data(), pixel, bytes, place, length);
     }
 }
 
@@ -116,10 +105,9 @@ public:
         : pixel_bytes_(static_cast<std::size_t>(PixelFormatInfo(format).bit_count) / 8),
           way_(way),
           step_(way.Step()) {
-        const std::int64_t corners[] = {way.PlaceOf(visible.left, visible.top),
-                                        way.PlaceOf(visible.right, visible.top),
-                                        way.PlaceOf(visible.left, visible.bottom),
-                                        way.PlaceOf(visible.right, visible.bottom)};
+        const std::int64_t corners[] = {
+            way.PlaceOf(visible.left, visible.top), way.PlaceOf(visible.right, visible.top),
+            way.PlaceOf(visible.left, visible.bottom), way.PlaceOf(visible.right, visible.bottom)};
         const auto [low, high] = std::minmax_element(std::begin(corners), std::end(corners));
         first_ = step_ < 0 ? *high : *low;
         const auto count = static_cast<std::size_t>(*high - *low + 1);
@@ -214,13 +202,12 @@ void FillGradient(TZmBitmap& bitmap, const TRect& rect, TZmGradientDirection dir
     bitmap.SetFull(false);
 }
 
-void TZmBitmap::GradientFill(TColor start_color, TColor end_color,
-                             TZmGradientDirection direction) {
+void TZmBitmap::GradientFill(TColor start_color, TColor end_color, TZmGradientDirection direction) {
     GradientFillRect(0, 0, GetWidth() - 1, fHeight - 1, start_color, end_color, direction);
 }
 
-void TZmBitmap::GradientFillRect(std::int32_t x1, std::int32_t y1, std::int32_t x2,
-                                 std::int32_t y2, TColor start_color, TColor end_color,
+void TZmBitmap::GradientFillRect(std::int32_t x1, std::int32_t y1, std::int32_t x2, std::int32_t y2,
+                                 TColor start_color, TColor end_color,
                                  TZmGradientDirection direction) {
     const TZmPixelFormat format = GetPixelFormat();
     FillGradient(*this, TRect{x1, y1, x2, y2}, direction, PixelOfColor(start_color, format),

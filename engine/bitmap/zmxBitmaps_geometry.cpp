@@ -33,8 +33,8 @@ public:
         } else if (source_.format == zm1g) {
             CopyBitRun(from, from_x, to, to_x, count);
         } else {
-            const auto bytes = static_cast<std::size_t>(count) *
-                               static_cast<std::size_t>(pixel_bytes_);
+            const auto bytes =
+                static_cast<std::size_t>(count) * static_cast<std::size_t>(pixel_bytes_);
             const std::uint8_t* const first = from + std::int64_t{from_x} * pixel_bytes_;
             std::uint8_t* const target = to + std::int64_t{to_x} * pixel_bytes_;
             if (is_same_bitmap_) {
@@ -67,8 +67,8 @@ private:
 };
 
 /// Moves an inclusive rectangle that lies inside one plane of pixels.
-void MovePixels(TZmBitmap& pixels, const TRect& region, std::int32_t dst_x,
-                       std::int32_t dst_y, double background_value, bool clear_region) {
+void MovePixels(TZmBitmap& pixels, const TRect& region, std::int32_t dst_x, std::int32_t dst_y,
+                double background_value, bool clear_region) {
     const std::int32_t width = region.right - region.left + 1;
     const std::int32_t height = region.bottom - region.top + 1;
     TZmBitmap moved;
@@ -142,7 +142,7 @@ void TZmBitmap::CopyRowsTo(TZmBitmap& dest, const TRect& area, std::int32_t shif
         std::int64_t right = area.right;
         if (frame != nullptr) {
             const TZmEllipse ellipse{static_cast<double>(frame->right),
-                                   static_cast<double>(frame->bottom)};
+                                     static_cast<double>(frame->bottom)};
             const auto [first, count] = ellipse.RowSpan(std::int64_t{y} - frame->top);
             left = std::max(left, frame->left + first);
             right = std::min(right, frame->left + first + count);

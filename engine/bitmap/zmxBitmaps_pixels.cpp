@@ -116,8 +116,7 @@ TRGB TZmBitmap::GetPixels(std::int32_t x, std::int32_t y) {
     if (row == nullptr) {
         return TRGB{};
     }
-    return fPixelFormat == zm8p ? GetPalette(row[x])
-                                : RowPixelToRGB(row, x, fPixelFormat, nullptr);
+    return fPixelFormat == zm8p ? GetPalette(row[x]) : RowPixelToRGB(row, x, fPixelFormat, nullptr);
 }
 
 TZmRowLayout TZmBitmap::GetRowLayout() {

@@ -24,44 +24,33 @@ constexpr std::size_t kPaletteEntries = 256;
 /// Layout of a platform bitmap for a pixel format; raises for formats that none holds.
 TBitmapPixelFormat TBitmapFormatFor(TZmPixelFormat format) {
     switch (format) {
-        case zm1g:
-            return pf1bit;
+        case zm1g: return pf1bit;
         case zm8p:
         case zm8g:
-        case zm16g:
-            return pf8bit;
-        case zm24RGB:
-            return pf24bit;
-        case zm32RGB:
-            return pf32bit;
+        case zm16g: return pf8bit;
+        case zm24RGB: return pf24bit;
+        case zm32RGB: return pf32bit;
         case zm32f:
             throw EZmException("zm32f pixel format not allowed when ZmBitmap.Location=zmTBitmap");
         case zmCMYK:
             throw EZmException("zmCMYK pixel format not allowed when ZmBitmap.Location=zmTBitmap");
         case zm48RGB:
-            throw EZmException(
-                "zmRGB48 pixel format not allowed when ZmBitmap.Location=zmTBitmap");
+            throw EZmException("zmRGB48 pixel format not allowed when ZmBitmap.Location=zmTBitmap");
         case zmCIELab:
             throw EZmException(
                 "zmCIELab pixel format not allowed when ZmBitmap.Location=zmTBitmap");
-        default:
-            return pfNone;
+        default: return pfNone;
     }
 }
 
 /// Pixel format that a platform bitmap's layout stands for; `other` for a layout without one.
 TZmPixelFormat FormatOfTBitmap(TBitmapPixelFormat format, TZmPixelFormat other) {
     switch (format) {
-        case pf1bit:
-            return zm1g;
-        case pf8bit:
-            return zm8p;
-        case pf24bit:
-            return zm24RGB;
-        case pf32bit:
-            return zm32RGB;
-        default:
-            return other;
+        case pf1bit: return zm1g;
+        case pf8bit: return zm8p;
+        case pf24bit: return zm24RGB;
+        case pf32bit: return zm32RGB;
+        default: return other;
     }
 }
 
@@ -127,8 +116,8 @@ bool TZmBitmap::Allocate(std::int32_t width, std::int32_t height, TColor fill_co
 }
 
 /// Stores size and format and makes room; without room the size is 0.
-bool TZmBitmap::AllocateNewStorage(std::int32_t width, std::int32_t height,
-                                   TZmPixelFormat format) {
+bool TZmBitmap::AllocateNewStorage(std::int32_t width, std::int32_t height, TZmPixelFormat format) {
+    DropCanvases();
     fWidth = std::max(width, 0);
     fHeight = std::max(height, 0);
     fPixelFormat = IsImageFormat(format) ? format : zmnull;
@@ -274,8 +263,8 @@ void TZmBitmap::UpdateFromTBitmap() {
     const bool is_gray = layout == pf8bit && fPixelFormat == zm8g;
     const TZmPixelFormat format = is_gray ? zm8g : FormatOfTBitmap(layout, fPixelFormat);
     const std::uint8_t* const first_row = fBitmap->GetScanLine(0);
-    const bool is_same = fWidth == fBitmap->GetWidth() && fHeight == fBitmap->GetHeight() &&
-                         fPixelFormat == format;
+    const bool is_same =
+        fWidth == fBitmap->GetWidth() && fHeight == fBitmap->GetHeight() && fPixelFormat == format;
     if (is_same && (fBitmapScanlines.empty() || fBitmapScanlines.front() == first_row)) {
         return;
     }
@@ -364,6 +353,7 @@ void TZmBitmap::Clear() {
 
 /// Lets go of the pixels in whatever place; size and derived fields become 0.
 void TZmBitmap::FreePixels() {
+    DropCanvases();
     UnMapRows();
     fmemmap->DeAllocate();
     FreeMemoryBlock();
@@ -379,6 +369,12 @@ void TZmBitmap::FreePixels() {
     fChannelCount = 0;
     fRowLen = 0;
     fFull = false;
+}
+
+/// Canvases draw on pixels that are about to go.
+void TZmBitmap::DropCanvases() {
+    fZmCanvas.reset();
+    fCanvas.reset();
 }
 
 void TZmBitmap::FreeMemoryBlock() {

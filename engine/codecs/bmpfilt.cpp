@@ -133,18 +133,12 @@ bool IsOtherHeader(std::uint32_t header_bytes) {
 
 TIOBMPVersion VersionOfHeader(std::uint32_t header_bytes) {
     switch (header_bytes) {
-        case kBmpCoreHeaderBytes:
-            return ioBMP_BMOS2V1;
-        case kBmpInfoHeaderBytes:
-            return ioBMP_BM3;
-        case kBmpOs2HeaderBytes:
-            return ioBMP_BMOS2V2;
-        case kBmpV4HeaderBytes:
-            return ioBMP_V4;
-        case kBmpV5HeaderBytes:
-            return ioBMP_V5;
-        default:
-            return ioBMP_BM;
+        case kBmpCoreHeaderBytes: return ioBMP_BMOS2V1;
+        case kBmpInfoHeaderBytes: return ioBMP_BM3;
+        case kBmpOs2HeaderBytes: return ioBMP_BMOS2V2;
+        case kBmpV4HeaderBytes: return ioBMP_V4;
+        case kBmpV5HeaderBytes: return ioBMP_V5;
+        default: return ioBMP_BM;
     }
 }
 
@@ -152,17 +146,12 @@ TIOBMPVersion VersionOfHeader(std::uint32_t header_bytes) {
 bool IsDepthSupported(std::int32_t bit_count, std::uint32_t compression) {
     switch (bit_count) {
         case 1:
-        case 24:
-            return compression == kBmpNone;
-        case 4:
-            return compression == kBmpNone || compression == kBmpRle4;
-        case 8:
-            return compression == kBmpNone || compression == kBmpRle8;
+        case 24: return compression == kBmpNone;
+        case 4: return compression == kBmpNone || compression == kBmpRle4;
+        case 8: return compression == kBmpNone || compression == kBmpRle8;
         case 16:
-        case 32:
-            return compression == kBmpNone || compression == kBmpBitFields;
-        default:
-            return false;
+        case 32: return compression == kBmpNone || compression == kBmpBitFields;
+        default: return false;
     }
 }
 
@@ -263,9 +252,9 @@ void StoreHeader(TBmpRead& read) {
     const TZmZalmoGlobalSettings& settings = ZmGlobalSettings();
     TIOParams& params = read.params;
     params.fBMP_Version = VersionOfHeader(header.header_bytes);
-    params.fBMP_Compression =
-        header.compression == kBmpRle8 || header.compression == kBmpRle4 ? ioBMP_RLE
-                                                                         : ioBMP_UNCOMPRESSED;
+    params.fBMP_Compression = header.compression == kBmpRle8 || header.compression == kBmpRle4
+                                  ? ioBMP_RLE
+                                  : ioBMP_UNCOMPRESSED;
     params.fWidth = params.fOriginalWidth = header.width;
     params.fHeight = params.fOriginalHeight = header.height;
     params.SetDpiX(DpiFromPixelsPerMetre(header.pixels_per_metre_x, settings.fDefaultDPIX));
@@ -285,8 +274,8 @@ void ReadPalette(TBmpRead& read) {
     }
     const bool is_core = header.header_bytes == kBmpCoreHeaderBytes;
     const std::size_t entry_bytes = is_core ? 3 : 4;
-    const bool count_given = !is_core && header.colors_used > 0 &&
-                             header.colors_used <= kMaxPaletteEntries;
+    const bool count_given =
+        !is_core && header.colors_used > 0 && header.colors_used <= kMaxPaletteEntries;
     const std::uint32_t count = count_given ? header.colors_used : 1u << header.bit_count;
     std::array<std::uint8_t, kMaxPaletteEntries * 4> bytes{};
     ReadFully(read.stream, bytes.data(), count * entry_bytes);
@@ -309,8 +298,8 @@ TBmpStatus ReadMasks(TBmpRead& read) {
         header.masks = header.bit_count == 16 ? kMasks555 : kMasks8888;
         return TBmpStatus::kOk;
     }
-    const bool in_header = header.header_bytes >= kMasksOffset + 12 &&
-                           header.header_bytes != kBmpOs2HeaderBytes;
+    const bool in_header =
+        header.header_bytes >= kMasksOffset + 12 && header.header_bytes != kBmpOs2HeaderBytes;
     if (in_header) {
         return TBmpStatus::kOk;
     }
@@ -370,15 +359,11 @@ TBmpStatus ReadHeaders(TBmpRead& read, bool no_file_header) {
 TZmPixelFormat TargetFormat(const TBmpRead& read) {
     const bool native = read.params.fNativePixelFormat;
     switch (read.header.bit_count) {
-        case 1:
-            return zm1g;
+        case 1: return zm1g;
         case 4:
-        case 8:
-            return native ? zm8p : zm24RGB;
-        case 16:
-            return native ? zm16g : zm24RGB;
-        default:
-            return zm24RGB;
+        case 8: return native ? zm8p : zm24RGB;
+        case 16: return native ? zm16g : zm24RGB;
+        default: return zm24RGB;
     }
 }
 
@@ -394,8 +379,7 @@ TBmpStatus AllocateImage(TBmpRead& read) {
     const TZmPixelFormat format = TargetFormat(read);
     // The alpha mask counts too: 32 bits stand for three bytes of colour and one of alpha.
     const std::int32_t bits = std::max(header.bit_count, PixelFormatInfo(format).bit_count);
-    if (!ImageSizeIsAcceptable(header.width, header.height, bits,
-                               read.stream_bytes - read.start)) {
+    if (!ImageSizeIsAcceptable(header.width, header.height, bits, read.stream_bytes - read.start)) {
         return TBmpStatus::kTooLarge;
     }
     if (!read.bitmap.Allocate(header.width, header.height, format)) {
@@ -541,20 +525,13 @@ bool HasGrayMask(const TMasks& masks) {
 TDecodeRow ChooseRowDecoder(const TBmpRead& read, bool with_alpha) {
     const bool native = read.params.fNativePixelFormat;
     switch (read.header.bit_count) {
-        case 1:
-            return IsWhiteBlackPalette(read) ? InvertRow1 : CopyRow1;
-        case 4:
-            return native ? UnpackRow4 : ColorRow4;
-        case 8:
-            return native ? CopyRow8 : ColorRow8;
+        case 1: return IsWhiteBlackPalette(read) ? InvertRow1 : CopyRow1;
+        case 4: return native ? UnpackRow4 : ColorRow4;
+        case 8: return native ? CopyRow8 : ColorRow8;
         case 16:
-            return native                            ? WordRow16
-                   : HasGrayMask(read.header.masks) ? GrayRow16
-                                                    : ColorRow16;
-        case 24:
-            return CopyRow24;
-        default:
-            return with_alpha ? ColorAlphaRow32 : ColorRow32;
+            return native ? WordRow16 : HasGrayMask(read.header.masks) ? GrayRow16 : ColorRow16;
+        case 24: return CopyRow24;
+        default: return with_alpha ? ColorAlphaRow32 : ColorRow32;
     }
 }
 
@@ -597,8 +574,11 @@ TBmpStatus DecodePlainRows(TBmpRead& read, TDecodeRow decode) {
     if (row_bytes < kDirectRowBytes) {
         buffered.emplace(&read.stream, kRowBufferBytes, /*use_relative_position=*/false);
     }
-    TRowPlan plan{buffered ? *buffered : read.stream, decode,
-                  static_cast<std::size_t>(row_bytes), in_place, {}};
+    TRowPlan plan{buffered ? *buffered : read.stream,
+                  decode,
+                  static_cast<std::size_t>(row_bytes),
+                  in_place,
+                  {}};
     plan.buffer.resize(in_place ? 0 : plan.row_bytes);
     for (std::int32_t row = 0; row < read.header.height; ++row) {
         const TBmpStatus status = DecodePlainRow(read, plan, row);
@@ -648,8 +628,7 @@ TBmpStatus DecodeCompressedRows(TBmpRead& read) {
     const auto step = [&](std::int32_t rows_done) {
         return StepProgress(read.progress, rows_done);
     };
-    const TBmpRleImage image{data, read.header.width, read.header.height,
-                             read.header.compression};
+    const TBmpRleImage image{data, read.header.width, read.header.height, read.header.compression};
     const TBmpStatus decoded = DecodeBmpRle(image, sink, step);
     return has_rows ? decoded : TBmpStatus::kNoMemory;
 }

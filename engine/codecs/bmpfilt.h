@@ -23,7 +23,7 @@ void ReadBMPStream(TStream& stream, TZmBitmap& bitmap, std::int64_t byte_limit, 
 /// Writes `bitmap` as `params` tells (depth, version, compression). Alpha goes to the file only
 /// with `handle_transparency`. The bitmap is left as it was. A short write sets
 /// `*progress.Aborting`.
-void WriteBMPStream(TStream& stream, TZmBitmap& bitmap, TIOParams& params,
-                    bool handle_transparency, TProgressRec& progress);
+void WriteBMPStream(TStream& stream, TZmBitmap& bitmap, TIOParams& params, bool handle_transparency,
+                    TProgressRec& progress);
 
 }  // namespace zm

@@ -114,17 +114,14 @@ TRleDecoder::TNext TRleDecoder::DecodeEscape(std::uint8_t command) {
                 return TNext::kComplete;
             }
             return step_(row_) ? TNext::kGoOn : TNext::kStopped;
-        case kEndOfBitmap:
-            return TNext::kComplete;
+        case kEndOfBitmap: return TNext::kComplete;
         case kDelta:
             if (!Take(dx) || !Take(dy)) {
                 return TNext::kGoOn;
             }
             column_ = std::min(column_ + dx, last_column_);
             return MoveUp(dy) ? TNext::kGoOn : TNext::kComplete;
-        default:
-            DecodeLiterals(command);
-            return TNext::kGoOn;
+        default: DecodeLiterals(command); return TNext::kGoOn;
     }
 }
 
@@ -150,15 +147,13 @@ TBmpStatus TRleDecoder::Decode() {
     if (next == TNext::kStopped) {
         return TBmpStatus::kStopped;
     }
-    return next == TNext::kComplete || reached_last_row ? TBmpStatus::kOk
-                                                        : TBmpStatus::kTruncated;
+    return next == TNext::kComplete || reached_last_row ? TBmpStatus::kOk : TBmpStatus::kTruncated;
 }
 
 // What differs between the two encoders: how a run and a piece of literals look.
 class TRle8Form {
 public:
-    static void WriteRun(std::size_t count, std::uint8_t value,
-                         std::vector<std::uint8_t>& output) {
+    static void WriteRun(std::size_t count, std::uint8_t value, std::vector<std::uint8_t>& output) {
         output.push_back(static_cast<std::uint8_t>(count));
         output.push_back(value);
     }
@@ -181,8 +176,7 @@ public:
 
 class TRle4Form {
 public:
-    static void WriteRun(std::size_t count, std::uint8_t value,
-                         std::vector<std::uint8_t>& output) {
+    static void WriteRun(std::size_t count, std::uint8_t value, std::vector<std::uint8_t>& output) {
         output.push_back(static_cast<std::uint8_t>(count));
         output.push_back(PackPair(value, value));
     }

@@ -63,12 +63,9 @@ std::int32_t ChooseBitCount(const TIOParams& params, bool with_alpha) {
 
 std::uint32_t HeaderBytesOfVersion(TIOBMPVersion version) {
     switch (version) {
-        case ioBMP_BMOS2V1:
-            return kBmpCoreHeaderBytes;
-        case ioBMP_BMOS2V2:
-            return kBmpOs2HeaderBytes;
-        default:
-            return kBmpInfoHeaderBytes;
+        case ioBMP_BMOS2V1: return kBmpCoreHeaderBytes;
+        case ioBMP_BMOS2V2: return kBmpOs2HeaderBytes;
+        default: return kBmpInfoHeaderBytes;
     }
 }
 
@@ -165,8 +162,7 @@ TBmpStatus WriteBytes(TStream& output, const std::vector<std::uint8_t>& bytes) {
         return TBmpStatus::kTooLarge;
     }
     const auto count = static_cast<std::int32_t>(bytes.size());
-    return output.Write(bytes.data(), count) == count ? TBmpStatus::kOk
-                                                      : TBmpStatus::kWriteFailed;
+    return output.Write(bytes.data(), count) == count ? TBmpStatus::kOk : TBmpStatus::kWriteFailed;
 }
 
 TBmpStatus WritePalette(TStream& output, const TBmpPlan& plan) {
@@ -308,8 +304,8 @@ private:
 
 void PackRow4(const std::vector<std::uint8_t>& indices, std::uint8_t* row) {
     for (std::size_t x = 0; x < indices.size(); ++x) {
-        row[x / 2] = static_cast<std::uint8_t>(
-            row[x / 2] | (x % 2 == 0 ? indices[x] << 4 : indices[x] & 15));
+        row[x / 2] = static_cast<std::uint8_t>(row[x / 2] |
+                                               (x % 2 == 0 ? indices[x] << 4 : indices[x] & 15));
     }
 }
 
@@ -413,9 +409,7 @@ TBmpStatus WriteBits(TBmpWrite& write) {
     if (status != TBmpStatus::kOk) {
         return status;
     }
-    const auto fill = [bits](std::int32_t y, std::uint8_t* row) {
-        return FillRow1(*bits, y, row);
-    };
+    const auto fill = [bits](std::int32_t y, std::uint8_t* row) { return FillRow1(*bits, y, row); };
     return WriteRows(write.output, write.plan, fill, write.progress);
 }
 
@@ -466,13 +460,10 @@ TBmpStatus WriteColors(TBmpWrite& write) {
 
 TBmpStatus WriteContents(TBmpWrite& write) {
     switch (write.plan.bit_count) {
-        case 1:
-            return WriteBits(write);
+        case 1: return WriteBits(write);
         case 4:
-        case 8:
-            return WriteIndices(write);
-        default:
-            return WriteColors(write);
+        case 8: return WriteIndices(write);
+        default: return WriteColors(write);
     }
 }
 
@@ -505,8 +496,8 @@ TBmpStatus WriteImage(TStream& stream, TZmBitmap& bitmap, TIOParams& params, boo
 }  // namespace
 
 // Alpha that does not go to the file is not looked at; the bitmap keeps its plane.
-void WriteBMPStream(TStream& stream, TZmBitmap& bitmap, TIOParams& params,
-                    bool handle_transparency, TProgressRec& progress) {
+void WriteBMPStream(TStream& stream, TZmBitmap& bitmap, TIOParams& params, bool handle_transparency,
+                    TProgressRec& progress) {
     const bool with_alpha = handle_transparency && bitmap.HasAlphaChannel();
     TBmpStatus status = TBmpStatus::kNoMemory;
     try {

@@ -73,8 +73,7 @@ TJpegErrors& ErrorsOf(j_decompress_ptr decoder) {
 /// Bytes put into the buffer; 0 at the end, -1 when the stream raised.
 std::int32_t FetchBytes(TJpegSource& source) {
     const auto room = static_cast<std::int64_t>(source.buffer.size());
-    const std::int64_t wanted =
-        source.bytes_left < 0 ? room : std::min(room, source.bytes_left);
+    const std::int64_t wanted = source.bytes_left < 0 ? room : std::min(room, source.bytes_left);
     try {
         const std::int32_t got =
             source.stream->Read(source.buffer.data(), static_cast<std::int32_t>(wanted));
@@ -156,12 +155,9 @@ std::int32_t DpiFromDensity(UINT16 density, UINT8 unit) {
 
 J_DCT_METHOD DctMethod(TIOJPEGDctMethod method) {
     switch (method) {
-        case ioJPEG_IFAST:
-            return JDCT_IFAST;
-        case ioJPEG_FLOAT:
-            return JDCT_FLOAT;
-        default:
-            return JDCT_ISLOW;
+        case ioJPEG_IFAST: return JDCT_IFAST;
+        case ioJPEG_FLOAT: return JDCT_FLOAT;
+        default: return JDCT_ISLOW;
     }
 }
 
@@ -181,16 +177,11 @@ std::int32_t AutoDenominator(const TIOParams& params, std::int64_t width, std::i
 
 std::int32_t ScaleDenominator(const TIOParams& params, std::int64_t width, std::int64_t height) {
     switch (params.fJPEG_Scale) {
-        case ioJPEG_HALF:
-            return 2;
-        case ioJPEG_QUARTER:
-            return 4;
-        case ioJPEG_EIGHTH:
-            return 8;
-        case ioJPEG_AUTOCALC:
-            return AutoDenominator(params, width, height);
-        default:
-            return 1;
+        case ioJPEG_HALF: return 2;
+        case ioJPEG_QUARTER: return 4;
+        case ioJPEG_EIGHTH: return 8;
+        case ioJPEG_AUTOCALC: return AutoDenominator(params, width, height);
+        default: return 1;
     }
 }
 
@@ -322,9 +313,7 @@ void TJpegReader::ChooseColors(const TJpegReadOptions& options) {
                 format_ = zm8g;
             }
             break;
-        case JCS_RGB:
-            params_.fJPEG_ColorSpace = ioJPEG_RGB;
-            break;
+        case JCS_RGB: params_.fJPEG_ColorSpace = ioJPEG_RGB; break;
         case JCS_YCbCr:
             params_.fJPEG_ColorSpace = ioJPEG_YCbCr;
             if (options.keep_ycbcr) {
@@ -339,8 +328,7 @@ void TJpegReader::ChooseColors(const TJpegReadOptions& options) {
             format_ = options.native_format ? zmCMYK : zm24RGB;
             break;
         default:
-            throw EZmJpegException(
-                JpegMessageText(JpegMessageNumber(JERR_CONVERSION_NOTIMPL)));
+            throw EZmJpegException(JpegMessageText(JpegMessageNumber(JERR_CONVERSION_NOTIMPL)));
     }
 }
 
@@ -408,10 +396,9 @@ bool TJpegReader::ScansAreComplete() const {
 
 bool TJpegReader::Start() {
     InitMonitor();
-    const bool has_started =
-        RunJpegOrRaise(errors_, [this] { jpeg_start_decompress(&decoder_); });
-    const bool is_cut = errors_.input_ended && jpeg_has_multiple_scans(&decoder_) != FALSE &&
-                        !ScansAreComplete();
+    const bool has_started = RunJpegOrRaise(errors_, [this] { jpeg_start_decompress(&decoder_); });
+    const bool is_cut =
+        errors_.input_ended && jpeg_has_multiple_scans(&decoder_) != FALSE && !ScansAreComplete();
     return has_started && !is_cut;
 }
 
@@ -479,8 +466,7 @@ bool TJpegReader::ReadRows(TZmBitmap& bitmap) {
 
 /// Behind complete rows a missing end marker is no failure.
 bool TJpegReader::Finish() {
-    const bool is_finished =
-        RunJpegGuarded(errors_, [this] { jpeg_finish_decompress(&decoder_); });
+    const bool is_finished = RunJpegGuarded(errors_, [this] { jpeg_finish_decompress(&decoder_); });
     if (!is_finished && !errors_.input_ended) {
         RaiseJpegError(errors_);
     }

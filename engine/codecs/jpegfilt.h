@@ -18,11 +18,11 @@ public:
 };
 
 struct TJpegReadOptions {
-    std::int64_t byte_limit = -1;     ///< bytes that belong to the image; -1 for no limit
-    bool native_format = false;       ///< keep grey and CMYK pixels as they are
-    bool params_only = false;         ///< fill the parameters and leave the bitmap alone
-    bool read_metadata = true;        ///< parse EXIF, IPTC, XMP and profile markers
-    bool keep_ycbcr = false;          ///< samples of YCbCr files in zm24RGB, Y in the first byte
+    std::int64_t byte_limit = -1;  ///< bytes that belong to the image; -1 for no limit
+    bool native_format = false;    ///< keep grey and CMYK pixels as they are
+    bool params_only = false;      ///< fill the parameters and leave the bitmap alone
+    bool read_metadata = true;     ///< parse EXIF, IPTC, XMP and profile markers
+    bool keep_ycbcr = false;       ///< samples of YCbCr files in zm24RGB, Y in the first byte
 };
 
 /// Reads a JPEG; markers, resolution and colour space go to `params`, the image is turned upright
@@ -36,7 +36,6 @@ void ReadJPEGStream(TStream& stream, TZmBitmap& bitmap, const TJpegReadOptions& 
 /// Writes `bitmap` as `params` tells. An empty bitmap is not written. A failing write sets
 /// `*progress.Aborting`; errors of the library raise EZmJpegException. The bitmap is left as it
 /// was.
-void WriteJPEGStream(TStream& stream, TZmBitmap& bitmap, TIOParams& params,
-                     TProgressRec& progress);
+void WriteJPEGStream(TStream& stream, TZmBitmap& bitmap, TIOParams& params, TProgressRec& progress);
 
 }  // namespace zm

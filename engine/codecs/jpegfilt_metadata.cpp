@@ -52,8 +52,7 @@ bool SearchMarkers(const TZmMarkerList& markers, std::uint8_t type, const Use& u
 
 void ReadIptc(TIOParams& params) {
     SearchMarkers(params.fJPEG_MarkerList, kMarkerApp13, [&params](TBytes data) {
-        return StartsWith(data, kResourcePrefix) &&
-               params.fIPTC_Info.LoadFromStandardBuffer(data);
+        return StartsWith(data, kResourcePrefix) && params.fIPTC_Info.LoadFromStandardBuffer(data);
     });
 }
 
@@ -207,8 +206,7 @@ bool ApplyJpegOrientation(TZmBitmap& bitmap, TIOParams& params, std::int32_t ori
             continue;
         }
         std::vector<std::uint8_t> changed(data.begin(), data.end());
-        if (SetExifOrientation(std::span(changed).subspan(kExifPrefixBytes),
-                               kOrientationUpright)) {
+        if (SetExifOrientation(std::span(changed).subspan(kExifPrefixBytes), kOrientationUpright)) {
             markers.DeleteMarker(i);
             markers.InsertMarker(i, kMarkerApp1, changed);
         }

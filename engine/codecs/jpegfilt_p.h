@@ -40,10 +40,10 @@ std::string JpegMessageText(std::int32_t number);
 struct TJpegErrors {
     jpeg_error_mgr base;
     std::jmp_buf jump;
-    int fatal_code = 0;             ///< message code of the library
+    int fatal_code = 0;  ///< message code of the library
     std::int32_t warning_total = 0;
     std::int32_t warning_number = 0;  ///< of the last warning, as JpegMessageNumber gives it
-    bool input_ended = false;       ///< the source has begun to make up an end marker
+    bool input_ended = false;         ///< the source has begun to make up an end marker
 };
 
 /// Prepares the state and its callbacks for a new object of the library.

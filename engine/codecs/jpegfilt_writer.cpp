@@ -90,16 +90,11 @@ struct TColorPlan {
 
 TColorPlan PlanFor(TIOJPEGColorspace color_space) {
     switch (color_space) {
-        case ioJPEG_GRAYLEV:
-            return {JCS_GRAYSCALE, JCS_GRAYSCALE, 1, zm8g};
-        case ioJPEG_YCbCr:
-            return {JCS_YCbCr, JCS_EXT_BGR, 3, zm24RGB};
-        case ioJPEG_CMYK:
-            return {JCS_CMYK, JCS_CMYK, 4, zmCMYK};
-        case ioJPEG_YCbCrK:
-            return {JCS_YCCK, JCS_CMYK, 4, zmCMYK};
-        default:
-            return {JCS_RGB, JCS_EXT_BGR, 3, zm24RGB};
+        case ioJPEG_GRAYLEV: return {JCS_GRAYSCALE, JCS_GRAYSCALE, 1, zm8g};
+        case ioJPEG_YCbCr: return {JCS_YCbCr, JCS_EXT_BGR, 3, zm24RGB};
+        case ioJPEG_CMYK: return {JCS_CMYK, JCS_CMYK, 4, zmCMYK};
+        case ioJPEG_YCbCrK: return {JCS_YCCK, JCS_CMYK, 4, zmCMYK};
+        default: return {JCS_RGB, JCS_EXT_BGR, 3, zm24RGB};
     }
 }
 
@@ -156,7 +151,10 @@ TJpegWriter::TJpegWriter(TStream& stream, TZmBitmap& bitmap, TIOParams& params,
 }
 
 void TJpegWriter::PrepareRows() {
-    takes_rows_as_they_are_ = bitmap_.GetPixelFormat() == plan_.row_format;
+    // Required: inks are made from the colours even where the image has inks of its own, so that
+    // a file is the same whatever format the picture came in.
+    takes_rows_as_they_are_ =
+        plan_.row_format != zmCMYK && bitmap_.GetPixelFormat() == plan_.row_format;
     if (takes_rows_as_they_are_ || plan_.row_format == zm24RGB) {
         return;
     }

@@ -112,15 +112,10 @@ bool TurnInto(TZmBitmap& source, TZmBitmap& target, TTurn turn) {
     const TAccessScope source_scope(source, zmdRead);
     const TAccessScope target_scope(target, zmdReadWrite);
     switch (source.GetBitCount()) {
-        case 8:
-            return TurnPixels<1>(source, target, turn);
-        case 24:
-            return TurnPixels<3>(source, target, turn);
-        case 32:
-            return TurnPixels<4>(source, target, turn);
-        default:
-            ZM_ASSERT(false);
-            return false;
+        case 8: return TurnPixels<1>(source, target, turn);
+        case 24: return TurnPixels<3>(source, target, turn);
+        case 32: return TurnPixels<4>(source, target, turn);
+        default: ZM_ASSERT(false); return false;
     }
 }
 

@@ -156,8 +156,7 @@ private:
 
 bool TPngReader::Open() {
     png_ = png_create_read_struct_2(PNG_LIBPNG_VER_STRING, &session_, LeavePngLibrary,
-                                    IgnorePngWarning, &session_, AllocatePngMemory,
-                                    FreePngMemory);
+                                    IgnorePngWarning, &session_, AllocatePngMemory, FreePngMemory);
     if (png_ == nullptr) {
         return false;
     }
@@ -288,8 +287,7 @@ void TPngReader::KeepExif() {
     png_bytep block = nullptr;
     png_uint_32 size = 0;
     const bool is_kept = params_.fPNG_Chunks.Find(kPngChunkExif) != nullptr;
-    if (is_kept || !params_.fGetMetaData ||
-        png_get_eXIf_1(png_, info_, &size, &block) == 0) {
+    if (is_kept || !params_.fGetMetaData || png_get_eXIf_1(png_, info_, &size, &block) == 0) {
         return;
     }
     TZmPngChunk chunk;
@@ -311,9 +309,9 @@ void TPngReader::FillBackground() {
         params_.fPNG_Background = TRGB{gray, gray, gray};
         return;
     }
-    params_.fPNG_Background = TRGB{ScaleSampleTo8(background->blue, depth),
-                                   ScaleSampleTo8(background->green, depth),
-                                   ScaleSampleTo8(background->red, depth)};
+    params_.fPNG_Background =
+        TRGB{ScaleSampleTo8(background->blue, depth), ScaleSampleTo8(background->green, depth),
+             ScaleSampleTo8(background->red, depth)};
 }
 
 void TPngReader::FillResolution() {
@@ -403,8 +401,8 @@ bool TPngReader::PrepareBitmap() {
     if (format == zm8p) {
         for (std::int32_t i = 0; i < 256; ++i) {
             const bool is_used = i < params_.fColorMapCount;
-            bitmap_.SetPalette(i, is_used ? params_.fColorMap[static_cast<std::size_t>(i)]
-                                          : TRGB{});
+            bitmap_.SetPalette(i,
+                               is_used ? params_.fColorMap[static_cast<std::size_t>(i)] : TRGB{});
         }
         bitmap_.SetPaletteUsed(params_.fColorMapCount);
     }

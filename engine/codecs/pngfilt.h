@@ -22,4 +22,9 @@ void ReadPNGStream(TStream& stream, TZmBitmap& bitmap, TIOParams& params, bool p
 void WritePNGStream(TStream& stream, TZmBitmap& bitmap, TIOParams& params, TZmMask* alpha,
                     TProgressRec& progress);
 
+/// The same with the bitmap's own alpha plane, row by row; pixels that the plane does not cover
+/// are opaque.
+void WritePNGStreamWithAlpha(TStream& stream, TZmBitmap& bitmap, TIOParams& params,
+                             TProgressRec& progress);
+
 }  // namespace zm

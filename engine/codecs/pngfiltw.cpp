@@ -54,18 +54,12 @@ void PNGCBAPI FlushPngBytes(png_structp) {}
 
 int FilterFlags(TIOPNGFilter filter) {
     switch (filter) {
-        case ioPNG_FILTER_SUB:
-            return PNG_FILTER_SUB;
-        case ioPNG_FILTER_PAETH:
-            return PNG_FILTER_PAETH;
-        case ioPNG_FILTER_UP:
-            return PNG_FILTER_UP;
-        case ioPNG_FILTER_AVG:
-            return PNG_FILTER_AVG;
-        case ioPNG_FILTER_ALL:
-            return PNG_ALL_FILTERS;
-        default:
-            return PNG_FILTER_NONE;
+        case ioPNG_FILTER_SUB: return PNG_FILTER_SUB;
+        case ioPNG_FILTER_PAETH: return PNG_FILTER_PAETH;
+        case ioPNG_FILTER_UP: return PNG_FILTER_UP;
+        case ioPNG_FILTER_AVG: return PNG_FILTER_AVG;
+        case ioPNG_FILTER_ALL: return PNG_ALL_FILTERS;
+        default: return PNG_FILTER_NONE;
     }
 }
 
@@ -85,16 +79,95 @@ png_uint_32 PixelsPerMeter(std::int32_t dpi) {
     return static_cast<png_uint_32>(RoundHalfEven(std::max(dpi, 0) * 100.0 / 2.54));
 }
 
+/// The alpha of an image, a byte a pixel, from a mask or from a plane. It is there when not all of
+/// it is opaque.
+class TPngAlpha {
+public:
+    TPngAlpha() = default;
+    /// A mask of another size than the image's does not count.
+    TPngAlpha(TZmMask& mask, const TZmBitmap& bitmap);
+    explicit TPngAlpha(TZmBitmap& bitmap);
+    bool IsThere() const { return mask_ != nullptr || plane_ != nullptr; }
+    /// Values of a row of the image, valid until the next call; nil when it cannot be reached.
+    const std::uint8_t* GetRow(std::int32_t y);
+
+private:
+    const std::uint8_t* PadPlaneRow(std::int32_t y);
+
+    TZmMask* mask_ = nullptr;
+    TZmBitmap* plane_ = nullptr;
+    std::vector<std::uint8_t> row_;  // empty where the source's own rows serve
+};
+
+TPngAlpha::TPngAlpha(TZmMask& mask, const TZmBitmap& bitmap) {
+    if (mask.GetFull() || mask.GetWidth() != bitmap.GetWidth() ||
+        mask.GetHeight() != bitmap.GetHeight()) {
+        return;
+    }
+    mask_ = &mask;
+    if (mask.GetBitsPerPixel() != 8) {
+        row_.resize(static_cast<std::size_t>(mask.GetWidth()));
+    }
+}
+
+/// The plane's mark of being full may be out of date: its values decide.
+TPngAlpha::TPngAlpha(TZmBitmap& bitmap) {
+    TZmBitmap* const plane = bitmap.GetAlphaChannelRaw();
+    if (plane == nullptr || plane->GetPixelFormat() != zm8g) {
+        return;
+    }
+    const auto covered =
+        static_cast<std::size_t>(std::min(plane->GetWidth(), bitmap.GetWidth()));
+    const std::int32_t rows = std::min(plane->GetHeight(), bitmap.GetHeight());
+    bool is_full = true;
+    for (std::int32_t y = 0; is_full && y < rows; ++y) {
+        const std::uint8_t* const row = plane->GetScanLine(y);
+        is_full = row != nullptr && std::all_of(row, row + covered, [](std::uint8_t alpha) {
+            return alpha == 255;
+        });
+    }
+    if (is_full) {
+        return;
+    }
+    plane_ = plane;
+    if (plane->GetWidth() < bitmap.GetWidth() || plane->GetHeight() < bitmap.GetHeight()) {
+        row_.resize(static_cast<std::size_t>(bitmap.GetWidth()));
+    }
+}
+
+const std::uint8_t* TPngAlpha::GetRow(std::int32_t y) {
+    if (plane_ != nullptr) {
+        return row_.empty() ? plane_->GetScanLine(y) : PadPlaneRow(y);
+    }
+    const std::uint8_t* const mask_row = mask_->GetScanLine(y);
+    if (row_.empty() || mask_row == nullptr) {
+        return mask_row;
+    }
+    for (std::size_t x = 0; x < row_.size(); ++x) {
+        row_[x] = (mask_row[x / 8] >> (7 - x % 8) & 1) != 0 ? 255 : 0;
+    }
+    return row_.data();
+}
+
+const std::uint8_t* TPngAlpha::PadPlaneRow(std::int32_t y) {
+    std::fill(row_.begin(), row_.end(), std::uint8_t{255});
+    if (y < plane_->GetHeight()) {
+        const std::uint8_t* const values = plane_->GetScanLine(y);
+        if (values == nullptr) {
+            return nullptr;
+        }
+        const auto covered = static_cast<std::size_t>(plane_->GetWidth());
+        std::memcpy(row_.data(), values, std::min(covered, row_.size()));
+    }
+    return row_.data();
+}
+
 class TPngWriter {
 public:
-    TPngWriter(TStream& stream, TZmBitmap& bitmap, TIOParams& params, TZmMask* alpha,
+    TPngWriter(TStream& stream, TZmBitmap& bitmap, TIOParams& params, TPngAlpha& alpha,
                TProgressRec& progress)
-        : bitmap_(bitmap), params_(params), progress_(progress) {
+        : bitmap_(bitmap), params_(params), progress_(progress), alpha_(alpha) {
         session_.stream = &stream;
-        if (alpha != nullptr && !alpha->GetFull() && alpha->GetWidth() == bitmap.GetWidth() &&
-            alpha->GetHeight() == bitmap.GetHeight()) {
-            alpha_ = alpha;
-        }
     }
     ~TPngWriter() { png_destroy_write_struct(&png_, &info_); }
     TPngWriter(const TPngWriter&) = delete;
@@ -122,7 +195,6 @@ private:
     const std::uint8_t* MakeGray16Row(std::int32_t row);
     const std::uint8_t* MakeIndexRow(std::int32_t row);
     const std::uint8_t* MakeAlphaRow(std::int32_t row);
-    std::uint8_t AlphaAt(const std::uint8_t* mask_row, std::int32_t x) const;
 
     TPngSession session_;
     png_structp png_ = nullptr;
@@ -130,7 +202,7 @@ private:
     TZmBitmap& bitmap_;
     TIOParams& params_;
     TProgressRec& progress_;
-    TZmMask* alpha_ = nullptr;
+    TPngAlpha& alpha_;
 
     PngRowKind kind_ = PngRowKind::kColors;
     int color_type_ = PNG_COLOR_TYPE_RGB;
@@ -149,8 +221,7 @@ private:
 
 void TPngWriter::Open() {
     png_ = png_create_write_struct_2(PNG_LIBPNG_VER_STRING, &session_, LeavePngLibrary,
-                                     IgnorePngWarning, &session_, AllocatePngMemory,
-                                     FreePngMemory);
+                                     IgnorePngWarning, &session_, AllocatePngMemory, FreePngMemory);
     if (png_ != nullptr) {
         info_ = png_create_info_struct(png_);
     }
@@ -165,15 +236,15 @@ void TPngWriter::Open() {
 /// asked. More samples: RGB of 8 bits.
 void TPngWriter::ChooseLayout() {
     if (params_.fSamplesPerPixel != 1) {
-        kind_ = alpha_ != nullptr ? PngRowKind::kColorsAndAlpha : PngRowKind::kColors;
-        color_type_ = alpha_ != nullptr ? PNG_COLOR_TYPE_RGB_ALPHA : PNG_COLOR_TYPE_RGB;
+        kind_ = alpha_.IsThere() ? PngRowKind::kColorsAndAlpha : PngRowKind::kColors;
+        color_type_ = alpha_.IsThere() ? PNG_COLOR_TYPE_RGB_ALPHA : PNG_COLOR_TYPE_RGB;
         return;
     }
     if (params_.fBitsPerSample == 1) {
         kind_ = PngRowKind::kBits;
         color_type_ = PNG_COLOR_TYPE_GRAY;
         bit_depth_ = 1;
-    } else if (alpha_ == nullptr && bitmap_.IsGrayScale()) {
+    } else if (!alpha_.IsThere() && bitmap_.IsGrayScale()) {
         color_type_ = PNG_COLOR_TYPE_GRAY;
         bit_depth_ = params_.fBitsPerSample > 8 ? 16 : 8;
         kind_ = bit_depth_ == 16 ? PngRowKind::kGray16 : PngRowKind::kGray8;
@@ -215,7 +286,7 @@ bool TPngWriter::PrepareBits() {
 
 /// With alpha entry 0 stands for what is transparent, and the others move up by one.
 void TPngWriter::PreparePalette() {
-    const std::int32_t wanted = alpha_ != nullptr ? 255 : 256;
+    const std::int32_t wanted = alpha_.IsThere() ? 255 : 256;
     quantizer_ = std::make_unique<TZmQuantizer>(bitmap_, color_map_, wanted);
     const auto present = static_cast<std::int32_t>(color_map_.size());
     const bool takes_all = bitmap_.GetPixelFormat() == zm8p;
@@ -231,16 +302,15 @@ std::int32_t TPngWriter::QuantizedIndex(TRGB color) {
     if (index >= 0 && index < colors_used_) {
         return index;
     }
-    const auto nearest =
-        std::min_element(color_map_.begin(), color_map_.end(), [color](TRGB a, TRGB b) {
-            return ColorDistance(a, color) < ColorDistance(b, color);
-        });
+    const auto nearest = std::min_element(
+        color_map_.begin(), color_map_.end(),
+        [color](TRGB a, TRGB b) { return ColorDistance(a, color) < ColorDistance(b, color); });
     return static_cast<std::int32_t>(nearest - color_map_.begin());
 }
 
 std::uint8_t TPngWriter::PaletteIndex(TRGB color) {
     if (last_index_ < 0 || color != last_color_) {
-        last_index_ = QuantizedIndex(color) + (alpha_ != nullptr ? 1 : 0);
+        last_index_ = QuantizedIndex(color) + (alpha_.IsThere() ? 1 : 0);
         last_color_ = color;
     }
     return static_cast<std::uint8_t>(last_index_);
@@ -252,7 +322,7 @@ void TPngWriter::SetPalette() {
     const auto add = [&entries, &count](TRGB color) {
         entries[count++] = png_color{color.r, color.g, color.b};
     };
-    if (alpha_ != nullptr) {
+    if (alpha_.IsThere()) {
         add(params_.fPNG_Background);
         const png_byte transparent = 0;
         png_set_tRNS(png_, info_, &transparent, 1, nullptr);
@@ -274,7 +344,7 @@ void TPngWriter::SetBackground() {
         background.gray = (color.r + color.g + color.b) / 3 >= 128 ? 1 : 0;
     } else if (kind_ == PngRowKind::kGray16) {
         background.gray = static_cast<png_uint_16>(color.r * 257);
-    } else if (kind_ == PngRowKind::kIndices && alpha_ == nullptr) {
+    } else if (kind_ == PngRowKind::kIndices && !alpha_.IsThere()) {
         background.index = PaletteIndex(color);  // with alpha entry 0 is the background itself
     }
     png_set_bKGD(png_, info_, &background);
@@ -295,8 +365,8 @@ void TPngWriter::SetHeaderChunks() {
     if (kind_ == PngRowKind::kIndices) {
         SetPalette();
     }
-    png_set_pHYs(png_, info_, PixelsPerMeter(params_.GetDpiX()),
-                 PixelsPerMeter(params_.GetDpiY()), PNG_RESOLUTION_METER);
+    png_set_pHYs(png_, info_, PixelsPerMeter(params_.GetDpiX()), PixelsPerMeter(params_.GetDpiY()),
+                 PNG_RESOLUTION_METER);
     png_set_filter(png_, PNG_FILTER_TYPE_BASE, FilterFlags(params_.fPNG_Filter));
     SetBackground();
     png_set_compression_level(png_, std::clamp(params_.fPNG_Compression, -1, 9));
@@ -324,13 +394,6 @@ bool TPngWriter::WriteHeader() {
         }
     }
     return RunPngGuarded(png_, [this] { SetHeaderChunks(); });
-}
-
-std::uint8_t TPngWriter::AlphaAt(const std::uint8_t* mask_row, std::int32_t x) const {
-    if (alpha_->GetBitsPerPixel() == 8) {
-        return mask_row[x];
-    }
-    return (mask_row[x / 8] >> (7 - x % 8) & 1) != 0 ? 255 : 0;
 }
 
 const std::uint8_t* TPngWriter::MakeGrayRow(std::int32_t row) {
@@ -362,17 +425,16 @@ const std::uint8_t* TPngWriter::MakeGray16Row(std::int32_t row) {
 }
 
 const std::uint8_t* TPngWriter::MakeIndexRow(std::int32_t row) {
-    if (bitmap_.GetPixelFormat() == zm8p && alpha_ == nullptr) {
+    if (bitmap_.GetPixelFormat() == zm8p && !alpha_.IsThere()) {
         return bitmap_.GetScanLine(row);
     }
     const TRGB* colors = rgb_rows_->GetRow(row);
-    const std::uint8_t* mask_row = alpha_ != nullptr ? alpha_->GetScanLine(row) : nullptr;
-    if (colors == nullptr || (alpha_ != nullptr && mask_row == nullptr)) {
+    const std::uint8_t* alpha_row = alpha_.IsThere() ? alpha_.GetRow(row) : nullptr;
+    if (colors == nullptr || (alpha_.IsThere() && alpha_row == nullptr)) {
         return nullptr;
     }
     for (std::size_t x = 0; x < row_.size(); ++x) {
-        const bool is_opaque =
-            mask_row == nullptr || AlphaAt(mask_row, static_cast<std::int32_t>(x)) == 255;
+        const bool is_opaque = alpha_row == nullptr || alpha_row[x] == 255;
         row_[x] = is_opaque ? PaletteIndex(colors[x]) : 0;
     }
     return row_.data();
@@ -380,8 +442,8 @@ const std::uint8_t* TPngWriter::MakeIndexRow(std::int32_t row) {
 
 const std::uint8_t* TPngWriter::MakeAlphaRow(std::int32_t row) {
     const TRGB* colors = rgb_rows_->GetRow(row);
-    const std::uint8_t* mask_row = alpha_->GetScanLine(row);
-    if (colors == nullptr || mask_row == nullptr) {
+    const std::uint8_t* alpha_row = alpha_.GetRow(row);
+    if (colors == nullptr || alpha_row == nullptr) {
         return nullptr;
     }
     std::uint8_t* target = row_.data();
@@ -390,7 +452,7 @@ const std::uint8_t* TPngWriter::MakeAlphaRow(std::int32_t row) {
         target[0] = colors[x].b;
         target[1] = colors[x].g;
         target[2] = colors[x].r;
-        target[3] = AlphaAt(mask_row, x);
+        target[3] = alpha_row[x];
         target += 4;
     }
     return row_.data();
@@ -401,16 +463,11 @@ const std::uint8_t* TPngWriter::MakeRow(std::int32_t row) {
     switch (kind_) {
         case PngRowKind::kBits:
             return (two_colors_ != nullptr ? *two_colors_ : bitmap_).GetScanLine(row);
-        case PngRowKind::kGray8:
-            return MakeGrayRow(row);
-        case PngRowKind::kGray16:
-            return MakeGray16Row(row);
-        case PngRowKind::kIndices:
-            return MakeIndexRow(row);
-        case PngRowKind::kColorsAndAlpha:
-            return MakeAlphaRow(row);
-        default:
-            return reinterpret_cast<const std::uint8_t*>(rgb_rows_->GetRow(row));
+        case PngRowKind::kGray8: return MakeGrayRow(row);
+        case PngRowKind::kGray16: return MakeGray16Row(row);
+        case PngRowKind::kIndices: return MakeIndexRow(row);
+        case PngRowKind::kColorsAndAlpha: return MakeAlphaRow(row);
+        default: return reinterpret_cast<const std::uint8_t*>(rgb_rows_->GetRow(row));
     }
 }
 
@@ -452,14 +509,11 @@ bool TPngWriter::WriteEnd() {
 
 bool WritePng(TPngWriter& writer) {
     writer.ChooseLayout();
-    return writer.PrepareRows() && writer.WriteHeader() && writer.WriteRows() &&
-           writer.WriteEnd();
+    return writer.PrepareRows() && writer.WriteHeader() && writer.WriteRows() && writer.WriteEnd();
 }
 
-}  // namespace
-
-void WritePNGStream(TStream& stream, TZmBitmap& bitmap, TIOParams& params, TZmMask* alpha,
-                    TProgressRec& progress) {
+void WriteGuarded(TStream& stream, TZmBitmap& bitmap, TIOParams& params, TPngAlpha& alpha,
+                  TProgressRec& progress) {
     bool is_written = false;
     TZmBufferedWriteStream buffered(&stream, kPngStreamBufferBytes);
     TPngWriter writer(buffered, bitmap, params, alpha, progress);
@@ -474,6 +528,20 @@ void WritePNGStream(TStream& stream, TZmBitmap& bitmap, TIOParams& params, TZmMa
     if (!is_written || buffered.HasFailed()) {
         *progress.Aborting = true;
     }
+}
+
+}  // namespace
+
+void WritePNGStream(TStream& stream, TZmBitmap& bitmap, TIOParams& params, TZmMask* alpha,
+                    TProgressRec& progress) {
+    TPngAlpha rows = alpha != nullptr ? TPngAlpha(*alpha, bitmap) : TPngAlpha();
+    WriteGuarded(stream, bitmap, params, rows, progress);
+}
+
+void WritePNGStreamWithAlpha(TStream& stream, TZmBitmap& bitmap, TIOParams& params,
+                             TProgressRec& progress) {
+    TPngAlpha rows(bitmap);
+    WriteGuarded(stream, bitmap, params, rows, progress);
 }
 
 }  // namespace zm

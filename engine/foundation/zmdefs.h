@@ -73,17 +73,17 @@ struct TRect {
 
 /// Pixel formats; the ordinal is persisted, so the order is fixed.
 enum TZmPixelFormat : std::uint8_t {
-    zmnull,     ///< no image
-    zm1g,       ///< black and white, most significant bit leftmost
-    zm8p,       ///< index into the palette
-    zm8g,       ///< grey
-    zm16g,      ///< grey, unsigned 16 bits
-    zm24RGB,    ///< TRGB
-    zm32f,      ///< grey, 32-bit float, 0 to 1
-    zmCMYK,     ///< TCMYK
-    zm48RGB,    ///< TRGB48
-    zmCIELab,   ///< TCIELab
-    zm32RGB,    ///< TRGBA
+    zmnull,    ///< no image
+    zm1g,      ///< black and white, most significant bit leftmost
+    zm8p,      ///< index into the palette
+    zm8g,      ///< grey
+    zm16g,     ///< grey, unsigned 16 bits
+    zm24RGB,   ///< TRGB
+    zm32f,     ///< grey, 32-bit float, 0 to 1
+    zmCMYK,    ///< TCMYK
+    zm48RGB,   ///< TRGB48
+    zmCIELab,  ///< TCIELab
+    zm32RGB,   ///< TRGBA
 };
 inline constexpr int kPixelFormatCount = 11;
 

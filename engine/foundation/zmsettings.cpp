@@ -20,10 +20,10 @@ struct TOpSysRow {
 };
 
 constexpr TOpSysRow kOpSysRows[] = {
-    {{1, 4, 0}, zmosWin95},    {{1, 4, 10}, zmosWin98},   {{1, 4, 90}, zmosWinME},
-    {{2, 4, 0}, zmosWinNT4},   {{2, 5, 0}, zmosWin2000},  {{2, 5, 1}, zmosWinXP},
-    {{2, 5, 2}, zmosWin2003},  {{2, 6, 0}, zmosWinVista}, {{2, 6, 1}, zmosWin7},
-    {{2, 6, 2}, zmosWin8},     {{2, 10, 0}, zmosWin10},
+    {{1, 4, 0}, zmosWin95},   {{1, 4, 10}, zmosWin98},   {{1, 4, 90}, zmosWinME},
+    {{2, 4, 0}, zmosWinNT4},  {{2, 5, 0}, zmosWin2000},  {{2, 5, 1}, zmosWinXP},
+    {{2, 5, 2}, zmosWin2003}, {{2, 6, 0}, zmosWinVista}, {{2, 6, 1}, zmosWin7},
+    {{2, 6, 2}, zmosWin8},    {{2, 10, 0}, zmosWin10},
 };
 
 /// ISO 639 code of a locale and its language. Codes that share a primary language id of the
@@ -34,20 +34,21 @@ struct TLocaleRow {
 };
 
 constexpr TLocaleRow kLocaleRows[] = {
-    {"ar", msArabic},    {"bs", msSerbian},  {"cs", msCzech},      {"da", msDanish},
-    {"de", msGerman},    {"el", msGreek},    {"es", msSpanish},    {"fa", msFarsi},
-    {"fi", msFinnish},   {"fr", msFrench},   {"hr", msSerbian},    {"hu", msHungarian},
-    {"it", msItalian},   {"ja", msJapanese}, {"ko", msKorean},     {"nb", msNorwegian},
-    {"nl", msDutch},     {"nn", msNorwegian}, {"no", msNorwegian}, {"pl", msPolish},
-    {"pt", msPortuguese}, {"ru", msRussian}, {"sr", msSerbian},    {"sv", msSwedish},
+    {"ar", msArabic},     {"bs", msSerbian},   {"cs", msCzech},     {"da", msDanish},
+    {"de", msGerman},     {"el", msGreek},     {"es", msSpanish},   {"fa", msFarsi},
+    {"fi", msFinnish},    {"fr", msFrench},    {"hr", msSerbian},   {"hu", msHungarian},
+    {"it", msItalian},    {"ja", msJapanese},  {"ko", msKorean},    {"nb", msNorwegian},
+    {"nl", msDutch},      {"nn", msNorwegian}, {"no", msNorwegian}, {"pl", msPolish},
+    {"pt", msPortuguese}, {"ru", msRussian},   {"sr", msSerbian},   {"sv", msSwedish},
     {"tr", msTurkish},
 };
 
 /// Languages whose translation is whole; the others are partial.
 constexpr TMsgLanguage kFullLanguages[] = {
-    msSystem, msEnglish, msArabic, msChinese,  msChineseTraditionalBig5, msDutch,
-    msFrench, msGerman,  msGreek,  msItalian,  msJapanese,               msKorean,
-    msPortuguese, msRussian, msSpanish, msTurkish,
+    msSystem,   msEnglish, msArabic,     msChinese, msChineseTraditionalBig5,
+    msDutch,    msFrench,  msGerman,     msGreek,   msItalian,
+    msJapanese, msKorean,  msPortuguese, msRussian, msSpanish,
+    msTurkish,
 };
 
 TZmOpSys OpSysOf(const std::optional<platform::TSystemVersion>& version) {
@@ -133,16 +134,15 @@ TZmZalmoGlobalSettings::TZmZalmoGlobalSettings()
 TZmZalmoGlobalSettings::~TZmZalmoGlobalSettings() = default;
 
 TMsgLanguage TZmZalmoGlobalSettings::CurrentMsgLanguage() const {
-    return fMsgLanguage != msSystem ? fMsgLanguage
-                                    : MsgLanguageOfLocale(platform::LocaleName());
+    return fMsgLanguage != msSystem ? fMsgLanguage : MsgLanguageOfLocale(platform::LocaleName());
 }
 
 std::vector<TMsgLanguage> TZmZalmoGlobalSettings::GetLanguages(bool full_only) const {
     std::vector<TMsgLanguage> languages;
     for (int ordinal = 0; ordinal < kMsgLanguageCount; ++ordinal) {
         const auto language = static_cast<TMsgLanguage>(ordinal);
-        if (!full_only || std::count(std::begin(kFullLanguages), std::end(kFullLanguages),
-                                     language) != 0) {
+        if (!full_only ||
+            std::count(std::begin(kFullLanguages), std::end(kFullLanguages), language) != 0) {
             languages.push_back(language);
         }
     }
@@ -220,8 +220,8 @@ TMsgLanguage MsgLanguageOfLocale(const std::string& locale_name) {
     const std::string code = name.substr(0, separator);
     if (code == "zh") {
         const std::string region = name.substr(std::min(name.size(), code.size() + 1));
-        const bool mainland = region == "cn" || region == "hans" || region == "hans_cn" ||
-                              region == "hans-cn";
+        const bool mainland =
+            region == "cn" || region == "hans" || region == "hans_cn" || region == "hans-cn";
         const bool taiwan = region == "tw" || region == "hant_tw" || region == "hant-tw";
         return mainland ? msChinese : taiwan ? msChineseTraditionalBig5 : msSystem;
     }

@@ -102,14 +102,13 @@ using TGIFLZWCompFunc = void (*)(TZmGIFLZWEncodeCall& call);
 /// One row of `row_bytes` bytes, or nil when the data ended or are bad. A first call with a nil
 /// state makes it; a call with a nil source and a live state frees it. `fill_order` 2 reverses
 /// the bits of each source byte.
-using TTIFFLZWDecompFunc = std::uint8_t* (*)(const std::uint8_t* source,
-                                             std::int32_t source_bytes, std::int32_t row_bytes,
-                                             TTIFFLZWDecodeState*& state,
+using TTIFFLZWDecompFunc = std::uint8_t* (*)(const std::uint8_t* source, std::int32_t source_bytes,
+                                             std::int32_t row_bytes, TTIFFLZWDecodeState*& state,
                                              std::int32_t fill_order);
 /// Compresses one row to the stream. A first call with a nil state makes it; a nil row flushes
 /// and frees it.
-using TTIFFLZWCompFunc = void (*)(const std::uint8_t* row, std::int32_t row_bytes,
-                                  TStream& output, TTIFFLZWEncodeState*& state);
+using TTIFFLZWCompFunc = void (*)(const std::uint8_t* row, std::int32_t row_bytes, TStream& output,
+                                  TTIFFLZWEncodeState*& state);
 
 /// Converts a row from a file's colour layout to the bitmap's.
 using TZmConvertColorFunction = void (*)(const TZmConvertColorCall& call);
@@ -325,9 +324,9 @@ public:
         kShortCutCtrl | 76, kShortCutCtrl | 69, kShortCutCtrl | 82, kShortCutCtrl | 74,
         kShortCutCtrl | 67, kShortCutCtrl | 88, kShortCutCtrl | 86, kShortCutCtrl | 70,
         kShortCutCtrl | 66, kShortCutCtrl | 73, kShortCutCtrl | 85, kShortCutCtrl | 71};
-    std::array<std::u16string, 11> MeasureUnits{u"pixels",     u"inches", u"km", u"m",
-                                                u"cm",         u"mm",     u"microns",
-                                                u"nanometers", u"feet",   u"yards", u"miles"};
+    std::array<std::u16string, 11> MeasureUnits{u"pixels", u"inches", u"km",      u"m",
+                                                u"cm",     u"mm",     u"microns", u"nanometers",
+                                                u"feet",   u"yards",  u"miles"};
 
 private:
     std::vector<TZmToolbar*> toolbars_;

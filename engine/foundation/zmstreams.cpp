@@ -34,8 +34,7 @@ std::int32_t ReadFrom(const std::uint8_t* data, std::int64_t size, std::int64_t&
     return moved;
 }
 
-std::string FailureText(const char* action, const std::u16string& name,
-                        const std::string& reason) {
+std::string FailureText(const char* action, const std::u16string& name, const std::string& reason) {
     return std::string("Cannot ") + action + " file \"" + Utf8FromUtf16(name) + "\". " + reason;
 }
 

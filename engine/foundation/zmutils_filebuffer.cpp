@@ -112,8 +112,8 @@ void TZmFileBuffer::DropIdleWindows(std::size_t kept) {
     auto idle = static_cast<std::size_t>(std::count_if(windows_.begin(), windows_.end(), is_idle));
     while (idle > kept) {
         // The least recently used one; windows in use sort behind all others.
-        const auto oldest = std::min_element(
-            windows_.begin(), windows_.end(), [&](const auto& a, const auto& b) {
+        const auto oldest =
+            std::min_element(windows_.begin(), windows_.end(), [&](const auto& a, const auto& b) {
                 return is_idle(a) != is_idle(b) ? is_idle(a) : a->last_use < b->last_use;
             });
         windows_.erase(oldest);
@@ -126,8 +126,7 @@ void TZmFileBuffer::DropWindows() {
     windows_.clear();
 }
 
-TZmFileBuffer::TWindow* TZmFileBuffer::FindWindow(std::int64_t position,
-                                                  std::int64_t size_bytes) {
+TZmFileBuffer::TWindow* TZmFileBuffer::FindWindow(std::int64_t position, std::int64_t size_bytes) {
     for (const auto& window : windows_) {
         if (window->Covers(position, size_bytes)) {
             return window.get();
@@ -152,8 +151,7 @@ TZmFileBuffer::TWindow* TZmFileBuffer::MapNewWindow(std::int64_t position,
 /// A new window for a request: the aligned one around it, or, when it crosses that one's end, one
 /// that begins as near before it as the system allows. Where addresses have run short, all idle
 /// windows go and the new one is as small as the request.
-TZmFileBuffer::TWindow* TZmFileBuffer::OpenWindow(std::int64_t position,
-                                                  std::int64_t size_bytes) {
+TZmFileBuffer::TWindow* TZmFileBuffer::OpenWindow(std::int64_t position, std::int64_t size_bytes) {
     const std::int64_t end = position + size_bytes;
     const std::int64_t nearest =
         AlignDown(position, static_cast<std::int64_t>(platform::WindowAlignment()));

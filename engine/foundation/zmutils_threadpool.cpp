@@ -16,8 +16,7 @@ namespace zm {
 /// A thread that is bound to one piece of work and starts later.
 class TZmExecutorThread {
 public:
-    explicit TZmExecutorThread(std::function<void()> exec_func)
-        : fExecFunc(std::move(exec_func)) {}
+    explicit TZmExecutorThread(std::function<void()> exec_func) : fExecFunc(std::move(exec_func)) {}
     ~TZmExecutorThread() { WaitFor(); }
     TZmExecutorThread(const TZmExecutorThread&) = delete;
     TZmExecutorThread& operator=(const TZmExecutorThread&) = delete;

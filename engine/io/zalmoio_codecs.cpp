@@ -9,6 +9,7 @@
 #include "engine/io/zalmoio_codecs_p.h"
 #include "engine/io/zmfiletypes.h"
 #include "engine/io/zmioparams.h"
+#include "engine/metadata/zmmetahooks.h"
 
 // The codecs by file type, and what each takes from the parameters and from the driver.
 namespace zm {
@@ -39,14 +40,7 @@ void ReadPNG(TZmLoadCall& call) {
 
 void WritePNG(TZmSaveCall& call) {
     call.params.fPNG_Background = RGBFromColor(call.background);
-    TZmMask alpha;
-    const bool has_alpha = call.bitmap.HasAlphaChannel();
-    if (has_alpha) {
-        call.bitmap.CopyToTZmMask(alpha);
-        alpha.SyncFull();
-    }
-    WritePNGStream(call.stream, call.bitmap, call.params, has_alpha ? &alpha : nullptr,
-                   call.progress);
+    WritePNGStreamWithAlpha(call.stream, call.bitmap, call.params, call.progress);
     call.background = ColorFromRGB(call.params.fPNG_Background);
 }
 
@@ -58,6 +52,9 @@ void ReadJPEG(TZmLoadCall& call) {
 }
 
 void WriteJPEG(TZmSaveCall& call) {
+    if (const auto prepare = MetadataHooks().prepare_jpeg_markers; prepare != nullptr) {
+        prepare(call.params);
+    }
     WriteJPEGStream(call.stream, call.bitmap, call.params, call.progress);
 }
 
@@ -80,7 +77,7 @@ constexpr TZmLoadCodec kLoadCodecs[] = {
 
 constexpr TZmSaveCodec kSaveCodecs[] = {
     {ioBMP, kAllFormats, WriteBMP},
-    {ioJPEG, kColorOrTwoLevels, WriteJPEG},
+    {ioJPEG, kAllFormats, WriteJPEG},
     {ioPNG, kAllFormats, WritePNG},
     {ioWBMP, kAllFormats, WriteWBMP},
 };

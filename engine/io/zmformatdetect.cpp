@@ -23,6 +23,10 @@ bool IsJPEGBehindRawSignature(TDetectSource& source) {
     return !HasRawSignature(source) && FindJPEGStart(source) >= 0;
 }
 
+bool IsPlainTIFF(TDetectSource& source) {
+    return IsTIFF(source) && !IsCameraRawTIFF(source);
+}
+
 // Formats without a reliable magic stand behind those that have one; the order decides.
 constexpr TDetectTest kTests[] = {
     {12, [](TDetectSource& s) { return HasZeroPaddedMagic(s, "JFIF", 12); }, ioJPEG},
@@ -32,6 +36,9 @@ constexpr TDetectTest kTests[] = {
     {14, IsBMP, ioBMP},
     {128, IsPCX, ioPCX},
     {12, [](TDetectSource& s) { return HasZeroPaddedMagic(s, "TIFF", 12); }, ioTIFF},
+    {kNoLimit, IsHDPhoto, ioHDP},
+    {kNoLimit, [](TDetectSource& s) { return IsPlainTIFF(s) && HasRawSignature(s); }, ioRAW},
+    {kNoLimit, IsPlainTIFF, ioTIFF},
     {8, IsPNG, ioPNG},
     {kNoLimit, IsDICOM, ioDICOM},
     {kNoLimit, [](TDetectSource& s) { return IsIconDirectory(s, 1); }, ioICO},

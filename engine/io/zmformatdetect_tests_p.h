@@ -54,6 +54,11 @@ bool HasZeroPaddedMagic(TDetectSource& source, std::string_view magic, std::int6
 bool IsGIF(TDetectSource& source);
 bool IsBMP(TDetectSource& source);
 bool IsPCX(TDetectSource& source);
+/// "II" order only, with the five tags that every such file has.
+bool IsHDPhoto(TDetectSource& source);
+bool IsTIFF(TDetectSource& source);
+/// A TIFF by its form that holds a camera's raw data; asked of what IsTIFF has recognised.
+bool IsCameraRawTIFF(TDetectSource& source);
 bool IsPNG(TDetectSource& source);
 bool IsDICOM(TDetectSource& source);
 bool IsIconDirectory(TDetectSource& source, std::uint16_t type_word);

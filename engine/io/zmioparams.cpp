@@ -148,6 +148,10 @@ void TIOParams::ResetInfo(TZmMetaInfoItems items) {
     }
     if (wanted.Contains(zmrXMP)) {
         SetXMP_Info({});
+        fPNG_Chunks.DeleteXmp();
+    }
+    if (wanted.Contains(zmrICC)) {
+        fPNG_Chunks.Delete(kPngChunkProfile);
     }
 }
 
@@ -163,6 +167,7 @@ void TIOParams::ResetOtherTextMeta() {
     }
     fZMN_Description.clear();
     fWIC_CodecInfo = {};
+    fPNG_Chunks.DeletePlainTexts();
 }
 
 bool TIOParams::HasOtherTextMeta() const {
@@ -204,6 +209,7 @@ TZmMetaInfoItems TIOParams::ContainsInfo() const {
 void TIOParams::ResetEXIF() {
     static_cast<TZmExifFields&>(*this) = TZmExifFields{};
     fEXIF_Bitmap.reset();
+    fPNG_Chunks.Delete(kPngChunkExif);
     for (std::int32_t i = 0; i < fJPEG_MarkerList.Count(); ++i) {
         if (fJPEG_MarkerList.GetMarkerType(i) == kMarkerApp1 &&
             IsExifMarkerData(fJPEG_MarkerList.GetMarkerData(i))) {

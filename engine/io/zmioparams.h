@@ -48,8 +48,8 @@ public:
     void ResetInfo(TZmMetaInfoItems items = TZmMetaInfoItems());
     /// The kinds of information that are present.
     TZmMetaInfoItems ContainsInfo() const;
-    /// EXIF fields to those of an image without EXIF, the thumbnail freed, and the first EXIF
-    /// marker taken out of the marker list.
+    /// EXIF fields to those of an image without EXIF, the thumbnail freed, the first EXIF marker
+    /// taken out of the marker list and the EXIF block out of the kept PNG chunks.
     void ResetEXIF();
     /// Copies all fields; the owner stays. Objects are cloned.
     void Assign(const TIOParams& source);

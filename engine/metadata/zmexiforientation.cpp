@@ -66,8 +66,8 @@ std::optional<TOrientationPlace> TBlockReader::Find() {
         const std::uint32_t count = U32();
         const std::size_t offset = bytes_.Position();
         const std::uint16_t value = U16();
-        const bool is_usable = type == kTypeShort && count == 1 &&
-                               value >= kOrientationUpright && value <= kOrientationLast;
+        const bool is_usable = type == kTypeShort && count == 1 && value >= kOrientationUpright &&
+                               value <= kOrientationLast;
         return is_usable ? std::optional(TOrientationPlace{offset, is_big_endian_, value})
                          : std::nullopt;
     }

@@ -17,9 +17,9 @@ enum TZmPngChunkKind : std::uint8_t {
 /// A kept chunk. What the file compressed is unpacked here.
 struct TZmPngChunk {
     TZmPngChunkKind kind = kPngChunkText;
-    std::string key;             ///< keyword of a text, name of a profile; Latin-1
-    std::string language;        ///< of a text: its language tag, empty when the file has none
-    std::string translated_key;  ///< of a text: the keyword in that language, UTF-8
+    std::string key;                 ///< keyword of a text, name of a profile; Latin-1
+    std::string language;            ///< of a text: its language tag, empty when the file has none
+    std::string translated_key;      ///< of a text: the keyword in that language, UTF-8
     std::vector<std::uint8_t> data;  ///< of a text: UTF-8
 
     friend bool operator==(const TZmPngChunk&, const TZmPngChunk&) = default;

@@ -54,8 +54,7 @@ std::u16string ResolveLinkTarget(const std::u16string& target_name);
 
 /// Puts `temporary_name` in the place of `target_name` in one step, keeping an existing
 /// target's permissions; false when refused, and both files then stay as they are.
-bool ReplaceFileAtomically(const std::u16string& temporary_name,
-                           const std::u16string& target_name);
+bool ReplaceFileAtomically(const std::u16string& temporary_name, const std::u16string& target_name);
 
 /// True when a file (not a folder) of that name exists; links are followed.
 bool FileExists(const std::u16string& name);
@@ -69,7 +68,7 @@ std::u16string AbsolutePath(const std::u16string& name);
 std::u16string TemporaryFolder();
 
 struct TFileTimes {
-    std::int64_t created_ns = 0;   ///< nanoseconds since 1970-01-01 UTC
+    std::int64_t created_ns = 0;  ///< nanoseconds since 1970-01-01 UTC
     std::int64_t modified_ns = 0;
     std::int64_t accessed_ns = 0;
 };

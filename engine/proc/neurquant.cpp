@@ -76,10 +76,9 @@ private:
             return std::abs(entry.r - color.r) + std::abs(entry.g - color.g) +
                    std::abs(entry.b - color.b);
         };
-        const auto nearest =
-            std::min_element(colors_.begin(), colors_.end(), [&](TRGB a, TRGB b) {
-                return distance(a) < distance(b);
-            });
+        const auto nearest = std::min_element(colors_.begin(), colors_.end(), [&](TRGB a, TRGB b) {
+            return distance(a) < distance(b);
+        });
         return static_cast<std::int32_t>(nearest - colors_.begin());
     }
 
@@ -200,8 +199,8 @@ void TZmQuantizer::TState::RunMethod(TZmBitmap& source, std::vector<TRGB>& color
         fFoundColors = boxes->GetBoxCount();
         return;
     }
-    neural = std::make_unique<TNeuralPalette>(source, fNCol,
-                                              ZmGlobalSettings().fColorReductionQuality);
+    neural =
+        std::make_unique<TNeuralPalette>(source, fNCol, ZmGlobalSettings().fColorReductionQuality);
     neural->WritePalette(color_map);
 }
 
@@ -221,8 +220,8 @@ void TZmQuantizer::TState::FillPalette(TZmBitmap& source, std::vector<TRGB>& col
 }
 
 std::int32_t TZmQuantizer::TState::FindInOwnPalette(TRGB color) const {
-    return static_cast<std::int32_t>(
-        std::find(own_palette.begin(), own_palette.end(), color) - own_palette.begin());
+    return static_cast<std::int32_t>(std::find(own_palette.begin(), own_palette.end(), color) -
+                                     own_palette.begin());
 }
 
 TZmQuantizer::TZmQuantizer(TZmBitmap& source, std::vector<TRGB>& color_map,

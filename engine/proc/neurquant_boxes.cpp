@@ -179,9 +179,9 @@ bool TBoxPalette::SplitBox(std::size_t index) {
 
 void TBoxPalette::SplitBoxes(std::int32_t color_count) {
     while (GetBoxCount() < color_count) {
-        const auto widest = std::max_element(
-            boxes_.begin(), boxes_.end(),
-            [](const TBox& a, const TBox& b) { return a.variance < b.variance; });
+        const auto widest =
+            std::max_element(boxes_.begin(), boxes_.end(),
+                             [](const TBox& a, const TBox& b) { return a.variance < b.variance; });
         if (!(widest->variance > 0)) {
             return;
         }

@@ -15,7 +15,7 @@
 namespace zm {
 namespace {
 
-constexpr std::int32_t kColorBits = 4;       // fraction of a channel
+constexpr std::int32_t kColorBits = 4;        // fraction of a channel
 constexpr std::int32_t kInitialFreq = 65536;  // shared by all neurons
 constexpr std::int32_t kFreqStep = 64;
 constexpr std::int32_t kBiasStep = 65536;
@@ -74,8 +74,7 @@ TContestResult RunContestPlain(const TContestView& neurons, std::int32_t b, std:
     std::int32_t least_biased = kMaxInt32;
     for (std::size_t i = 0; i < neurons.count; ++i) {
         const std::int32_t distance = std::abs(neurons.blue[i] - b) +
-                                      std::abs(neurons.green[i] - g) +
-                                      std::abs(neurons.red[i] - r);
+                                      std::abs(neurons.green[i] - g) + std::abs(neurons.red[i] - r);
         if (distance < least_distance) {
             least_distance = distance;
             result.closest = static_cast<std::int32_t>(i);
@@ -146,8 +145,7 @@ void TNeuralPalette::Train(TZmBitmap& source, std::int32_t sampling_factor) {
     take_radius();
     for (std::int64_t i = 1; i <= samples; ++i) {
         const TRGB color = sampler.Next();
-        const TEntry sample{color.b << kColorBits, color.g << kColorBits, color.r << kColorBits,
-                            0};
+        const TEntry sample{color.b << kColorBits, color.g << kColorBits, color.r << kColorBits, 0};
         const std::int32_t winner = Contest(sample.b, sample.g, sample.r);
         MoveWinner(winner, sample);
         MoveNeighbours(winner, sample);
@@ -186,8 +184,7 @@ void TNeuralPalette::MoveWinner(std::int32_t neuron, const TEntry& sample) {
     move(red_[At(neuron)], sample.r);
 }
 
-void TNeuralPalette::MoveNeighbour(std::int32_t neuron, std::int32_t power,
-                                   const TEntry& sample) {
+void TNeuralPalette::MoveNeighbour(std::int32_t neuron, std::int32_t power, const TEntry& sample) {
     const auto move = [power](std::int32_t& value, std::int32_t target) {
         std::int32_t product = (value - target) * power;
         product += product < 0 ? (1 << kRadiusPowerShift) - 1 : 0;  // toward zero
@@ -229,10 +226,9 @@ void TNeuralPalette::BuildGreenIndex() {
     std::int32_t run_start = 0;
     for (std::int32_t i = 0; i < count_; ++i) {
         const auto rest = sorted_.begin() + i;
-        std::iter_swap(rest, std::min_element(rest, sorted_.end(),
-                                              [](const TEntry& a, const TEntry& b) {
-                                                  return a.g < b.g;
-                                              }));
+        std::iter_swap(
+            rest, std::min_element(rest, sorted_.end(),
+                                   [](const TEntry& a, const TEntry& b) { return a.g < b.g; }));
         const std::int32_t green = rest->g;
         if (green != previous) {
             green_index_[At(previous)] = (run_start + i) >> 1;

@@ -90,7 +90,7 @@ private:
     std::vector<std::int32_t> bias_;
     std::vector<std::int32_t> radius_power_;
     std::int32_t alpha_ = 0;
-    std::int32_t radius_ = 0;  // in neurons; 0 moves the winner only
+    std::int32_t radius_ = 0;     // in neurons; 0 moves the winner only
     std::vector<TEntry> sorted_;  // by green
     std::array<std::int32_t, 256> green_index_{};
 };
@@ -110,7 +110,7 @@ private:
     static constexpr std::int32_t kLevels = 32;
 
     struct TBox {
-        std::array<std::int32_t, 3> low{};                          // inclusive
+        std::array<std::int32_t, 3> low{};                            // inclusive
         std::array<std::int32_t, 3> high{kLevels, kLevels, kLevels};  // exclusive
         std::int64_t count = 0;
         std::array<double, 3> mean{};

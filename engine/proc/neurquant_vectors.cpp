@@ -27,15 +27,14 @@ TContestResult FindWinners(const TContestView& neurons, std::int32_t b, std::int
     auto winner = closest;
     const std::size_t lanes = hn::Lanes(tag);
     for (std::size_t i = 0; i < neurons.count; i += lanes) {
-        const auto distance = hn::Add(
-            hn::Add(hn::Abs(hn::Sub(hn::LoadU(tag, neurons.blue + i), blue)),
-                    hn::Abs(hn::Sub(hn::LoadU(tag, neurons.green + i), green))),
-            hn::Abs(hn::Sub(hn::LoadU(tag, neurons.red + i), red)));
+        const auto distance =
+            hn::Add(hn::Add(hn::Abs(hn::Sub(hn::LoadU(tag, neurons.blue + i), blue)),
+                            hn::Abs(hn::Sub(hn::LoadU(tag, neurons.green + i), green))),
+                    hn::Abs(hn::Sub(hn::LoadU(tag, neurons.red + i), red)));
         const auto bias = hn::LoadU(tag, neurons.bias + i);
         const auto freq = hn::LoadU(tag, neurons.freq + i);
         const auto biased = hn::Sub(distance, hn::ShiftRight<kBiasShift>(bias));
-        closest = hn::Min(closest,
-                          hn::Add(hn::ShiftLeft<kContestNumberBits>(distance), number));
+        closest = hn::Min(closest, hn::Add(hn::ShiftLeft<kContestNumberBits>(distance), number));
         winner = hn::Min(winner, hn::Add(hn::ShiftLeft<kContestNumberBits>(biased), number));
         const auto decay = hn::ShiftRight<kBetaShift>(freq);
         hn::StoreU(hn::Sub(freq, decay), tag, neurons.freq + i);

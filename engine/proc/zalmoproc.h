@@ -6,6 +6,7 @@
 #include <string>
 #include <vector>
 
+#include "engine/bitmap/zmmask.h"
 #include "engine/bitmap/zmxBitmaps.h"
 #include "engine/foundation/zmdefs.h"
 #include "engine/proc/zmdither.h"
@@ -89,24 +90,40 @@ public:
     void SetOnProgress(TZmBitmapProgressEvent event) { fOnProgress = std::move(event); }
     void SetOnFinishWork(TZmNotifyEvent event) { fOnFinishWork = std::move(event); }
 
-    // Selection of a bitmap without a view, by rectangle (right and bottom exclusive).
+    // Selection of a bitmap without a view; a new one takes the place of the last.
+    /// By rectangle, right and bottom exclusive.
     void Select(const TRect& rect);
-    void Deselect() { fSelected = false; }
+    /// By a mask whose corner lies at the image's, which is copied. An empty one selects nothing,
+    /// as Deselect. Raises std::bad_alloc without room.
+    void SelectMask(TZmMask& mask);
+    void Deselect();
     /// Region to work on, x2 and y2 exclusive: the whole bitmap, and False, without a selection
-    /// or with an empty one. A selection beside the bitmap gives an empty region, and True.
-    bool GetReSel(std::int32_t& x1, std::int32_t& y1, std::int32_t& x2, std::int32_t& y2);
+    /// or with an empty one. A selection beside the bitmap gives an empty region, and True. `mask`
+    /// is that of a selection by mask, with the region around its pixels, otherwise nil; it stays
+    /// valid until the selection changes.
+    bool GetReSel(std::int32_t& x1, std::int32_t& y1, std::int32_t& x2, std::int32_t& y2,
+                  TZmMask*& mask);
 
     // Frame of an operation.
     /// True when the operation may run; x2, y2 are exclusive limits. Saves undo first when that
-    /// is on. A missing bitmap raises EZmException.
-    bool BeginImageProcessing(const TZmPixelFormatSet& allowed, std::int32_t& x1,
-                              std::int32_t& y1, std::int32_t& x2, std::int32_t& y2,
-                              const std::u16string& op_name, TZmBitmap*& proc_bitmap,
-                              std::int32_t operation);
-    void EndImageProcessing(TZmBitmap* proc_bitmap);
-    /// For operations that only read: no undo is saved and nothing goes back.
+    /// is on. A missing bitmap raises EZmException. For operations that take selections: with a
+    /// selection by mask `proc_bitmap` is a copy of the region, with its alpha, which stays the
+    /// processor's and lives until the operation ends; otherwise it is the attached bitmap. False
+    /// as well when no selected pixel lies on the image, or there is no room for the copy.
+    bool BeginImageProcessing(const TZmPixelFormatSet& allowed, std::int32_t& x1, std::int32_t& y1,
+                              std::int32_t& x2, std::int32_t& y2, const std::u16string& op_name,
+                              TZmBitmap*& proc_bitmap, TZmMask*& mask, std::int32_t operation);
+    /// For operations that do not take selections: they work on the attached bitmap.
+    bool BeginImageProcessing(const TZmPixelFormatSet& allowed, std::int32_t& x1, std::int32_t& y1,
+                              std::int32_t& x2, std::int32_t& y2, const std::u16string& op_name,
+                              TZmBitmap*& proc_bitmap, std::int32_t operation);
+    /// Ends what the last Begin started, with what that gave: a copy is written back through the
+    /// mask, pixels and alpha, and freed.
+    void EndImageProcessing(TZmBitmap* proc_bitmap, TZmMask* mask = nullptr);
+    /// For operations that only read, with selections: no undo is saved and nothing goes back.
     bool BeginImageAnalysis(const TZmPixelFormatSet& allowed, std::int32_t& x1, std::int32_t& y1,
-                            std::int32_t& x2, std::int32_t& y2, TZmBitmap*& proc_bitmap);
+                            std::int32_t& x2, std::int32_t& y2, TZmBitmap*& proc_bitmap,
+                            TZmMask*& mask);
     void EndImageAnalysis(TZmBitmap* proc_bitmap);
 
     // Undo. Positions count back from the latest item (0); one outside does nothing.
@@ -186,14 +203,16 @@ public:
     /// zmdtSolid cuts at the automatic level, zmdtOrdered8x8 as the format conversion does. Other
     /// formats ignore both types. False for what cannot be converted so, which
     /// `check_parameters_only` only asks, and when there is no room.
-    bool ConvertTo(TZmPixelFormat format, TZmPaletteType palette_type,
-                   TZmDitherType dither_type, bool check_parameters_only);
+    bool ConvertTo(TZmPixelFormat format, TZmPaletteType palette_type, TZmDitherType dither_type,
+                   bool check_parameters_only);
 
 private:
     void ReduceColors(const std::u16string& caption, std::int32_t operation,
                       const std::function<void(TZmBitmap& image)>& reduce);
     bool MakeConsistent(const TZmPixelFormatSet& allowed, bool check_view);
     void RequireBitmap() const;
+    void SaveUndoOfOperation(const std::u16string& caption, std::int32_t operation);
+    void CutRegion(std::int32_t& x1, std::int32_t& y1, std::int32_t& x2, std::int32_t& y2);
     std::unique_ptr<TZmBitmap> CopyState(TZmUndoSource source);
     void StoreItem(TZmUndoStore& store, std::unique_ptr<TZmBitmap> item,
                    const TZmUndoStoreInfo& info);
@@ -209,6 +228,10 @@ private:
     bool fAutoConvertFormat = true;
     bool fSelected = false;
     TRect fSelectedRect;
+    /// The selection by mask, never an empty one.
+    std::unique_ptr<TZmMask> fSelectionMask;
+    /// The copy of the masked region while an operation runs.
+    std::unique_ptr<TZmBitmap> fRegionBitmap;
     TZmUndoStore fUndoList;
     TZmUndoStore fRedoList;
     TZmLocation fUndoLocation = zmFile;

@@ -57,8 +57,8 @@ void TZmBitmap::TakeOver(TZmBitmap& source) {
 
 void TZmBitmap::Resample(std::int32_t new_width, std::int32_t new_height, TResampleFilter filter,
                          bool maintain_aspect_ratio, bool shrink_only) {
-    const TZmImageSize size = CalcResampleSize(new_width, new_height, GetWidth(), GetHeight(),
-                                               maintain_aspect_ratio);
+    const TZmImageSize size =
+        CalcResampleSize(new_width, new_height, GetWidth(), GetHeight(), maintain_aspect_ratio);
     if (IsEmpty() || size.width < 1 || size.height < 1) {
         return;
     }
@@ -129,9 +129,8 @@ void TZalmoProc::ResampleTo(TZmBitmap* target, std::int32_t new_width, std::int3
         !MakeConsistent(TZmPixelFormatSet(), /*check_view=*/false) || fZmBitmap->IsEmpty()) {
         return;
     }
-    const TZmImageSize size =
-        CalcResampleSize(new_width, new_height, fZmBitmap->GetWidth(), fZmBitmap->GetHeight(),
-                         maintain_aspect_ratio);
+    const TZmImageSize size = CalcResampleSize(new_width, new_height, fZmBitmap->GetWidth(),
+                                               fZmBitmap->GetHeight(), maintain_aspect_ratio);
     if (PrepareTarget(*fZmBitmap, *target, size) &&
         !ResampleBitmapInto(*fZmBitmap, *target, filter, this, fOnProgress)) {
         target->FreeImage(/*free_alpha=*/true);

@@ -106,8 +106,8 @@ bool ResampleAsColor(TZmBitmap& source, TZmBitmap& target, TResampleFilter filte
 }
 
 /// Every format but zm1g.
-bool ResampleColors(TZmBitmap& source, TZmBitmap& target, TResampleFilter filter,
-                    TZmBitmap* alpha, const TResampleListener& listener) {
+bool ResampleColors(TZmBitmap& source, TZmBitmap& target, TResampleFilter filter, TZmBitmap* alpha,
+                    const TResampleListener& listener) {
     const TZmPixelFormat format = source.GetPixelFormat();
     const bool same_format = target.GetPixelFormat() == format;
     if (source.GetWidth() == 1 && source.GetHeight() == 1) {
@@ -166,8 +166,7 @@ TZmBitmap* FitTargetPlane(TZmBitmap& target) {
     if (plane == nullptr) {
         return nullptr;
     }
-    const bool fits = plane->GetPixelFormat() == zm8g &&
-                      plane->GetWidth() == target.GetWidth() &&
+    const bool fits = plane->GetPixelFormat() == zm8g && plane->GetWidth() == target.GetWidth() &&
                       plane->GetHeight() == target.GetHeight();
     if (!fits && !plane->Allocate(target.GetWidth(), target.GetHeight(), zm8g)) {
         return nullptr;
@@ -177,8 +176,7 @@ TZmBitmap* FitTargetPlane(TZmBitmap& target) {
 
 /// The plane takes the filter that was asked for, also where the image takes a replacement, and
 /// reports no progress: the image's own count has ended already.
-bool ResampleAlpha(TZmBitmap& source, TZmBitmap& target, TZmBitmap& alpha,
-                   TResampleFilter filter) {
+bool ResampleAlpha(TZmBitmap& source, TZmBitmap& target, TZmBitmap& alpha, TResampleFilter filter) {
     TZmBitmap* target_alpha = FitTargetPlane(target);
     if (target_alpha == nullptr) {
         return false;
@@ -207,8 +205,7 @@ std::int32_t ResolveSide(std::int32_t requested, std::int32_t other_side, std::i
     return side < 1 ? 1 : side;
 }
 
-TZmImageSize FitIntoBox(TZmImageSize box, std::int32_t present_width,
-                        std::int32_t present_height) {
+TZmImageSize FitIntoBox(TZmImageSize box, std::int32_t present_width, std::int32_t present_height) {
     const double width = present_width;
     const double height = present_height;
     const bool width_limits = width / box.width > height / box.height;
@@ -257,8 +254,8 @@ TZmImageSize CalcResampleSize(std::int32_t new_width, std::int32_t new_height,
     return keep_aspect ? FitIntoBox(size, present_width, present_height) : size;
 }
 
-bool ResampleBitmapInto(TZmBitmap& source, TZmBitmap& target, TResampleFilter filter,
-                        void* sender, const TZmBitmapProgressEvent& on_progress) {
+bool ResampleBitmapInto(TZmBitmap& source, TZmBitmap& target, TResampleFilter filter, void* sender,
+                        const TZmBitmapProgressEvent& on_progress) {
     if (&source == &target || source.IsEmpty() || target.IsEmpty()) {
         return false;
     }

@@ -36,7 +36,7 @@ TZmImageSize CalcResampleSize(std::int32_t new_width, std::int32_t new_height,
 /// `on_progress` may be empty; the kernel filters call it from a worker thread. False when there
 /// is no result (an empty image, no room for the target's format): the target is then undefined.
 /// Exceptions of the allocator and of `on_progress` pass through.
-bool ResampleBitmapInto(TZmBitmap& source, TZmBitmap& target, TResampleFilter filter,
-                        void* sender, const TZmBitmapProgressEvent& on_progress);
+bool ResampleBitmapInto(TZmBitmap& source, TZmBitmap& target, TResampleFilter filter, void* sender,
+                        const TZmBitmapProgressEvent& on_progress);
 
 }  // namespace zm

@@ -132,8 +132,8 @@ TAreaEngine<Sample>::TAreaEngine(TZmBitmap& source, TZmBitmap& target, TZmBitmap
     if (!cubic_ && mode_ == kModeEE && channels_ == 4) {
         written_channels_ = 1;
     }
-    const std::int64_t samples = static_cast<std::int64_t>(source_width_) *
-                                 source.GetChannelCount();
+    const std::int64_t samples =
+        static_cast<std::int64_t>(source_width_) * source.GetChannelCount();
     for (TRow* row : {&previous_buffer_, &current_buffer_, &next_buffer_, &next2_buffer_}) {
         row->samples = MakeWorkBuffer<Sample>(samples);
         row->alpha.assign(alpha_ != nullptr ? static_cast<std::size_t>(source_width_) : 0, 255);
@@ -205,8 +205,8 @@ template <typename Sample>
 double TAreaEngine<Sample>::CubicInRow(const TRow& row, const TColumns& at, std::size_t channel,
                                        double fx) const {
     const Sample* samples = row.samples.data() + channel;
-    return LimitedCubic(samples[at.left], samples[at.here], samples[at.right], samples[at.right2], fx,
-                 kLimit);
+    return LimitedCubic(samples[at.left], samples[at.here], samples[at.right], samples[at.right2],
+                        fx, kLimit);
 }
 
 template <typename Sample>
@@ -224,7 +224,7 @@ double TAreaEngine<Sample>::CubicValue(const TColumns& at, std::size_t channel, 
         case kModeSE: {
             const std::size_t i = at.here + channel;
             return LimitedCubic(previous_->samples[i], current_->samples[i], next_->samples[i],
-                         next2_->samples[i], fy, kLimit);
+                                next2_->samples[i], fy, kLimit);
         }
         default: return current_->samples[at.here + channel];
     }
@@ -265,8 +265,8 @@ void TAreaEngine<Sample>::AddAtAlphaEdge(double* sums, const TColumns& at, doubl
             const TRow& row = strongest < 2 ? *current_ : *next_;
             const std::size_t column = (strongest & 1) != 0 ? at.right : at.here;
             const double color = row.samples[column + channel];
-            value = ((1 - fx) * color + fx * color) * (1 - fy) +
-                    ((1 - fx) * color + fx * color) * fy;
+            value =
+                ((1 - fx) * color + fx * color) * (1 - fy) + ((1 - fx) * color + fx * color) * fy;
         }
         sums[channel] += weight * value;
     }
@@ -280,8 +280,8 @@ void TAreaEngine<Sample>::AddPiece(double* sums, const TColumns& at, double fx, 
         return;
     }
     for (std::size_t channel = 0; channel < written_channels_; ++channel) {
-        const double value = cubic_ ? CubicValue(at, channel, fx, fy)
-                                    : LinearValue(at, channel, fx, fy);
+        const double value =
+            cubic_ ? CubicValue(at, channel, fx, fy) : LinearValue(at, channel, fx, fy);
         sums[channel] += weight * value;
     }
 }

@@ -77,8 +77,8 @@ TEnlargedAxis::TEnlargedAxis(std::int32_t source_size, std::int32_t target_size)
 }
 
 void TEnlargedAxis::Measure(const TEnlargedPixel& pixel) {
-    length_bits_ = std::max({length_bits_, BitsBehindPoint(pixel.border),
-                             BitsBehindPoint(pixel.end)});
+    length_bits_ =
+        std::max({length_bits_, BitsBehindPoint(pixel.border), BitsBehindPoint(pixel.end)});
     fraction_bits_ = std::max(fraction_bits_, BitsBehindPoint(pixel.fraction));
     length_sum_ = std::max(length_sum_, std::fabs(pixel.border) + std::fabs(pixel.end));
     double sum = 0;
@@ -173,9 +173,9 @@ double TEnlarger<Sample, kChannels>::TieMargin() const {
         return 2;
     }
     const double largest = kLimit * sums * (cubic_ ? rows_.CubicSum() : 1.001);
-    const int bits = columns_.LengthBits() + rows_.LengthBits() +
-                     (cubic_ ? 3 * rows_.FractionBits()
-                             : columns_.FractionBits() + rows_.FractionBits());
+    const int bits =
+        columns_.LengthBits() + rows_.LengthBits() +
+        (cubic_ ? 3 * rows_.FractionBits() : columns_.FractionBits() + rows_.FractionBits());
     int exponent = 0;
     const bool scale_is_exact = std::frexp(scale_, &exponent) == 0.5;
     if (scale_is_exact && largest * std::ldexp(1, bits) <= std::ldexp(1, kDigits)) {
@@ -222,8 +222,8 @@ void TEnlarger<Sample, kChannels>::PrepareColumns() {
         std::fill_n(end_weights_.begin() + static_cast<std::ptrdiff_t>(x * kChannels), kChannels,
                     static_cast<Real>(pixel.end * scale_));
     }
-    const std::int64_t padded = (source_.GetWidth() + std::int64_t{kBefore + kBehind}) *
-                                std::int64_t{kChannels};
+    const std::int64_t padded =
+        (source_.GetWidth() + std::int64_t{kBefore + kBehind}) * std::int64_t{kChannels};
     for (TRow& row : ring_) {
         row.samples = MakeWorkBuffer<Real>(padded + 1);
         row.filtered = MakeWorkBuffer<Real>(samples + 1);
@@ -311,11 +311,10 @@ void TEnlarger<Sample, kChannels>::FixCubicTies(TRow& row, std::size_t first,
         Real& value = row.filtered[i];
         if (std::fabs(value - RoundToWhole(value)) > tie_start) {
             const TEnlargedPixel& pixel = columns_[i / kChannels];
-            const Real* a = row.samples.data() +
-                            static_cast<std::size_t>(pixel.index) * kChannels + i % kChannels;
-            value = static_cast<Real>(RoundHalfEven(
-                LimitedCubic(a[0], a[kChannels], a[2 * kChannels], a[3 * kChannels],
-                             pixel.fraction, kLimit)));
+            const Real* a = row.samples.data() + static_cast<std::size_t>(pixel.index) * kChannels +
+                            i % kChannels;
+            value = static_cast<Real>(RoundHalfEven(LimitedCubic(
+                a[0], a[kChannels], a[2 * kChannels], a[3 * kChannels], pixel.fraction, kLimit)));
         }
     }
 }
@@ -397,8 +396,7 @@ bool TEnlarger<Sample, kChannels>::BlendBlock(std::size_t first, std::size_t cou
 
 /// One pixel as the plain form has it.
 template <typename Sample, std::size_t kChannels>
-void TEnlarger<Sample, kChannels>::ComputeLinear(std::size_t y, std::size_t x,
-                                                 Sample* out) const {
+void TEnlarger<Sample, kChannels>::ComputeLinear(std::size_t y, std::size_t x, Sample* out) const {
     const TEnlargedPixel& row = rows_[y];
     const TEnlargedPixel& column = columns_[x];
     const std::size_t at = static_cast<std::size_t>(column.index) * kChannels;

@@ -50,8 +50,7 @@ public:
         return {taps_.data() + tap_starts_[target], taps_.data() + tap_starts_[target + 1]};
     }
     TPieceRange Pieces(std::size_t target) const {
-        return {pieces_.data() + piece_starts_[target],
-                pieces_.data() + piece_starts_[target + 1]};
+        return {pieces_.data() + piece_starts_[target], pieces_.data() + piece_starts_[target + 1]};
     }
     double Step() const { return step_; }
     /// Bits behind the point that the weights have.
@@ -179,8 +178,8 @@ void AddWeightedRows(const Sample* const* rows, const Real* weights, Real* __res
 constexpr std::size_t kMaxRowsAtOnce = 4;
 
 template <bool kFresh, typename Sample, typename Real>
-void AddRowBatch(std::size_t row_count, const Sample* const* rows, const Real* weights,
-                 Real* sums, std::size_t count) {
+void AddRowBatch(std::size_t row_count, const Sample* const* rows, const Real* weights, Real* sums,
+                 std::size_t count) {
     switch (row_count) {
         case 1: AddWeightedRows<1, kFresh>(rows, weights, sums, count); break;
         case 2: AddWeightedRows<2, kFresh>(rows, weights, sums, count); break;

@@ -18,9 +18,9 @@ inline constexpr double kAreaBorderSlack = 0.0001;
 
 /// One step of a walk along an axis.
 struct TAreaStep {
-    double position = 0;       ///< after the step, in source pixels
-    std::int32_t index = 0;    ///< source pixel that the step lies in
-    bool ends_pixel = false;   ///< the step ends its target pixel; otherwise it ends `index`
+    double position = 0;      ///< after the step, in source pixels
+    std::int32_t index = 0;   ///< source pixel that the step lies in
+    bool ends_pixel = false;  ///< the step ends its target pixel; otherwise it ends `index`
 };
 
 /// Walks one axis: each call gives the next piece's end. A step that ends no target pixel is
@@ -49,8 +49,7 @@ private:
 
 /// Lengths of the horizontal pieces in the order of the walk, target_size + source_size entries.
 /// Each is taken from the sum of those before it, so that the lengths' sum has no drift.
-std::vector<double> MakeAreaPieces(double step, std::int32_t source_size,
-                                   std::int32_t target_size);
+std::vector<double> MakeAreaPieces(double step, std::int32_t source_size, std::int32_t target_size);
 
 /// Margins around a tie beyond this would leave too many pixels to the slow way.
 inline constexpr double kMaxTieMargin = 0.01;

@@ -69,8 +69,8 @@ bool BlendLinear(const TLinearRows<Real>& rows, std::size_t count, Sample* out, 
     TDistanceMeter<Real> meter(tie_start);
     ForBlocks<Real>(count, [&](auto tag, std::size_t i) HWY_ATTR {
         const auto upper = hn::Mul(hn::Set(tag, rows.weights[0]), hn::LoadU(tag, rows.rows[0] + i));
-        const auto value = hn::MulAdd(hn::Set(tag, rows.weights[1]),
-                                      hn::LoadU(tag, rows.rows[1] + i), upper);
+        const auto value =
+            hn::MulAdd(hn::Set(tag, rows.weights[1]), hn::LoadU(tag, rows.rows[1] + i), upper);
         meter.Note(tag, value, StoreRounded(tag, value, out + i));
     });
     return meter.Seen();
@@ -85,15 +85,13 @@ HWY_INLINE hn::Vec<D> CubicRows(D tag, const TCubicRows<Real>& rows, std::size_t
     value = hn::MulAdd(hn::Set(tag, rows.weights[2]), hn::LoadU(tag, rows.rows[2] + i), value);
     value = hn::MulAdd(hn::Set(tag, rows.weights[3]), hn::LoadU(tag, rows.rows[3] + i), value);
     value = hn::Min(hn::Max(value, hn::Zero(tag)), hn::Set(tag, rows.limit));
-    return hn::MulAdd(hn::Set(tag, rows.end), value,
-                      hn::Mul(hn::Set(tag, rows.border), current));
+    return hn::MulAdd(hn::Set(tag, rows.end), value, hn::Mul(hn::Set(tag, rows.border), current));
 }
 
 template <typename Real>
 void MixCubic(const TCubicRows<Real>& rows, std::size_t count, Real* out) {
-    ForBlocks<Real>(count, [&](auto tag, std::size_t i) HWY_ATTR {
-        hn::StoreU(CubicRows(tag, rows, i), tag, out + i);
-    });
+    ForBlocks<Real>(count, [&](auto tag, std::size_t i)
+                               HWY_ATTR { hn::StoreU(CubicRows(tag, rows, i), tag, out + i); });
 }
 
 template <typename Real, typename Sample>

@@ -54,8 +54,7 @@ public:
     TBlendedRows(TZmBitmap& source, std::int32_t target_width, double scale)
         : source_(source), positions_(MakeWorkBuffer<TPosition>(target_width)) {
         for (std::size_t x = 0; x < positions_.size(); ++x) {
-            positions_[x] =
-                PositionOf(static_cast<std::int32_t>(x), scale, source.GetWidth());
+            positions_[x] = PositionOf(static_cast<std::int32_t>(x), scale, source.GetWidth());
         }
         for (TRow& row : rows_) {
             row.grays = MakeWorkBuffer<std::uint8_t>(target_width);
@@ -73,8 +72,8 @@ public:
         if (const std::uint8_t* bits = source_.GetScanLine(index); bits != nullptr) {
             for (std::size_t x = 0; x < positions_.size(); ++x) {
                 const TPosition& at = positions_[x];
-                row.grays[x] = Clamp8(Blend(BitSample(bits, at.index), BitSample(bits, at.next),
-                                            at.fraction_q17));
+                row.grays[x] = Clamp8(
+                    Blend(BitSample(bits, at.index), BitSample(bits, at.next), at.fraction_q17));
             }
         }
         return row.grays;
@@ -147,13 +146,13 @@ bool ReduceBits(TZmBitmap& source, TZmBitmap& target) {
     std::vector<std::uint8_t> grays = MakeWorkBuffer<std::uint8_t>(target.GetWidth());
     for (std::int32_t y = 0; y < target.GetHeight(); ++y) {
         // The rows' end takes the whole part of the ratio, the columns' end the ratio itself.
-        const TFootprint rows = LimitFootprint(y * ry - ry / 2, TruncToInt(ry) / 2.0 + y * ry,
-                                               source.GetHeight());
+        const TFootprint rows =
+            LimitFootprint(y * ry - ry / 2, TruncToInt(ry) / 2.0 + y * ry, source.GetHeight());
         CountSetBits(source, rows, set_bits);
         for (std::size_t x = 0; x < grays.size(); ++x) {
             const auto position = static_cast<double>(x);
-            const TFootprint columns = LimitFootprint(
-                position * rx - rx / 2, rx / 2 + position * rx, source.GetWidth());
+            const TFootprint columns =
+                LimitFootprint(position * rx - rx / 2, rx / 2 + position * rx, source.GetWidth());
             const std::int64_t set = set_bits[static_cast<std::size_t>(columns.end) + 1] -
                                      set_bits[static_cast<std::size_t>(columns.start)];
             const std::int64_t counted =

@@ -98,9 +98,8 @@ private:
 };
 
 template <typename Sample, std::size_t kChannels>
-TFastLinear<Sample, kChannels>::TFastLinear(TZmBitmap& source, TZmBitmap& target,
-                                            const TRect* rect, const TResampleListener& listener,
-                                            TResampleForm form)
+TFastLinear<Sample, kChannels>::TFastLinear(TZmBitmap& source, TZmBitmap& target, const TRect* rect,
+                                            const TResampleListener& listener, TResampleForm form)
     : source_(source),
       target_(target),
       source_height_(source.GetHeight()),
@@ -112,8 +111,8 @@ TFastLinear<Sample, kChannels>::TFastLinear(TZmBitmap& source, TZmBitmap& target
       scale_y_(static_cast<double>(target.GetHeight()) / source.GetHeight()),
       reporter_(listener,
                 100 / (static_cast<double>(source.GetHeight()) + target.GetHeight() + 0.5)) {
-    const std::int64_t columns = std::max<std::int64_t>(
-        static_cast<std::int64_t>(rect_.right) - rect_.left + 1, 0);
+    const std::int64_t columns =
+        std::max<std::int64_t>(static_cast<std::int64_t>(rect_.right) - rect_.left + 1, 0);
     const auto samples = columns * static_cast<std::int64_t>(kChannels);
     spans_ = MakeWorkBuffer<TColumnSpan>(columns);
     for (std::size_t i = 0; i < spans_.size(); ++i) {
@@ -226,8 +225,7 @@ template <typename Sample, std::size_t kChannels>
 void TFastLinear<Sample, kChannels>::MeanRow(std::int32_t y) {
     const double next = std::min<double>(static_cast<double>(y) + 1, target_height_ - 1);
     const std::int32_t top = std::min(RoundHalfEven(y / scale_y_), source_height_ - 1);
-    const std::int32_t bottom =
-        std::clamp(RoundHalfEven(next / scale_y_), top, source_height_ - 1);
+    const std::int32_t bottom = std::clamp(RoundHalfEven(next / scale_y_), top, source_height_ - 1);
     if (is_fast_ && sizeof(Sample) == 1 && bottom - top < kMaxMeanLength) {
         MeanRowsFast(top, bottom);
     } else {

@@ -254,8 +254,8 @@ TFloatRow MakeFloatRow(const TTapTable& contrib, std::int32_t width, std::int32_
     TFloatRow room;
     if (form == TResampleForm::kFast && contrib.FitsFloat()) {
         room.samples = MakeWorkBuffer<float>(static_cast<std::int64_t>(width) * channels + 1);
-        room.bytes = MakeWorkBuffer<std::uint8_t>(
-            static_cast<std::int64_t>(contrib.Count()) * channels + 1);
+        room.bytes =
+            MakeWorkBuffer<std::uint8_t>(static_cast<std::int64_t>(contrib.Count()) * channels + 1);
     }
     return room;
 }
@@ -320,8 +320,8 @@ void SumRowsFast(TZmBitmap& work, const TCList& list, std::vector<float>& sums) 
 template <bool kGrayToColor>
 void FilterColumnsFast(TZmBitmap& work, TZmBitmap& target, const TTapTable& contrib,
                        TPercentReporter& reporter) {
-    std::vector<float> sums = MakeWorkBuffer<float>(
-        static_cast<std::int64_t>(work.GetWidth()) * work.GetChannelCount());
+    std::vector<float> sums =
+        MakeWorkBuffer<float>(static_cast<std::int64_t>(work.GetWidth()) * work.GetChannelCount());
     for (std::int32_t y = 0; y < target.GetHeight(); ++y) {
         const TCList list = contrib[y];
         SumRowsFast(work, list, sums);
@@ -399,10 +399,9 @@ public:
         for (std::int32_t y = start_y_; y < start_y_ + row_count_; ++y) {
             const auto row = static_cast<std::size_t>(y);
             const bool collected = !shared_.src_rows.empty();
-            const std::uint8_t* in = collected ? shared_.src_rows[row]
-                                               : shared_.Src->GetScanLine(y);
-            std::uint8_t* out = collected ? shared_.work_rows[row]
-                                          : shared_.Work->GetScanLine(y);
+            const std::uint8_t* in =
+                collected ? shared_.src_rows[row] : shared_.Src->GetScanLine(y);
+            std::uint8_t* out = collected ? shared_.work_rows[row] : shared_.Work->GetScanLine(y);
             if (in != nullptr && out != nullptr) {
                 FilterByteRow<3>(in, width, out, *shared_.contrib, room);
             }
@@ -422,8 +421,7 @@ private:
 
 /// One worker for images whose rows cannot be addressed at the same time.
 std::int32_t CountThreads(TZmBitmap& source, TZmBitmap& work) {
-    if (source.GetLocation() == zmFile || work.GetLocation() == zmFile ||
-        source.GetIsVirtual()) {
+    if (source.GetLocation() == zmFile || work.GetLocation() == zmFile || source.GetIsVirtual()) {
         return 1;
     }
     return std::max(1, ZmThreadsForSize(source.GetWidth(), source.GetHeight()));

@@ -36,8 +36,8 @@ void CopyBits(const std::uint8_t* row, TChunk& chunk) {
     std::size_t x = 0;
     for (const std::int32_t column : chunk.source_columns) {
         const unsigned bit = row[column >> 3] >> (7 - (column & 7)) & 1u;
-        chunk.samples[x >> 3] = static_cast<std::uint8_t>(chunk.samples[x >> 3] |
-                                                          bit << (7 - (x & 7)));
+        chunk.samples[x >> 3] =
+            static_cast<std::uint8_t>(chunk.samples[x >> 3] | bit << (7 - (x & 7)));
         ++x;
     }
 }

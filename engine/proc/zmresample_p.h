@@ -227,8 +227,7 @@ bool BlendIntRows(const TBlendRows& rows, std::size_t count, std::uint8_t* out);
 [[nodiscard]] bool ReduceBits(TZmBitmap& source, TZmBitmap& target);
 
 /// rfProjectBW and rfProjectWB: zm24RGB or zm1g to zm1g, keeping black (white) features.
-[[nodiscard]] bool ResampleProjection(TZmBitmap& source, TZmBitmap& target,
-                                      TResampleFilter filter);
+[[nodiscard]] bool ResampleProjection(TZmBitmap& source, TZmBitmap& target, TResampleFilter filter);
 
 /// rfWICNearestNeighbor, rfWICLinear, rfWICCubic, rfWICFant: every format to itself, but zm1g
 /// and zm8p to zm24RGB.

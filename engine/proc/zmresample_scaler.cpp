@@ -111,8 +111,7 @@ Sample ReadSample(const std::uint8_t* row, std::size_t index) {
 double SampleValue(const std::uint8_t* row, std::size_t index, TSampleKind kind) {
     switch (kind) {
         case kBits: return (row[index >> 3] >> (7 - (index & 7)) & 1) != 0 ? 255 : 0;
-        case kLab:
-            return index % 3 == 0 ? row[index] : ReadSample<std::int8_t>(row, index);
+        case kLab: return index % 3 == 0 ? row[index] : ReadSample<std::int8_t>(row, index);
         case kWords: return ReadSample<std::uint16_t>(row, index);
         case kFloats: return static_cast<double>(ReadSample<float>(row, index));
         default: return row[index];
@@ -129,8 +128,7 @@ void StoreSample(std::uint8_t* row, std::size_t index, TSampleKind kind, double 
         case kLab:
             if (index % 3 != 0) {
                 const std::int32_t rounded = RoundHalfEven(value);
-                PutSample(row, index,
-                          static_cast<std::int8_t>(std::clamp(rounded, -128, 127)));
+                PutSample(row, index, static_cast<std::int8_t>(std::clamp(rounded, -128, 127)));
                 break;
             }
             row[index] = Clamp8(RoundHalfEven(value));

@@ -88,8 +88,8 @@ TEST(MergeAlphaRectTo, AddsSubtractsAndSetsAtARate) {
         EXPECT_EQ(dest.GetAlpha(0, 0), test.result) << test.rate;
         TZmBitmap plane(1, 1, zm8g);
         plane.AlphaFill(test.dest);
-        source.GetAlphaChannelRaw()->MergeAlphaRectTo(plane.GetAlphaChannelRaw(), 0, 0, 0, 0, 1,
-                                                      1, test.mode, test.rate);
+        source.GetAlphaChannelRaw()->MergeAlphaRectTo(plane.GetAlphaChannelRaw(), 0, 0, 0, 0, 1, 1,
+                                                      test.mode, test.rate);
         EXPECT_EQ(plane.GetAlpha(0, 0), test.result);
     }
 }
@@ -172,8 +172,8 @@ std::uint8_t FeatheredPixel(TZmBitmap& plane, std::int32_t x, std::int32_t y, st
             if (plane.GetPixels_zm8(other_x, other_y) == 0) {
                 const double dx = std::abs(x - other_x);
                 const double dy = std::abs(y - other_y);
-                nearest = std::min(nearest,
-                                   quick ? std::max(dx, dy) : std::sqrt(dx * dx + dy * dy));
+                nearest =
+                    std::min(nearest, quick ? std::max(dx, dy) : std::sqrt(dx * dx + dy * dy));
             }
         }
     }
@@ -190,9 +190,10 @@ TEST(FeatherAlphaEdges, FindsTheNearestOfManyPixels) {
                 for (std::int32_t y = 0; y < 17; ++y) {
                     for (std::int32_t x = 0; x < 31; ++x) {
                         const int value = plane->GetPixels_zm8(x, y);
-                        plane->SetPixels_zm8(x, y, value < static_cast<int>(seed * seed / 2)
-                                                       ? std::uint8_t{0}
-                                                       : static_cast<std::uint8_t>(value | 1));
+                        plane->SetPixels_zm8(x, y,
+                                             value < static_cast<int>(seed * seed / 2)
+                                                 ? std::uint8_t{0}
+                                                 : static_cast<std::uint8_t>(value | 1));
                     }
                 }
                 TZmBitmap bitmap(31, 17, zm24RGB);
@@ -200,8 +201,7 @@ TEST(FeatherAlphaEdges, FindsTheNearestOfManyPixels) {
                 bitmap.FeatherAlphaEdges(depth, quick);
                 for (std::int32_t y = 0; y < 17; ++y) {
                     for (std::int32_t x = 0; x < 31; ++x) {
-                        ASSERT_EQ(bitmap.GetAlpha(x, y),
-                                  FeatheredPixel(*plane, x, y, depth, quick))
+                        ASSERT_EQ(bitmap.GetAlpha(x, y), FeatheredPixel(*plane, x, y, depth, quick))
                             << x << ", " << y << " depth " << depth << " seed " << seed;
                     }
                 }
@@ -226,8 +226,8 @@ TEST(SetTransparentColors, MatchesAllChannelsInclusive) {
 }
 
 TEST(SetTransparentColors, LooksAtTheColoursOfAnyFormat) {
-    for (const TZmPixelFormat format : {zm1g, zm8p, zm8g, zm16g, zm32f, zmCMYK, zm48RGB, zmCIELab,
-                                        zm32RGB}) {
+    for (const TZmPixelFormat format :
+         {zm1g, zm8p, zm8g, zm16g, zm32f, zmCMYK, zm48RGB, zmCIELab, zm32RGB}) {
         TZmBitmap bitmap(12, 2, format);
         bitmap.SetPalette(5, TRGB{255, 255, 255});
         const TRGB white{255, 255, 255};

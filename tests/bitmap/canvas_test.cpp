@@ -13,8 +13,8 @@
 namespace zm::test {
 namespace {
 
-constexpr TZmPixelFormat kAllFormats[] = {zm1g,    zm8p,   zm8g,    zm16g,    zm24RGB,
-                                          zm32f,   zmCMYK, zm48RGB, zmCIELab, zm32RGB};
+constexpr TZmPixelFormat kAllFormats[] = {zm1g,  zm8p,   zm8g,    zm16g,    zm24RGB,
+                                          zm32f, zmCMYK, zm48RGB, zmCIELab, zm32RGB};
 constexpr std::int32_t kMin = std::numeric_limits<std::int32_t>::min();
 constexpr std::int32_t kMax = std::numeric_limits<std::int32_t>::max();
 
@@ -68,8 +68,8 @@ TEST(CanvasResize, AlignsThePicture) {
             const auto bitmap = MakeLine({1, 2, 3, 4, 5}, is_column);
             const auto horiz = static_cast<TZmHorizAlign>(is_column ? 0 : test.align);
             const auto vert = static_cast<TZmVertAlign>(is_column ? test.align : 0);
-            ASSERT_TRUE(bitmap->Resize(is_column ? 1 : test.new_size,
-                                       is_column ? test.new_size : 1, 9.0, 44, horiz, vert));
+            ASSERT_TRUE(bitmap->Resize(is_column ? 1 : test.new_size, is_column ? test.new_size : 1,
+                                       9.0, 44, horiz, vert));
             EXPECT_EQ(LineOf(*bitmap, false), test.values) << test.new_size;
             EXPECT_EQ(LineOf(*bitmap, true), alphas) << test.new_size;
         }
@@ -82,9 +82,9 @@ TEST(CanvasResize, AddsToTheSides) {
         TValues values;
     };
     const TCase kCases[] = {
-        {2, 1, {9, 9, 1, 2, 3, 9}}, {-1, 0, {2, 3}},          {0, -2, {1}},
-        {-1, 2, {2, 3, 9, 9}},      {2, -1, {9, 9, 1, 2}},    {2, -4, {9}},
-        {-3, 2, {9, 9}},            {-5, 4, {9, 9}},          {0, 0, {1, 2, 3}},
+        {2, 1, {9, 9, 1, 2, 3, 9}}, {-1, 0, {2, 3}}, {0, -2, {1}},    {-1, 2, {2, 3, 9, 9}},
+        {2, -1, {9, 9, 1, 2}},      {2, -4, {9}},    {-3, 2, {9, 9}}, {-5, 4, {9, 9}},
+        {0, 0, {1, 2, 3}},
     };
     for (const TCase& test : kCases) {
         TValues alphas;
@@ -173,12 +173,12 @@ TEST(MoveRegion, MovesPixelsAndAlpha) {
         TValues values;
     };
     const TCase kCases[] = {
-        {1, 2, 3, true, {1, 9, 9, 2, 3}},      {1, 2, 3, false, {1, 2, 3, 2, 3}},
-        {0, 2, 1, true, {9, 1, 2, 3, 5}},      {1, 3, 0, true, {2, 3, 4, 9, 5}},
-        {-2, 1, 0, true, {9, 9, 1, 2, 5}},     {3, 9, 4, true, {1, 2, 3, 9, 4}},
-        {0, 4, kMax, true, {9, 9, 9, 9, 9}},   {0, 4, kMin, false, {1, 2, 3, 4, 5}},
-        {0, 4, -3, true, {4, 5, 9, 9, 9}},     {kMin, kMax, 0, true, {9, 9, 9, 9, 9}},
-        {3, 2, 0, true, {1, 2, 3, 4, 5}},      {5, 8, 0, true, {1, 2, 3, 4, 5}},
+        {1, 2, 3, true, {1, 9, 9, 2, 3}},    {1, 2, 3, false, {1, 2, 3, 2, 3}},
+        {0, 2, 1, true, {9, 1, 2, 3, 5}},    {1, 3, 0, true, {2, 3, 4, 9, 5}},
+        {-2, 1, 0, true, {9, 9, 1, 2, 5}},   {3, 9, 4, true, {1, 2, 3, 9, 4}},
+        {0, 4, kMax, true, {9, 9, 9, 9, 9}}, {0, 4, kMin, false, {1, 2, 3, 4, 5}},
+        {0, 4, -3, true, {4, 5, 9, 9, 9}},   {kMin, kMax, 0, true, {9, 9, 9, 9, 9}},
+        {3, 2, 0, true, {1, 2, 3, 4, 5}},    {5, 8, 0, true, {1, 2, 3, 4, 5}},
     };
     for (const TCase& test : kCases) {
         TValues alphas;

@@ -14,26 +14,22 @@
 namespace zm::test {
 namespace {
 
-constexpr TZmPixelFormat kAllFormats[] = {zm1g,    zm8p,   zm8g,    zm16g,    zm24RGB,
-                                          zm32f,   zmCMYK, zm48RGB, zmCIELab, zm32RGB};
+constexpr TZmPixelFormat kAllFormats[] = {zm1g,  zm8p,   zm8g,    zm16g,    zm24RGB,
+                                          zm32f, zmCMYK, zm48RGB, zmCIELab, zm32RGB};
 
 /// Sets the channels of a pixel from a list in memory order.
 void SetChannels(TZmBitmap& bitmap, const std::vector<double>& values) {
     const auto byte = [&values](std::size_t i) { return static_cast<std::uint8_t>(values[i]); };
     const auto word = [&values](std::size_t i) { return static_cast<std::uint16_t>(values[i]); };
     switch (bitmap.GetPixelFormat()) {
-        case zm1g:
-            return bitmap.SetPixels_zm1g(0, 0, values[0] != 0);
-        case zm16g:
-            return bitmap.SetPixels_zm16g(0, 0, word(0));
-        case zm32f:
-            return bitmap.SetPixels_zm32f(0, 0, static_cast<float>(values[0]));
-        case zm48RGB:
-            return bitmap.SetPixels_zm48RGB(0, 0, TRGB48{word(0), word(1), word(2)});
+        case zm1g: return bitmap.SetPixels_zm1g(0, 0, values[0] != 0);
+        case zm16g: return bitmap.SetPixels_zm16g(0, 0, word(0));
+        case zm32f: return bitmap.SetPixels_zm32f(0, 0, static_cast<float>(values[0]));
+        case zm48RGB: return bitmap.SetPixels_zm48RGB(0, 0, TRGB48{word(0), word(1), word(2)});
         case zmCIELab:
-            return bitmap.SetPixels_zmCIELab(
-                0, 0, TCIELab{byte(0), static_cast<std::int8_t>(values[1]),
-                              static_cast<std::int8_t>(values[2])});
+            return bitmap.SetPixels_zmCIELab(0, 0,
+                                             TCIELab{byte(0), static_cast<std::int8_t>(values[1]),
+                                                     static_cast<std::int8_t>(values[2])});
         default:
             for (std::size_t i = 0; i < values.size(); ++i) {
                 bitmap.GetScanLine(0)[i] = byte(i);
@@ -57,58 +53,130 @@ struct TMatrixRow {
 // 16-bit grey 30184650 / 1000, float (42.52 + 71.52 + 3.61) / 255, inks against K = 200.
 const std::vector<TMatrixRow>& Matrix() {
     static const std::vector<TMatrixRow> matrix = {
-        {zm1g, {1}, {{zm8p, {255, 255, 255}}, {zm8g, {255}}, {zm16g, {65535}},
-                     {zm24RGB, {255, 255, 255}}, {zm32f, {1}}, {zmCMYK, {255, 255, 255, 255}},
-                     {zm48RGB, {65535, 65535, 65535}}, {zmCIELab, {255, 0, 0}},
-                     {zm32RGB, {255, 255, 255, 255}}}},
-        {zm1g, {0}, {{zm8p, {0, 0, 0}}, {zm8g, {0}}, {zm16g, {0}}, {zm24RGB, {0, 0, 0}},
-                     {zm32f, {0}}, {zmCMYK, {255, 255, 255, 0}}, {zm48RGB, {0, 0, 0}},
-                     {zmCIELab, {0, 0, 0}}, {zm32RGB, {0, 0, 0, 255}}}},
-        {zm8p, {3}, {{zm1g, {1}}, {zm8g, {117}}, {zm16g, {30184}}, {zm24RGB, {50, 100, 200}},
-                     {zm32f, {0.4613725490196}}, {zmCMYK, {255, 128, 64, 200}},
-                     {zm48RGB, {51400, 25700, 12850}}, {zmCIELab, {136, 36, 45}},
-                     {zm32RGB, {50, 100, 200, 255}}}},
-        {zm8g, {100}, {{zm1g, {1}}, {zm8p, {100, 100, 100}}, {zm16g, {25700}},
-                       {zm24RGB, {100, 100, 100}}, {zm32f, {0.3921568627451}},
-                       {zmCMYK, {255, 255, 255, 100}}, {zm48RGB, {25700, 25700, 25700}},
-                       {zmCIELab, {108, 0, 0}}, {zm32RGB, {100, 100, 100, 255}}}},
-        {zm16g, {25727}, {{zm1g, {1}}, {zm8p, {100, 100, 100}}, {zm8g, {100}},  // 64 7F
-                          {zm24RGB, {100, 100, 100}}, {zm32f, {0.3925688563363}},
-                          {zmCMYK, {255, 255, 255, 100}}, {zm48RGB, {25727, 25727, 25727}},
-                          {zmCIELab, {108, 0, 0}}, {zm32RGB, {100, 100, 100, 255}}}},
-        {zm24RGB, {50, 100, 200}, {{zm1g, {1}}, {zm8p, {50, 100, 200}}, {zm8g, {117}},
-                                   {zm16g, {30184}}, {zm32f, {0.4613725490196}},
-                                   {zmCMYK, {255, 128, 64, 200}},
-                                   {zm48RGB, {51400, 25700, 12850}}, {zmCIELab, {136, 36, 45}},
-                                   {zm32RGB, {50, 100, 200, 255}}}},
-        {zm32f, {0.5}, {{zm1g, {1}}, {zm8p, {127, 127, 127}}, {zm8g, {127}}, {zm16g, {32767}},
-                        {zm24RGB, {127, 127, 127}}, {zmCMYK, {255, 255, 255, 127}},
-                        {zm48RGB, {32767, 32767, 32767}}, {zmCIELab, {135, 0, 0}},
-                        {zm32RGB, {127, 127, 127, 255}}}},
+        {zm1g,
+         {1},
+         {{zm8p, {255, 255, 255}},
+          {zm8g, {255}},
+          {zm16g, {65535}},
+          {zm24RGB, {255, 255, 255}},
+          {zm32f, {1}},
+          {zmCMYK, {255, 255, 255, 255}},
+          {zm48RGB, {65535, 65535, 65535}},
+          {zmCIELab, {255, 0, 0}},
+          {zm32RGB, {255, 255, 255, 255}}}},
+        {zm1g,
+         {0},
+         {{zm8p, {0, 0, 0}},
+          {zm8g, {0}},
+          {zm16g, {0}},
+          {zm24RGB, {0, 0, 0}},
+          {zm32f, {0}},
+          {zmCMYK, {255, 255, 255, 0}},
+          {zm48RGB, {0, 0, 0}},
+          {zmCIELab, {0, 0, 0}},
+          {zm32RGB, {0, 0, 0, 255}}}},
+        {zm8p,
+         {3},
+         {{zm1g, {1}},
+          {zm8g, {117}},
+          {zm16g, {30184}},
+          {zm24RGB, {50, 100, 200}},
+          {zm32f, {0.4613725490196}},
+          {zmCMYK, {255, 128, 64, 200}},
+          {zm48RGB, {51400, 25700, 12850}},
+          {zmCIELab, {136, 36, 45}},
+          {zm32RGB, {50, 100, 200, 255}}}},
+        {zm8g,
+         {100},
+         {{zm1g, {1}},
+          {zm8p, {100, 100, 100}},
+          {zm16g, {25700}},
+          {zm24RGB, {100, 100, 100}},
+          {zm32f, {0.3921568627451}},
+          {zmCMYK, {255, 255, 255, 100}},
+          {zm48RGB, {25700, 25700, 25700}},
+          {zmCIELab, {108, 0, 0}},
+          {zm32RGB, {100, 100, 100, 255}}}},
+        {zm16g,
+         {25727},
+         {{zm1g, {1}},
+          {zm8p, {100, 100, 100}},
+          {zm8g, {100}},  // 64 7F
+          {zm24RGB, {100, 100, 100}},
+          {zm32f, {0.3925688563363}},
+          {zmCMYK, {255, 255, 255, 100}},
+          {zm48RGB, {25727, 25727, 25727}},
+          {zmCIELab, {108, 0, 0}},
+          {zm32RGB, {100, 100, 100, 255}}}},
+        {zm24RGB,
+         {50, 100, 200},
+         {{zm1g, {1}},
+          {zm8p, {50, 100, 200}},
+          {zm8g, {117}},
+          {zm16g, {30184}},
+          {zm32f, {0.4613725490196}},
+          {zmCMYK, {255, 128, 64, 200}},
+          {zm48RGB, {51400, 25700, 12850}},
+          {zmCIELab, {136, 36, 45}},
+          {zm32RGB, {50, 100, 200, 255}}}},
+        {zm32f,
+         {0.5},
+         {{zm1g, {1}},
+          {zm8p, {127, 127, 127}},
+          {zm8g, {127}},
+          {zm16g, {32767}},
+          {zm24RGB, {127, 127, 127}},
+          {zmCMYK, {255, 255, 255, 127}},
+          {zm48RGB, {32767, 32767, 32767}},
+          {zmCIELab, {135, 0, 0}},
+          {zm32RGB, {127, 127, 127, 255}}}},
         // 200 * 255 / 255, 200 * 128 / 255 = 100, 200 * 64 / 255 = 50
-        {zmCMYK, {255, 128, 64, 200}, {{zm1g, {1}}, {zm8p, {50, 100, 200}}, {zm8g, {117}},
-                                       {zm16g, {30184}}, {zm24RGB, {50, 100, 200}},
-                                       {zm32f, {0.4613725490196}},
-                                       {zm48RGB, {51400, 25700, 12850}},
-                                       {zmCIELab, {136, 36, 45}}, {zm32RGB, {50, 100, 200, 255}}}},
+        {zmCMYK,
+         {255, 128, 64, 200},
+         {{zm1g, {1}},
+          {zm8p, {50, 100, 200}},
+          {zm8g, {117}},
+          {zm16g, {30184}},
+          {zm24RGB, {50, 100, 200}},
+          {zm32f, {0.4613725490196}},
+          {zm48RGB, {51400, 25700, 12850}},
+          {zmCIELab, {136, 36, 45}},
+          {zm32RGB, {50, 100, 200, 255}}}},
         // High bytes 200, 100, 50. Grey (10908460 + 18253513 + 969600) / 1000, float by words.
-        {zm48RGB, {51455, 25601, 12928}, {{zm1g, {1}}, {zm8p, {50, 100, 200}}, {zm8g, {117}},
-                                          {zm16g, {30131}}, {zm24RGB, {50, 100, 200}},
-                                          {zm32f, {0.4623555422794}},
-                                          {zmCMYK, {255, 128, 64, 200}},
-                                          {zmCIELab, {136, 36, 45}},
-                                          {zm32RGB, {50, 100, 200, 255}}}},
+        {zm48RGB,
+         {51455, 25601, 12928},
+         {{zm1g, {1}},
+          {zm8p, {50, 100, 200}},
+          {zm8g, {117}},
+          {zm16g, {30131}},
+          {zm24RGB, {50, 100, 200}},
+          {zm32f, {0.4623555422794}},
+          {zmCMYK, {255, 128, 64, 200}},
+          {zmCIELab, {136, 36, 45}},
+          {zm32RGB, {50, 100, 200, 255}}}},
         // Red 199, green 100, blue 50: grey 11679 / 100, 30130166 / 1000, 117.4374 / 255.
-        {zmCIELab, {136, 36, 45}, {{zm1g, {1}}, {zm8p, {50, 100, 199}}, {zm8g, {116}},
-                                   {zm16g, {30130}}, {zm24RGB, {50, 100, 199}},
-                                   {zm32f, {0.4605388235294}}, {zmCMYK, {255, 129, 65, 199}},
-                                   {zm48RGB, {51143, 25700, 12850}},
-                                   {zm32RGB, {50, 100, 199, 255}}}},
-        {zm32RGB, {50, 100, 200, 9}, {{zm1g, {1}}, {zm8p, {50, 100, 200}}, {zm8g, {117}},
-                                      {zm16g, {30184}}, {zm24RGB, {50, 100, 200}},
-                                      {zm32f, {0.4613725490196}}, {zmCMYK, {255, 128, 64, 200}},
-                                      {zm48RGB, {51400, 25700, 12850}},
-                                      {zmCIELab, {136, 36, 45}}}},
+        {zmCIELab,
+         {136, 36, 45},
+         {{zm1g, {1}},
+          {zm8p, {50, 100, 199}},
+          {zm8g, {116}},
+          {zm16g, {30130}},
+          {zm24RGB, {50, 100, 199}},
+          {zm32f, {0.4605388235294}},
+          {zmCMYK, {255, 129, 65, 199}},
+          {zm48RGB, {51143, 25700, 12850}},
+          {zm32RGB, {50, 100, 199, 255}}}},
+        {zm32RGB,
+         {50, 100, 200, 9},
+         {{zm1g, {1}},
+          {zm8p, {50, 100, 200}},
+          {zm8g, {117}},
+          {zm16g, {30184}},
+          {zm24RGB, {50, 100, 200}},
+          {zm32f, {0.4613725490196}},
+          {zmCMYK, {255, 128, 64, 200}},
+          {zm48RGB, {51400, 25700, 12850}},
+          {zmCIELab, {136, 36, 45}}}},
     };
     return matrix;
 }
@@ -126,7 +194,8 @@ void ExpectChannels(TZmBitmap& bitmap, const std::vector<double>& expected) {
     if (bitmap.GetPixelFormat() == zm8p) {
         const TRGB rgb = bitmap.GetPixels(0, 0);
         EXPECT_EQ(std::vector<double>({static_cast<double>(rgb.b), static_cast<double>(rgb.g),
-                                       static_cast<double>(rgb.r)}), expected);
+                                       static_cast<double>(rgb.r)}),
+                  expected);
         return;
     }
     for (std::size_t i = 0; i < expected.size(); ++i) {
@@ -221,7 +290,8 @@ TEST(ConversionMatrix, TakesEveryRowAlone) {
                     source->CopyRectTo(&one, x, 0, 0, 0, 1, 1, false);
                     convert(one.GetScanLine(0), pixel, 1, context);
                     ASSERT_EQ(std::memcmp(pixel, &dest[static_cast<std::size_t>(x) * dest_bytes],
-                                          dest_bytes), 0)
+                                          dest_bytes),
+                              0)
                         << PixelFormatInfo(from).name << " to " << PixelFormatInfo(to).name
                         << " width " << width << " x " << x;
                 }
@@ -248,9 +318,9 @@ TEST(Gray, TakesItsWeightsFromTheSettings) {
     };
     constexpr TCase kCases[] = {{100, 0, 0, 200},
                                 {0, 0, 100, 50},
-                                {100, 100, 100, 94},       // 350, low 8 bits
+                                {100, 100, 100, 94},  // 350, low 8 bits
                                 {100, -100, 0, 100},
-                                {2000000000, 0, 0, 0}};    // 4000000000: low 8 bits 0
+                                {2000000000, 0, 0, 0}};  // 4000000000: low 8 bits 0
     TZmZalmoGlobalSettings& settings = ZmGlobalSettings();
     for (const TCase& test : kCases) {
         settings.fRedToGrayCoef = test.red;
@@ -274,11 +344,15 @@ TEST(GrayRange, StretchesOnceAndIsUsedUp) {
         std::uint8_t result;
     };
     constexpr TCase kCases[] = {
-        {zm8g, 10, 20, 15, 127},          // Trunc(5 / 10 * 255)
-        {zm8g, 10, 20, 5, 0},     {zm8g, 10, 20, 25, 255}, {zm8g, 20, 10, 15, 127},
-        {zm8g, 20, 10, 25, 0},    {zm8g, 10.75, 20.5, 10, 0},  // limited to 10: below black
-        {zm16g, 1000, 3000, 1500, 63},    // Trunc(500 / 2000 * 255)
-        {zm16g, 1000, 3000, 65535, 255},  {zm16g, 0, 0, 0x7F80, 0x7F},
+        {zm8g, 10, 20, 15, 127},  // Trunc(5 / 10 * 255)
+        {zm8g, 10, 20, 5, 0},
+        {zm8g, 10, 20, 25, 255},
+        {zm8g, 20, 10, 15, 127},
+        {zm8g, 20, 10, 25, 0},
+        {zm8g, 10.75, 20.5, 10, 0},     // limited to 10: below black
+        {zm16g, 1000, 3000, 1500, 63},  // Trunc(500 / 2000 * 255)
+        {zm16g, 1000, 3000, 65535, 255},
+        {zm16g, 0, 0, 0x7F80, 0x7F},
     };
     for (const TCase& test : kCases) {
         TZmBitmap source(3, 2, test.format);
@@ -323,7 +397,7 @@ TEST(OneBit, OrderedComparesWithTheMatrix) {
     struct TCase {
         std::int32_t x, y, entry;
     };
-    constexpr TCase kCases[] = {{0, 0, 0},  {1, 0, 48}, {0, 1, 32},  {4, 4, 1},   {7, 1, 31},
+    constexpr TCase kCases[] = {{0, 0, 0},  {1, 0, 48}, {0, 1, 32},   {4, 4, 1},    {7, 1, 31},
                                 {7, 7, 21}, {2, 3, 36}, {10, 19, 36}, {13, 14, 57}, {8, 8, 0}};
     for (const TCase& test : kCases) {
         for (const std::int32_t offset : {0, 1}) {
@@ -575,10 +649,10 @@ TEST(CheckFormat, TakesTheFirstWishThatIsAllowed) {
         {zm48RGB, TZmPixelFormatSet(zm16g, zm8g), zm16g},
         {zmCIELab, TZmPixelFormatSet(zm8g, zm48RGB), zm48RGB},
         {zm32RGB, TZmPixelFormatSet(zm8g, zmCMYK), zmCMYK},
-        {zm1g, TZmPixelFormatSet(zm8p, zmCMYK), zmCMYK},        // none wished: from the highest
+        {zm1g, TZmPixelFormatSet(zm8p, zmCMYK), zmCMYK},  // none wished: from the highest
         {zm8p, TZmPixelFormatSet(zm1g, zm16g), zm16g},
         {zm24RGB, TZmPixelFormatSet(zm32RGB, zm32f), zm32RGB},
-        {zm24RGB, TZmPixelFormatSet(), zm24RGB},                // an empty set allows all
+        {zm24RGB, TZmPixelFormatSet(), zm24RGB},  // an empty set allows all
         {zm24RGB, TZmPixelFormatSet(zm24RGB, zm8g), zm24RGB},
     };
     for (const TCase& test : kCases) {

@@ -13,8 +13,8 @@
 namespace zm::test {
 namespace {
 
-constexpr TZmPixelFormat kAllFormats[] = {zm1g,    zm8p,   zm8g,    zm16g,    zm24RGB,
-                                          zm32f,   zmCMYK, zm48RGB, zmCIELab, zm32RGB};
+constexpr TZmPixelFormat kAllFormats[] = {zm1g,  zm8p,   zm8g,    zm16g,    zm24RGB,
+                                          zm32f, zmCMYK, zm48RGB, zmCIELab, zm32RGB};
 constexpr std::int32_t kMin = std::numeric_limits<std::int32_t>::min();
 constexpr std::int32_t kMax = std::numeric_limits<std::int32_t>::max();
 
@@ -34,16 +34,16 @@ TEST(BitRuns, CopyAtEveryOffsetWithoutTouchingNeighbours) {
         for (std::int64_t to = 0; to < 9; ++to) {
             for (std::int64_t count = 0; count <= kBits - 16; ++count) {
                 // Exactly as many bytes as the run reaches into, so that tools see a read behind.
-                const std::vector<std::uint8_t> tight(
-                    source.begin(), source.begin() + ((from + count + 7) / 8));
+                const std::vector<std::uint8_t> tight(source.begin(),
+                                                      source.begin() + ((from + count + 7) / 8));
                 std::array<std::uint8_t, 12> dest{};
                 dest.fill(0x5A);
                 const auto before = dest;
                 CopyBits(tight.data(), from, dest.data(), to, count);
                 for (std::int64_t x = 0; x < kBits; ++x) {
                     const bool is_inside = x >= to && x < to + count;
-                    ASSERT_EQ(Bit(dest.data(), x), is_inside ? Bit(source.data(), x - to + from)
-                                                             : Bit(before.data(), x))
+                    ASSERT_EQ(Bit(dest.data(), x),
+                              is_inside ? Bit(source.data(), x - to + from) : Bit(before.data(), x))
                         << "from " << from << " to " << to << " count " << count << " bit " << x;
                 }
             }
@@ -88,11 +88,11 @@ bool SourceOf(std::int32_t dest, std::int32_t src, std::int32_t dst, std::int32_
 }
 
 constexpr TCopyCase kCopyCases[] = {
-    {0, 0, 0, 0, 37, 11},    {1, 2, 3, 1, 20, 5},     {5, 1, 12, 4, 100, 100},
-    {3, 3, -4, -2, 20, 9},   {-3, -2, 6, 1, 12, 7},   {8, 0, 1, 2, 1, 9},
-    {0, 0, 30, 10, 37, 11},  {37, 0, 0, 0, 5, 5},     {0, 0, 41, 0, 5, 5},
-    {-20, 0, 0, 0, 20, 11},  {0, 0, -20, 0, 20, 11},  {4, 4, 4, 4, 0, 5},
-    {4, 4, 4, 4, 5, -1},     {0, 0, kMin, 0, kMax, 5}, {kMin, kMin, 0, 0, kMax, kMax},
+    {0, 0, 0, 0, 37, 11},        {1, 2, 3, 1, 20, 5},      {5, 1, 12, 4, 100, 100},
+    {3, 3, -4, -2, 20, 9},       {-3, -2, 6, 1, 12, 7},    {8, 0, 1, 2, 1, 9},
+    {0, 0, 30, 10, 37, 11},      {37, 0, 0, 0, 5, 5},      {0, 0, 41, 0, 5, 5},
+    {-20, 0, 0, 0, 20, 11},      {0, 0, -20, 0, 20, 11},   {4, 4, 4, 4, 0, 5},
+    {4, 4, 4, 4, 5, -1},         {0, 0, kMin, 0, kMax, 5}, {kMin, kMin, 0, 0, kMax, kMax},
     {kMax, 0, kMax, 0, kMax, 9}, {0, 0, 0, 0, kMax, kMax}, {0, 0, -7, 3, 30, kMax},
 };
 
@@ -111,8 +111,7 @@ TEST(CopyRectTo, MatchesAPixelByPixelCopy) {
                         if (format == zm1g) {
                             expected.SetPixels_zm1g(x, y, source->GetPixels_zm1g(from_x, from_y));
                         } else {
-                            const auto bytes =
-                                static_cast<std::size_t>(source->GetBitCount() / 8);
+                            const auto bytes = static_cast<std::size_t>(source->GetBitCount() / 8);
                             std::memcpy(expected.GetSegment(y, x, 1),
                                         source->GetSegment(from_y, from_x, 1), bytes);
                         }
@@ -128,16 +127,15 @@ TEST(CopyRectTo, MatchesAPixelByPixelCopy) {
 }
 
 TEST(CopyRectTo, WithinOneImageTakesPixelsBeforeTheyAreOverwritten) {
-    constexpr TCopyCase kCases[] = {{0, 0, 3, 2, 30, 8}, {3, 2, 0, 0, 30, 8}, {0, 0, 5, 0, 30, 11},
-                                    {5, 0, 0, 0, 30, 11}, {0, 3, 0, 0, 37, 8},
-                                    {1, 0, 2, 4, 35, 7}};
+    constexpr TCopyCase kCases[] = {{0, 0, 3, 2, 30, 8},  {3, 2, 0, 0, 30, 8}, {0, 0, 5, 0, 30, 11},
+                                    {5, 0, 0, 0, 30, 11}, {0, 3, 0, 0, 37, 8}, {1, 0, 2, 4, 35, 7}};
     for (const TZmPixelFormat format : kAllFormats) {
         for (const TCopyCase& test : kCases) {
             const auto bitmap = MakeNoise(format, 37, 11, 3);
             TZmBitmap before(*bitmap);
             TZmBitmap expected(*bitmap);
-            before.CopyRectTo(&expected, test.src_x, test.src_y, test.dst_x, test.dst_y,
-                              test.width, test.height, false);
+            before.CopyRectTo(&expected, test.src_x, test.src_y, test.dst_x, test.dst_y, test.width,
+                              test.height, false);
             bitmap->CopyRectTo(bitmap.get(), test.src_x, test.src_y, test.dst_x, test.dst_y,
                                test.width, test.height, false);
             ExpectSamePixels(expected, *bitmap);
@@ -232,9 +230,9 @@ TEST(Crop, ToTheWholeImageDoesNothing) {
 }
 
 TEST(Crop, MatchesAPixelByPixelCopyInAllFormats) {
-    constexpr TRect kRects[] = {{3, 2, 20, 9},    {-5, -3, 40, 14}, {-9, 4, 10, 30},
-                                {0, 0, 0, 0},     {36, 10, 36, 10}, {-7, -7, -2, -1},
-                                {37, 0, 40, 5},   {0, 11, 5, 12},   {7, -1, 36, 10}};
+    constexpr TRect kRects[] = {{3, 2, 20, 9},  {-5, -3, 40, 14}, {-9, 4, 10, 30},
+                                {0, 0, 0, 0},   {36, 10, 36, 10}, {-7, -7, -2, -1},
+                                {37, 0, 40, 5}, {0, 11, 5, 12},   {7, -1, 36, 10}};
     for (const TZmPixelFormat format : kAllFormats) {
         for (const TRect& rect : kRects) {
             const auto bitmap = MakeNoise(format, 37, 11, 9);
@@ -288,9 +286,8 @@ TEST(Crop, WithoutRoomLeavesTheImage) {
     TZmBitmap bitmap(8, 8, zm24RGB);
     bitmap.Fill(5.0);
     bitmap.AlphaFill(6);
-    constexpr TRect kHuge[] = {{kMin, 0, kMax, 7},      {0, kMin, 7, kMax},
-                               {kMin, kMin, kMax, kMax}, {kMin, kMin, 0, 0},
-                               {0, 0, kMax, kMax},       {kMax, kMax, kMax, kMax}};
+    constexpr TRect kHuge[] = {{kMin, 0, kMax, 7}, {0, kMin, 7, kMax}, {kMin, kMin, kMax, kMax},
+                               {kMin, kMin, 0, 0}, {0, 0, kMax, kMax}, {kMax, kMax, kMax, kMax}};
     for (const TRect& rect : kHuge) {
         const bool is_one_pixel = rect.left == kMax;
         TZmBitmap copy(bitmap);
@@ -369,8 +366,8 @@ TEST(Fill, WithFourBytesSetsTheAlphaByte) {
 }
 
 TEST(FillRect, StaysInsideItsRectangle) {
-    constexpr TRect kRects[] = {{3, 2, 20, 9}, {-5, -5, 2, 2},   {30, 8, 99, 99}, {5, 5, 4, 5},
-                                {5, 5, 5, 4},  {kMin, 3, kMax, 3}, {9, 1, 9, 1},  {40, 0, 50, 5}};
+    constexpr TRect kRects[] = {{3, 2, 20, 9}, {-5, -5, 2, 2},     {30, 8, 99, 99}, {5, 5, 4, 5},
+                                {5, 5, 5, 4},  {kMin, 3, kMax, 3}, {9, 1, 9, 1},    {40, 0, 50, 5}};
     for (const TZmPixelFormat format : kAllFormats) {
         for (const TRect& rect : kRects) {
             const auto bitmap = MakeNoise(format, 37, 11, 9);
@@ -398,8 +395,7 @@ TEST(FillRect, WritesNoByteOfOtherRowsOrAround) {
         const auto row_bytes = static_cast<std::size_t>(row_len);
         std::vector<std::uint8_t> memory(row_bytes * 5, 0xA7);
         TZmBitmap bitmap;
-        bitmap.EncapsulateMemory(memory.data() + row_bytes, kWidth, 3, format, true,
-                                 zmboTOPLEFT);
+        bitmap.EncapsulateMemory(memory.data() + row_bytes, kWidth, 3, format, true, zmboTOPLEFT);
         bitmap.FillRect(0, 1, kWidth - 1, 1, 0.0);
         const auto used =
             static_cast<std::size_t>((kWidth * PixelFormatInfo(format).bit_count + 7) / 8);

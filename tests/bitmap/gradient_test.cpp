@@ -10,8 +10,8 @@
 namespace zm::test {
 namespace {
 
-constexpr TZmPixelFormat kAllFormats[] = {zm1g,    zm8p,   zm8g,    zm16g,    zm24RGB,
-                                          zm32f,   zmCMYK, zm48RGB, zmCIELab, zm32RGB};
+constexpr TZmPixelFormat kAllFormats[] = {zm1g,  zm8p,   zm8g,    zm16g,    zm24RGB,
+                                          zm32f, zmCMYK, zm48RGB, zmCIELab, zm32RGB};
 constexpr TZmGradientDirection kDirections[] = {zmgHorizontal, zmgVertical, zmgDiagonal,
                                                 zmgDiagonal2};
 constexpr std::int32_t kMin = std::numeric_limits<std::int32_t>::min();
@@ -64,8 +64,7 @@ TEST(GradientFill, TakesSignedChannelsAndPaletteColours) {
     indexed.GradientFill(0, kWhite, zmgHorizontal);
     const std::uint8_t* const row = indexed.GetScanLine(0);
     // greys 0, 64, 128, 191, 255; 64 is nearer to 120 than to 0, 191 nearer to 255
-    EXPECT_EQ(std::vector<std::uint8_t>(row, row + 5),
-              (std::vector<std::uint8_t>{0, 7, 7, 3, 3}));
+    EXPECT_EQ(std::vector<std::uint8_t>(row, row + 5), (std::vector<std::uint8_t>{0, 7, 7, 3, 3}));
 }
 
 TEST(GradientFill, RunsInFourDirections) {
@@ -91,8 +90,8 @@ TEST(GradientFill, RunsInFourDirections) {
 }
 
 TEST(GradientFillRect, ShowsAWindowOfTheWholeRectangle) {
-    constexpr TRect kRects[] = {{-4, -3, 20, 12}, {2, 1, 6, 4},  {9, 0, 9, 5},
-                                {-7, 2, 3, 2},    {5, 3, 90, 90}};
+    constexpr TRect kRects[] = {
+        {-4, -3, 20, 12}, {2, 1, 6, 4}, {9, 0, 9, 5}, {-7, 2, 3, 2}, {5, 3, 90, 90}};
     for (const TZmPixelFormat format : kAllFormats) {
         for (const TZmGradientDirection direction : kDirections) {
             for (const TRect& rect : kRects) {

@@ -70,8 +70,8 @@ TEST(Mask, KnowsWhenItIsFull) {
         bool full_after_write, full_after_sync;
     };
     // A mask of one bit keeps its flag until it is looked through.
-    constexpr TCase kCases[] = {{8, 254, false, false}, {8, 255, true, true},
-                                {1, 0, true, false},    {1, 1, true, true}};
+    constexpr TCase kCases[] = {
+        {8, 254, false, false}, {8, 255, true, true}, {1, 0, true, false}, {1, 1, true, true}};
     for (const TCase& test : kCases) {
         TZmMask mask;
         ASSERT_TRUE(mask.AllocateBits(11, 3, test.depth));

@@ -12,8 +12,8 @@
 namespace zm::test {
 namespace {
 
-constexpr TZmPixelFormat kAllFormats[] = {zm1g,    zm8p,   zm8g,    zm16g,    zm24RGB,
-                                          zm32f,   zmCMYK, zm48RGB, zmCIELab, zm32RGB};
+constexpr TZmPixelFormat kAllFormats[] = {zm1g,  zm8p,   zm8g,    zm16g,    zm24RGB,
+                                          zm32f, zmCMYK, zm48RGB, zmCIELab, zm32RGB};
 constexpr std::int32_t kMin = std::numeric_limits<std::int32_t>::min();
 constexpr std::int32_t kMax = std::numeric_limits<std::int32_t>::max();
 
@@ -134,10 +134,10 @@ TEST(MaskCopy, ClipsToAllThreeAndWritesNothingAround) {
     struct TCase {
         std::int32_t left, top, mask_width, mask_height;
     };
-    constexpr TCase kCases[] = {{0, 0, 40, 40},   {-4, -2, 40, 40}, {5, 3, 6, 4},
-                                {6, 1, 7, 40},    {9, 0, 40, 40},   {0, 4, 40, 40},
-                                {kMin, 0, 9, 9},  {kMax, kMax, 9, 9}, {-12, 0, 9, 9},
-                                {-13, 0, 9, 9},   {-12, -6, 1, 1}};
+    constexpr TCase kCases[] = {{0, 0, 40, 40},  {-4, -2, 40, 40},   {5, 3, 6, 4},
+                                {6, 1, 7, 40},   {9, 0, 40, 40},     {0, 4, 40, 40},
+                                {kMin, 0, 9, 9}, {kMax, kMax, 9, 9}, {-12, 0, 9, 9},
+                                {-13, 0, 9, 9},  {-12, -6, 1, 1}};
     for (const TZmPixelFormat format : kAllFormats) {
         for (const TCase& test : kCases) {
             const auto bits = PixelFormatInfo(format).bit_count;
@@ -165,8 +165,8 @@ TEST(MaskCopy, ClipsToAllThreeAndWritesNothingAround) {
             ExpectSamePixels(expected, dest);
             const auto used = static_cast<std::size_t>((9 * bits + 7) / 8);
             for (std::size_t i = 0; i < memory.size(); ++i) {
-                const bool is_pixel = i / row_bytes >= 1 && i / row_bytes <= 4 &&
-                                      i % row_bytes < used;
+                const bool is_pixel =
+                    i / row_bytes >= 1 && i / row_bytes <= 4 && i % row_bytes < used;
                 ASSERT_TRUE(is_pixel || memory[i] == 0xA5) << "byte " << i;
             }
         }
@@ -311,16 +311,16 @@ TEST(MaskOutline, DashesTheBorderAtAZoom) {
     FillCanvas(canvas, 6, 5);
     mask.DrawOutline(&canvas, TZmMaskView{1, 1, 1.0, 0});
     // White where (x + y) mod 8 is below 4.
-    EXPECT_EQ(CanvasRows(canvas), (std::vector<std::string>{"......", "..WBB.", "..B.B.", "..BBB.",
-                                                            "......"}));
+    EXPECT_EQ(CanvasRows(canvas),
+              (std::vector<std::string>{"......", "..WBB.", "..B.B.", "..BBB.", "......"}));
     FillCanvas(canvas, 6, 5);
     mask.DrawOuter(&canvas, TZmMaskView{1, 1, 1.0, 1});
-    EXPECT_EQ(CanvasRows(canvas), (std::vector<std::string>{"..WBB.", ".W...B", ".B...W", ".B...W",
-                                                            "..BWW."}));
+    EXPECT_EQ(CanvasRows(canvas),
+              (std::vector<std::string>{"..WBB.", ".W...B", ".B...W", ".B...W", "..BWW."}));
     FillCanvas(canvas, 6, 5);
     mask.DrawOutline(&canvas, TZmMaskView{-2, 0, 2.0, 4});  // the left column begins at 0
-    EXPECT_EQ(CanvasRows(canvas), (std::vector<std::string>{"BBBBWW", "B....W", "B....W", "B....B",
-                                                            "W....B"}));
+    EXPECT_EQ(CanvasRows(canvas),
+              (std::vector<std::string>{"BBBBWW", "B....W", "B....W", "B....B", "W....B"}));
 }
 
 TEST(MaskOutline, InvertsTheCanvasThereAndBack) {

@@ -33,8 +33,9 @@ void SetRows(TZmMask& mask, std::int32_t depth, const TRows& rows, std::int32_t 
     ASSERT_TRUE(mask.AllocateBits(width, static_cast<std::int32_t>(rows.size()), depth));
     for (std::int32_t y = 0; y < mask.GetHeight(); ++y) {
         for (std::int32_t x = 0; x < width; ++x) {
-            mask.SetPixel(x, y, rows[static_cast<std::size_t>(y)][static_cast<std::size_t>(x)] ==
-                                        '#' ? value : 0);
+            mask.SetPixel(
+                x, y,
+                rows[static_cast<std::size_t>(y)][static_cast<std::size_t>(x)] == '#' ? value : 0);
         }
     }
 }
@@ -299,8 +300,7 @@ TEST(MaskResample, TakesTheNearestPixelBelow) {
         SetRows(mask, depth, {"#.#", ".#."}, 255);
         const auto larger = mask.CreateResampledMask(7, 5);  // columns 0001122, rows 00011
         ASSERT_NE(larger, nullptr);
-        EXPECT_EQ(RowsOf(*larger),
-                  (TRows{"###..##", "###..##", "###..##", "...##..", "...##.."}));
+        EXPECT_EQ(RowsOf(*larger), (TRows{"###..##", "###..##", "###..##", "...##..", "...##.."}));
         EXPECT_EQ(larger->GetBitsPerPixel(), depth);
         ExpectTightRect(*larger);
         const auto smaller = mask.CreateResampledMask(2, 1);  // columns 0 and 1

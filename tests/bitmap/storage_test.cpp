@@ -6,6 +6,7 @@
 #include "engine/bitmap/zmbitmapmemory_p.h"
 #include "engine/bitmap/zmxBitmaps.h"
 #include "engine/foundation/zmsettings.h"
+#include "tests/bitmap/place_support.h"
 #include "tests/support/testimages.h"
 
 namespace zm {
@@ -26,38 +27,14 @@ public:
 namespace test {
 namespace {
 
-constexpr TZmPixelFormat kAllFormats[] = {zm1g,    zm8p,   zm8g,    zm16g,    zm24RGB,
-                                          zm32f,   zmCMYK, zm48RGB, zmCIELab, zm32RGB};
-constexpr TZmPixelFormat kTBitmapFormats[] = {zm1g, zm8p, zm8g, zm24RGB, zm32RGB};
-
-/// Refuses larger blocks while it lives.
-class TBlockLimit {
-public:
-    explicit TBlockLimit(std::int64_t bytes) { SetLargestBitmapBlock(bytes); }
-    ~TBlockLimit() { SetLargestBitmapBlock(-1); }
-};
-
-/// Changes a field of the settings while it lives.
-template <typename T>
-class TSettingGuard {
-public:
-    TSettingGuard(T& field, T value) : field_(field), saved_(field) { field_ = value; }
-    ~TSettingGuard() { field_ = saved_; }
-
-private:
-    T& field_;
-    T saved_;
-};
-
 TEST(RowLength, FollowsTheAlignment) {
     struct TCase {
         std::int32_t width, bits, alignment;
         std::int64_t row_len;
     };
-    constexpr TCase kCases[] = {{1, 1, 32, 4},   {32, 1, 32, 4},  {33, 1, 32, 8},
-                                {1, 24, 32, 4},  {5, 24, 32, 16}, {3, 48, 32, 20},
-                                {3, 8, 8, 3},    {9, 1, 8, 2},    {3, 8, 64, 8},
-                                {1, 1, 512, 64}, {0, 8, 32, 0}};
+    constexpr TCase kCases[] = {{1, 1, 32, 4},   {32, 1, 32, 4},  {33, 1, 32, 8}, {1, 24, 32, 4},
+                                {5, 24, 32, 16}, {3, 48, 32, 20}, {3, 8, 8, 3},   {9, 1, 8, 2},
+                                {3, 8, 64, 8},   {1, 1, 512, 64}, {0, 8, 32, 0}};
     for (const TCase& test : kCases) {
         EXPECT_EQ(CalcRowLen(test.width, test.bits, test.alignment), test.row_len)
             << test.width << " x " << test.bits << " bits at " << test.alignment;
@@ -73,9 +50,9 @@ TEST(PixelFormats, HaveTheirBitsAndChannels) {
         TZmPixelFormat format;
         std::int32_t ordinal, bits, channels;
     };
-    constexpr TCase kCases[] = {{zmnull, 0, 0, 0},   {zm1g, 1, 1, 1},      {zm8p, 2, 8, 1},
-                                {zm8g, 3, 8, 1},     {zm16g, 4, 16, 1},    {zm24RGB, 5, 24, 3},
-                                {zm32f, 6, 32, 1},   {zmCMYK, 7, 32, 4},   {zm48RGB, 8, 48, 3},
+    constexpr TCase kCases[] = {{zmnull, 0, 0, 0},    {zm1g, 1, 1, 1},     {zm8p, 2, 8, 1},
+                                {zm8g, 3, 8, 1},      {zm16g, 4, 16, 1},   {zm24RGB, 5, 24, 3},
+                                {zm32f, 6, 32, 1},    {zmCMYK, 7, 32, 4},  {zm48RGB, 8, 48, 3},
                                 {zmCIELab, 9, 24, 3}, {zm32RGB, 10, 32, 4}};
     for (const TCase& test : kCases) {
         EXPECT_EQ(test.format, test.ordinal);
@@ -213,100 +190,6 @@ TEST(Place, LargeFragmentsAreSplitFurther) {
     bitmap.SetPixels_zm8((10 << 20) - 1, 9, 5);
     EXPECT_EQ(bitmap.GetPixels_zm8((10 << 20) - 1, 9), 5);
 }
-
-/// Every operation on every place gives what it gives in plain memory.
-enum TPlace { kInMemory, kInFragments, kInFile, kInTBitmap };
-
-class EveryPlace : public ::testing::TestWithParam<std::tuple<TPlace, TZmPixelFormat>> {
-protected:
-    static constexpr std::int32_t kWidth = 29;
-    static constexpr std::int32_t kHeight = 13;
-
-    /// A copy of the picture in the place of this case.
-    void MoveToPlace(TZmBitmap& bitmap, TZmBitmap& source) {
-        const TPlace place = std::get<0>(GetParam());
-        // Fragments: the block with its slack is refused, a quarter of the rows is not.
-        const std::int64_t rows_of_quarter = (source.GetHeight() + 3) / 4;
-        const TBlockLimit limit(place == kInFragments ? source.GetRowLen() * rows_of_quarter : -1);
-        if (place == kInFile) {
-            bitmap.SetMinFileSize(0);
-        } else if (place == kInTBitmap) {
-            bitmap.SetLocation(zmTBitmap);
-        }
-        bitmap.AssignImage(&source);
-        ExpectPlace(bitmap);
-    }
-    static void ExpectPlace(TZmBitmap& bitmap) {
-        const TPlace place = std::get<0>(GetParam());
-        EXPECT_EQ(bitmap.GetLocation(), place == kInFile      ? zmFile
-                                        : place == kInTBitmap ? zmTBitmap
-                                                              : zmMemory);
-        EXPECT_EQ(bitmap.GetFragmentsCount() > 0, place == kInFragments);
-    }
-};
-
-TEST_P(EveryPlace, HoldsAndChangesPixels) {
-    const TZmPixelFormat format = std::get<1>(GetParam());
-    const auto plain = MakeNoise(format, kWidth, kHeight, 7);
-    TZmBitmap bitmap;
-    MoveToPlace(bitmap, *plain);
-    ExpectSamePixels(*plain, bitmap);
-
-    plain->FillRect(3, 2, 17, 9, 1.0);
-    bitmap.FillRect(3, 2, 17, 9, 1.0);
-    ExpectSamePixels(*plain, bitmap);
-
-    const auto stamp = MakeGradient(format, 11, 7);
-    stamp->CopyRectTo(plain.get(), 1, 1, 13, 4, 9, 6, false);
-    stamp->CopyRectTo(&bitmap, 1, 1, 13, 4, 9, 6, false);
-    ExpectSamePixels(*plain, bitmap);
-
-    plain->CopyRectTo(plain.get(), 2, 1, 5, 3, 20, 9, false);
-    bitmap.CopyRectTo(&bitmap, 2, 1, 5, 3, 20, 9, false);
-    ExpectSamePixels(*plain, bitmap);
-}
-
-TEST_P(EveryPlace, ConvertsCropsAndResizes) {
-    const TZmPixelFormat format = std::get<1>(GetParam());
-    const auto plain = MakeNoise(format, kWidth, kHeight, 8);
-    TZmBitmap bitmap;
-    MoveToPlace(bitmap, *plain);
-    AddNoiseAlpha(*plain, 3);
-    AddNoiseAlpha(bitmap, 3);
-
-    EXPECT_TRUE(plain->Crop(-3, 2, 20, 15, 0x00FF8040));
-    EXPECT_TRUE(bitmap.Crop(-3, 2, 20, 15, 0x00FF8040));
-    ExpectSamePixels(*plain, bitmap);
-    ExpectSameAlpha(*plain, bitmap);
-
-    plain->SetWidth(17);
-    bitmap.SetWidth(17);
-    plain->SetHeight(11);
-    bitmap.SetHeight(11);
-    ExpectSamePixels(*plain, bitmap);
-    ExpectSameAlpha(*plain, bitmap);
-
-    const TZmPixelFormat target = format == zm24RGB ? zm8g : zm24RGB;
-    EXPECT_TRUE(plain->SetPixelFormat(target));
-    EXPECT_TRUE(bitmap.SetPixelFormat(target));
-    ExpectSamePixels(*plain, bitmap);
-    ExpectSameAlpha(*plain, bitmap);
-}
-
-std::string NameOfCase(const ::testing::TestParamInfo<EveryPlace::ParamType>& info) {
-    constexpr const char* kPlaces[] = {"Memory", "Fragments", "File", "TBitmap"};
-    return std::string(kPlaces[std::get<0>(info.param)]) + "_" +
-           PixelFormatInfo(std::get<1>(info.param)).name;
-}
-
-INSTANTIATE_TEST_SUITE_P(Places, EveryPlace,
-                         ::testing::Combine(::testing::Values(kInMemory, kInFragments, kInFile),
-                                            ::testing::ValuesIn(kAllFormats)),
-                         NameOfCase);
-INSTANTIATE_TEST_SUITE_P(PlatformBitmap, EveryPlace,
-                         ::testing::Combine(::testing::Values(kInTBitmap),
-                                            ::testing::ValuesIn(kTBitmapFormats)),
-                         NameOfCase);
 
 TEST(FileRows, TwoAtOnceStayValid) {
     TZmBitmap bitmap;
@@ -560,20 +443,40 @@ TEST(Pixels, LieInMemoryAsDeclared) {
     const TCase kCases[] = {
         {zm8g, [](TZmBitmap& b) { b.SetPixels_zm8(1, 0, 7); }, {7}},
         {zm16g, [](TZmBitmap& b) { b.SetPixels_zm16g(1, 0, 0x1234); }, {0x34, 0x12}},
-        {zm24RGB, [](TZmBitmap& b) { b.SetPixels_zm24RGB(1, 0, {1, 2, 3}); }, {1, 2, 3}},
+        {zm24RGB,
+         [](TZmBitmap& b) {
+             b.SetPixels_zm24RGB(1, 0, {1, 2, 3});
+         },
+         {1, 2, 3}},
         {zm32f, [](TZmBitmap& b) { b.SetPixels_zm32f(1, 0, 1.0f); }, {0, 0, 0x80, 0x3F}},
-        {zmCMYK, [](TZmBitmap& b) { b.SetPixels_zmCMYK(1, 0, {1, 2, 3, 4}); }, {1, 2, 3, 4}},
-        {zm48RGB, [](TZmBitmap& b) { b.SetPixels_zm48RGB(1, 0, {0x0102, 0x0304, 0x0506}); },
+        {zmCMYK,
+         [](TZmBitmap& b) {
+             b.SetPixels_zmCMYK(1, 0, {1, 2, 3, 4});
+         },
+         {1, 2, 3, 4}},
+        {zm48RGB,
+         [](TZmBitmap& b) {
+             b.SetPixels_zm48RGB(1, 0, {0x0102, 0x0304, 0x0506});
+         },
          {2, 1, 4, 3, 6, 5}},
-        {zmCIELab, [](TZmBitmap& b) { b.SetPixels_zmCIELab(1, 0, {9, -1, 1}); }, {9, 255, 1}},
-        {zm32RGB, [](TZmBitmap& b) { b.SetPixels_zm32RGB(1, 0, {1, 2, 3, 4}); }, {1, 2, 3, 4}},
+        {zmCIELab,
+         [](TZmBitmap& b) {
+             b.SetPixels_zmCIELab(1, 0, {9, -1, 1});
+         },
+         {9, 255, 1}},
+        {zm32RGB,
+         [](TZmBitmap& b) {
+             b.SetPixels_zm32RGB(1, 0, {1, 2, 3, 4});
+         },
+         {1, 2, 3, 4}},
     };
     for (const TCase& test : kCases) {
         TZmBitmap bitmap(3, 1, test.format);
         bitmap.Fill(0.0);
         test.set(bitmap);
         EXPECT_EQ(std::memcmp(bitmap.GetScanLine(0) + test.bytes.size(), test.bytes.data(),
-                              test.bytes.size()), 0)
+                              test.bytes.size()),
+                  0)
             << PixelFormatInfo(test.format).name;
     }
     TZmBitmap bits(10, 1, zm1g);
@@ -605,11 +508,10 @@ TEST(Pixels, GoThroughRGBInEveryFormat) {
 
 TEST(VirtualBitmap, RendersRowsByItsEvent) {
     TZmBitmap bitmap;
-    bitmap.SetOnRenderVirtualPixel(
-        [](TZmBitmap*, std::int32_t x, std::int32_t y, void* pixel) {
-            const TRGB rgb{static_cast<std::uint8_t>(x), static_cast<std::uint8_t>(y), 9};
-            std::memcpy(pixel, &rgb, 3);
-        });
+    bitmap.SetOnRenderVirtualPixel([](TZmBitmap*, std::int32_t x, std::int32_t y, void* pixel) {
+        const TRGB rgb{static_cast<std::uint8_t>(x), static_cast<std::uint8_t>(y), 9};
+        std::memcpy(pixel, &rgb, 3);
+    });
     ASSERT_TRUE(bitmap.GetIsVirtual());
     ASSERT_TRUE(bitmap.Allocate(5, 4, zm24RGB));
     EXPECT_EQ(bitmap.GetMemory(), nullptr);

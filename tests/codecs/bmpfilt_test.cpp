@@ -78,32 +78,32 @@ const TRGB kWhite{255, 255, 255};
 
 // 2 x 2 pixels of 24 bits, bottom row first.
 const TBytes kFile24 = {
-    'B', 'M',                // type
-    70, 0, 0, 0,             // file size
-    0, 0, 0, 0,              // reserved
-    54, 0, 0, 0,             // offset of the pixels
-    40, 0, 0, 0,             // header size
-    2, 0, 0, 0, 2, 0, 0, 0,  // width, height
-    1, 0, 24, 0,             // planes, bit count
-    0, 0, 0, 0,              // compression
-    16, 0, 0, 0,             // image size
-    0x13, 0x0B, 0, 0,        // 2835 pixels per metre: 72 dpi
-    0, 0, 0, 0,              // none told: the default
-    0, 0, 0, 0, 0, 0, 0, 0,  // colours used, important
-    1, 2, 3, 4, 5, 6, 0, 0,  // bottom row: two pixels blue, green, red; padding
-    7, 8, 9, 10, 11, 12, 0, 0,
+    'B',  'M',                         // type
+    70,   0,    0,  0,                 // file size
+    0,    0,    0,  0,                 // reserved
+    54,   0,    0,  0,                 // offset of the pixels
+    40,   0,    0,  0,                 // header size
+    2,    0,    0,  0,  2,  0,  0, 0,  // width, height
+    1,    0,    24, 0,                 // planes, bit count
+    0,    0,    0,  0,                 // compression
+    16,   0,    0,  0,                 // image size
+    0x13, 0x0B, 0,  0,                 // 2835 pixels per metre: 72 dpi
+    0,    0,    0,  0,                 // none told: the default
+    0,    0,    0,  0,  0,  0,  0, 0,  // colours used, important
+    1,    2,    3,  4,  5,  6,  0, 0,  // bottom row: two pixels blue, green, red; padding
+    7,    8,    9,  10, 11, 12, 0, 0,
 };
 
 // 3 x 2 pixels of 8 bits with RLE8, complete with its end mark.
 const TBytes kFileRle8 = {
-    'B', 'M', 78, 0, 0, 0, 0, 0, 0, 0, 62, 0, 0, 0,        // file header
-    40, 0, 0, 0, 3, 0, 0, 0, 2, 0, 0, 0, 1, 0, 8, 0,       // size, 3 x 2, planes, 8 bits
-    1, 0, 0, 0, 16, 0, 0, 0, 0, 0, 0, 0, 0, 0, 0, 0,       // RLE8
-    2, 0, 0, 0, 0, 0, 0, 0,                                // two colours used
-    10, 20, 30, 0, 40, 50, 60, 0,                          // palette
-    3, 1, 0, 0,                                            // bottom row: 1 1 1, end of line
-    0, 3, 1, 0, 1, 0, 0, 0,                                // literals 1 0 1, pad; end of line
-    0, 1, 0, 0,                                            // end of bitmap, two bytes of slack
+    'B', 'M', 78, 0, 0,  0,  0,  0, 0, 0, 62, 0, 0, 0,        // file header
+    40,  0,   0,  0, 3,  0,  0,  0, 2, 0, 0,  0, 1, 0, 8, 0,  // size, 3 x 2, planes, 8 bits
+    1,   0,   0,  0, 16, 0,  0,  0, 0, 0, 0,  0, 0, 0, 0, 0,  // RLE8
+    2,   0,   0,  0, 0,  0,  0,  0,                           // two colours used
+    10,  20,  30, 0, 40, 50, 60, 0,                           // palette
+    3,   1,   0,  0,                                          // bottom row: 1 1 1, end of line
+    0,   3,   1,  0, 1,  0,  0,  0,                           // literals 1 0 1, pad; end of line
+    0,   1,   0,  0,                                          // end of bitmap, two bytes of slack
 };
 
 // A header of any size behind a file header, with the fields of the 40-byte form.
@@ -118,9 +118,16 @@ struct THeader {
 };
 
 TBytes MakeHeader(const THeader& header) {
-    TBytes info = Join({Dword(header.size), Dword(header.width), Dword(header.height),
-                        {1, 0, header.bits, 0}, Dword(header.compression), Dword(0), Dword(0),
-                        Dword(0), Dword(header.colors_used), Dword(0)});
+    TBytes info = Join({Dword(header.size),
+                        Dword(header.width),
+                        Dword(header.height),
+                        {1, 0, header.bits, 0},
+                        Dword(header.compression),
+                        Dword(0),
+                        Dword(0),
+                        Dword(0),
+                        Dword(header.colors_used),
+                        Dword(0)});
     info.resize(header.size, 0);
     return Join({{'B', 'M'}, Dword(0), Dword(0), Dword(header.offset), info});
 }
@@ -165,12 +172,12 @@ TEST(BmpReader, NegativeHeightMeansTopRowFirst) {
 
 TEST(BmpReader, ReadsTheTwelveByteHeader) {
     const TBytes bytes = {
-        'B', 'M', 0, 0, 0, 0, 0, 0, 0, 0, 74, 0, 0, 0,  // file header: pixels at 14 + 12 + 48
-        12, 0, 0, 0, 3, 0, 1, 0, 1, 0, 4, 0,            // 3 x 1, 1 plane, 4 bits
-        1, 2, 3, 4, 5, 6, 7, 8, 9,                      // entries 0 to 2, three bytes each
-        0, 0, 0, 0, 0, 0, 0, 0, 0, 0, 0, 0, 0, 0, 0, 0, 0, 0, 0, 0, 0, 0, 0, 0, 0, 0, 0,
-        0, 0, 0, 0, 0, 0, 0, 0, 0, 0, 0, 0,             // entries 3 to 15
-        0x21, 0x00, 0, 0,                               // indices 2, 1, 0
+        'B',  'M',  0, 0, 0, 0, 0, 0, 0, 0, 74, 0, 0, 0,  // file header: pixels at 14 + 12 + 48
+        12,   0,    0, 0, 3, 0, 1, 0, 1, 0, 4,  0,        // 3 x 1, 1 plane, 4 bits
+        1,    2,    3, 4, 5, 6, 7, 8, 9,                  // entries 0 to 2, three bytes each
+        0,    0,    0, 0, 0, 0, 0, 0, 0, 0, 0,  0, 0, 0, 0, 0, 0, 0, 0, 0,
+        0,    0,    0, 0, 0, 0, 0, 0, 0, 0, 0,  0, 0, 0, 0, 0, 0, 0, 0,  // entries 3 to 15
+        0x21, 0x00, 0, 0,                                                // indices 2, 1, 0
     };
     TReadResult result;
     Read(bytes, result);
@@ -187,9 +194,9 @@ TEST(BmpReader, TellsHeadersBySize) {
     const struct {
         std::uint32_t size;
         TIOBMPVersion version;
-    } cases[] = {{16, ioBMP_BM},      {40, ioBMP_BM3},  {52, ioBMP_BM},
-                 {56, ioBMP_BM},      {64, ioBMP_BMOS2V2}, {90, ioBMP_BM},
-                 {108, ioBMP_V4},     {124, ioBMP_V5},  {300, ioBMP_BM}};
+    } cases[] = {{16, ioBMP_BM},  {40, ioBMP_BM3},     {52, ioBMP_BM},
+                 {56, ioBMP_BM},  {64, ioBMP_BMOS2V2}, {90, ioBMP_BM},
+                 {108, ioBMP_V4}, {124, ioBMP_V5},     {300, ioBMP_BM}};
     for (const auto& c : cases) {
         SCOPED_TRACE(c.size);
         TReadResult result;
@@ -201,8 +208,7 @@ TEST(BmpReader, TellsHeadersBySize) {
 }
 
 TEST(BmpReader, OneBitFollowsTheOrderOfBlackAndWhite) {
-    const TBytes header =
-        MakeHeader({.width = 10, .height = 1, .bits = 1, .colors_used = 2});
+    const TBytes header = MakeHeader({.width = 10, .height = 1, .bits = 1, .colors_used = 2});
     const TBytes row = {0xA5, 0x40, 0, 0};  // 10100101 01
     const TBytes black_white = {0, 0, 0, 0, 255, 255, 255, 0};
     const TBytes white_black = {255, 255, 255, 0, 0, 0, 0, 0};
@@ -247,9 +253,8 @@ TEST(BmpReader, PaletteImagesBecomeColoursOrStayIndices) {
 }
 
 TEST(BmpReader, FourBitNativeUnpacksNibbles) {
-    const TBytes bytes = Join({MakeHeader({.width = 3, .bits = 4, .colors_used = 1}),
-                               {1, 2, 3, 0},
-                               {0xF1, 0x50, 0, 0}});
+    const TBytes bytes = Join(
+        {MakeHeader({.width = 3, .bits = 4, .colors_used = 1}), {1, 2, 3, 0}, {0xF1, 0x50, 0, 0}});
     TReadResult result;
     Read(bytes, result, {.native = true});
     ASSERT_FALSE(result.failed);
@@ -340,9 +345,8 @@ TEST(BmpReader, AlphaOf32BitFiles) {
 TEST(BmpReader, MasksOf32BitFiles) {
     const TBytes pixel = {0x11, 0x22, 0x33, 0x44};
     // Red lowest, alpha highest, as four masks behind a short header.
-    const TBytes four =
-        Join({MakeHeader({.bits = 32, .compression = 3}), MakeMasks(0xFF, 0xFF00, 0xFF0000),
-              Dword(0xFF000000), pixel});
+    const TBytes four = Join({MakeHeader({.bits = 32, .compression = 3}),
+                              MakeMasks(0xFF, 0xFF00, 0xFF0000), Dword(0xFF000000), pixel});
     TReadResult result;
     Read(four, result);
     ASSERT_FALSE(result.failed);
@@ -380,8 +384,8 @@ void ExpectRle(const TBytes& bytes, const std::string& expected, bool failed) {
         ASSERT_EQ(result.bitmap.GetHeight(), 3);
         std::string found;
         for (std::int32_t i = 0; i < 12; ++i) {
-            const int value = native ? result.bitmap.GetPixels_zm8(i % 4, i / 4)
-                                     : result.At(i % 4, i / 4).r;
+            const int value =
+                native ? result.bitmap.GetPixels_zm8(i % 4, i / 4) : result.At(i % 4, i / 4).r;
             found += "0123456789ABCDEF"[value & 15];
             found += i % 4 == 3 && i < 11 ? "/" : "";
         }
@@ -397,14 +401,26 @@ TEST(BmpReader, DecodesRunLengthData) {
         const char* expected;
         bool failed;
     } cases[] = {
-        {"runs and ends of line", 8, {4, 1, 0, 0, 2, 2, 2, 3, 0, 0, 4, 4, 0, 1},
-         "4444/2233/1111", false},
-        {"literals, odd ones padded", 8, {0, 3, 1, 2, 3, 9, 1, 4, 0, 0, 0, 4, 5, 6, 7, 8, 0, 1},
-         "0000/5678/1234", false},
-        {"uncovered pixels take entry 0", 8, {1, 5, 0, 0, 0, 0, 1, 6, 0, 1},
-         "6000/0000/5000", false},
-        {"past the row's end: the last pixel", 8, {3, 1, 3, 2, 0, 0, 0, 5, 3, 4, 5, 6, 7, 0, 0, 1},
-         "0000/3457/1112", false},
+        {"runs and ends of line",
+         8,
+         {4, 1, 0, 0, 2, 2, 2, 3, 0, 0, 4, 4, 0, 1},
+         "4444/2233/1111",
+         false},
+        {"literals, odd ones padded",
+         8,
+         {0, 3, 1, 2, 3, 9, 1, 4, 0, 0, 0, 4, 5, 6, 7, 8, 0, 1},
+         "0000/5678/1234",
+         false},
+        {"uncovered pixels take entry 0",
+         8,
+         {1, 5, 0, 0, 0, 0, 1, 6, 0, 1},
+         "6000/0000/5000",
+         false},
+        {"past the row's end: the last pixel",
+         8,
+         {3, 1, 3, 2, 0, 0, 0, 5, 3, 4, 5, 6, 7, 0, 0, 1},
+         "0000/3457/1112",
+         false},
         {"delta", 8, {0, 2, 2, 1, 1, 7, 0, 0, 4, 1, 0, 1}, "1111/0070/0000", false},
         {"delta past the row's end", 8, {0, 2, 200, 0, 1, 7, 0, 1}, "0000/0000/0007", false},
         {"delta past the last row", 8, {1, 3, 0, 2, 1, 9, 4, 5, 4, 6}, "0000/0000/3000", false},
@@ -415,13 +431,21 @@ TEST(BmpReader, DecodesRunLengthData) {
         {"literals cut short", 8, {0, 4, 1, 2}, "0000/0000/1200", true},
         {"delta cut short", 8, {0, 2, 1}, "0000/0000/0000", true},
         {"a count without a value", 8, {4}, "0000/0000/0000", true},
-        {"nibbles alternate", 4, {4, 0x12, 0, 0, 3, 0x34, 0, 0, 1, 0x5F, 0, 1},
-         "5000/3430/1212", false},
-        {"nibble literals", 4, {0, 3, 0x12, 0x30, 0, 0, 0, 4, 0x45, 0x67, 0, 1},
-         "0000/4567/1230", false},
-        {"five nibbles: three bytes and a pad", 4,
+        {"nibbles alternate",
+         4,
+         {4, 0x12, 0, 0, 3, 0x34, 0, 0, 1, 0x5F, 0, 1},
+         "5000/3430/1212",
+         false},
+        {"nibble literals",
+         4,
+         {0, 3, 0x12, 0x30, 0, 0, 0, 4, 0x45, 0x67, 0, 1},
+         "0000/4567/1230",
+         false},
+        {"five nibbles: three bytes and a pad",
+         4,
          {0, 5, 0x12, 0x34, 0x50, 0, 0, 0, 4, 0x66, 0, 1},
-         "0000/6666/1235", false},
+         "0000/6666/1235",
+         false},
     };
     for (const auto& c : cases) {
         SCOPED_TRACE(c.name);
@@ -468,7 +492,7 @@ TEST(BmpReader, UndeliveredRowsAreCleared) {
     TReadResult result;
     TBytes bytes = kFile24;
     Read(bytes, result);
-    bytes.resize(62);  // the bottom row is there, the top row is not
+    bytes.resize(62);     // the bottom row is there, the top row is not
     Read(bytes, result);  // into the same storage
     EXPECT_TRUE(result.failed);
     EXPECT_EQ(result.At(0, 1), (TRGB{1, 2, 3}));
@@ -518,8 +542,7 @@ TEST(BmpReader, HeaderFieldsAtTheirLimits) {
         SCOPED_TRACE(c.name);
         TBytes bytes = kFile24;
         const TBytes value = Dword(c.value);
-        std::copy(value.begin(), value.end(),
-                  bytes.begin() + static_cast<std::ptrdiff_t>(c.at));
+        std::copy(value.begin(), value.end(), bytes.begin() + static_cast<std::ptrdiff_t>(c.at));
         TReadResult result;
         Read(bytes, result);
         EXPECT_EQ(result.failed, c.failed);
@@ -531,8 +554,8 @@ TEST(BmpReader, CompressionMustFitTheDepth) {
     const struct {
         std::uint8_t bits;
         std::uint32_t compression;
-    } cases[] = {{1, 1}, {1, 2}, {1, 3}, {4, 1}, {4, 3}, {8, 2}, {8, 3}, {16, 1}, {16, 2},
-                 {32, 1}, {32, 2}, {32, 6}};
+    } cases[] = {{1, 1}, {1, 2},  {1, 3},  {4, 1},  {4, 3},  {8, 2},
+                 {8, 3}, {16, 1}, {16, 2}, {32, 1}, {32, 2}, {32, 6}};
     for (const auto& c : cases) {
         TReadResult result;
         Read(Join({MakeHeader({.bits = c.bits, .compression = c.compression}), TBytes(2000, 0)}),

@@ -93,16 +93,15 @@ TEST(BmpWriter, Writes24Bits) {
     params.SetDpiX(72);
     params.SetDpiY(300);
     const TBytes expected = {
-        'B', 'M', 70, 0, 0, 0, 0, 0, 0, 0, 54, 0, 0, 0,  // file size 70, pixels at 54
-        40, 0, 0, 0, 2, 0, 0, 0, 2, 0, 0, 0, 1, 0, 24, 0,
-        0, 0, 0, 0,              // compression
-        16, 0, 0, 0,             // data size
-        0x13, 0x0B, 0, 0,        // 72 / 2.54 * 100 = 2834.6
-        0x23, 0x2E, 0, 0,        // 300 / 2.54 * 100 = 11811.02
-        0, 0, 0, 0,              // colours used
-        0, 0, 0, 1,              // colours important: 1 << 24
-        0, 0, 255, 128, 128, 128, 0, 0,
-        255, 0, 0, 0, 255, 0, 0, 0,
+        'B',  'M',  70,  0,   0,   0,   0, 0, 0,   0, 54, 0, 0,   0,  // file size 70, pixels at 54
+        40,   0,    0,   0,   2,   0,   0, 0, 2,   0, 0,  0, 1,   0, 24, 0,
+        0,    0,    0,   0,  // compression
+        16,   0,    0,   0,  // data size
+        0x13, 0x0B, 0,   0,  // 72 / 2.54 * 100 = 2834.6
+        0x23, 0x2E, 0,   0,  // 300 / 2.54 * 100 = 11811.02
+        0,    0,    0,   0,  // colours used
+        0,    0,    0,   1,  // colours important: 1 << 24
+        0,    0,    255, 128, 128, 128, 0, 0, 255, 0, 0,  0, 255, 0, 0,  0,
     };
     EXPECT_EQ(Write(bitmap, params), expected);
 }
@@ -136,19 +135,17 @@ TEST(BmpWriter, WritesOneBit) {
     params.UpdateBPSAndSPP(zm1g);
     const TBytes file = Write(bits, params);
     const TBytes tail = {
-        2, 0, 0, 0, 2, 0, 0, 0,            // two colours, both important
-        0, 0, 0, 0, 255, 255, 255, 0,      // black, white
-        0xFF, 0xC0, 0, 0, 0xAA, 0x80, 0, 0,
+        2,    0,    0, 0, 2,    0,    0,   0,  // two colours, both important
+        0,    0,    0, 0, 255,  255,  255, 0,  // black, white
+        0xFF, 0xC0, 0, 0, 0xAA, 0x80, 0,   0,
     };
     ASSERT_EQ(file.size(), 70u);
     EXPECT_EQ(TBytes(file.begin() + 46, file.end()), tail);
     // The 12-byte header has three bytes an entry.
     params.fBMP_Version = ioBMP_BMOS2V1;
     const TBytes expected = {
-        'B', 'M', 40, 0, 0, 0, 0, 0, 0, 0, 32, 0, 0, 0,
-        12, 0, 0, 0, 10, 0, 2, 0, 1, 0, 1, 0,
-        0, 0, 0, 255, 255, 255,
-        0xFF, 0xC0, 0, 0, 0xAA, 0x80, 0, 0,
+        'B', 'M', 40, 0, 0, 0, 0, 0, 0, 0,   32,  0,   0,    0,    12, 0, 0,    0,    10, 0,
+        2,   0,   1,  0, 1, 0, 0, 0, 0, 255, 255, 255, 0xFF, 0xC0, 0,  0, 0xAA, 0x80, 0,  0,
     };
     EXPECT_EQ(Write(bits, params), expected);
 }
@@ -186,7 +183,7 @@ TEST(BmpWriter, WritesFourBitsWithTheLongOs2Header) {
     EXPECT_EQ(TBytes(file.begin() + 2, file.begin() + 6), (TBytes{150, 0, 0, 0}));
     EXPECT_EQ(TBytes(file.begin() + 10, file.begin() + 18), (TBytes{142, 0, 0, 0, 64, 0, 0, 0}));
     EXPECT_EQ(TBytes(file.begin() + 34, file.begin() + 38), (TBytes{0, 0, 0, 0}));  // data size
-    EXPECT_EQ(TBytes(file.begin() + 54, file.begin() + 78), TBytes(24, 0));  // the OS/2 tail
+    EXPECT_EQ(TBytes(file.begin() + 54, file.begin() + 78), TBytes(24, 0));         // the OS/2 tail
     // Few colours stand in the palette as they turn up from the top.
     const TBytes palette = {255, 0, 0, 0, 0, 255, 0, 0, 0, 0, 255, 0, 128, 128, 128, 0};
     EXPECT_EQ(TBytes(file.begin() + 78, file.begin() + 94), palette);
@@ -371,7 +368,7 @@ class BmpRoundTrip : public testing::TestWithParam<TRoundTripCase> {};
 
 TEST_P(BmpRoundTrip, KeepsPixels) {
     const TRoundTripCase& c = GetParam();
-    constexpr std::int32_t kSizes[][2] = {{1, 1}, {1, 2},  {7, 1},  {3, 3},   {16, 15},
+    constexpr std::int32_t kSizes[][2] = {{1, 1},  {1, 2},  {7, 1},  {3, 3},  {16, 15},
                                           {31, 5}, {32, 4}, {33, 7}, {301, 2}};
     for (const auto& size : kSizes) {
         SCOPED_TRACE(testing::Message() << size[0] << " x " << size[1]);
@@ -386,17 +383,16 @@ TEST_P(BmpRoundTrip, KeepsPixels) {
     }
 }
 
-INSTANTIATE_TEST_SUITE_P(
-    All, BmpRoundTrip,
-    testing::Values(TRoundTripCase{zm1g, ioBMP_BM3, ioBMP_UNCOMPRESSED},
-                    TRoundTripCase{zm1g, ioBMP_BMOS2V1, ioBMP_RLE},
-                    TRoundTripCase{zm8p, ioBMP_BM3, ioBMP_UNCOMPRESSED},
-                    TRoundTripCase{zm8p, ioBMP_BM3, ioBMP_RLE},
-                    TRoundTripCase{zm8p, ioBMP_BMOS2V1, ioBMP_RLE},
-                    TRoundTripCase{zm8p, ioBMP_BMOS2V2, ioBMP_RLE},
-                    TRoundTripCase{zm24RGB, ioBMP_BM3, ioBMP_RLE},
-                    TRoundTripCase{zm24RGB, ioBMP_BMOS2V1, ioBMP_UNCOMPRESSED},
-                    TRoundTripCase{zm24RGB, ioBMP_V5, ioBMP_UNCOMPRESSED}));
+INSTANTIATE_TEST_SUITE_P(All, BmpRoundTrip,
+                         testing::Values(TRoundTripCase{zm1g, ioBMP_BM3, ioBMP_UNCOMPRESSED},
+                                         TRoundTripCase{zm1g, ioBMP_BMOS2V1, ioBMP_RLE},
+                                         TRoundTripCase{zm8p, ioBMP_BM3, ioBMP_UNCOMPRESSED},
+                                         TRoundTripCase{zm8p, ioBMP_BM3, ioBMP_RLE},
+                                         TRoundTripCase{zm8p, ioBMP_BMOS2V1, ioBMP_RLE},
+                                         TRoundTripCase{zm8p, ioBMP_BMOS2V2, ioBMP_RLE},
+                                         TRoundTripCase{zm24RGB, ioBMP_BM3, ioBMP_RLE},
+                                         TRoundTripCase{zm24RGB, ioBMP_BMOS2V1, ioBMP_UNCOMPRESSED},
+                                         TRoundTripCase{zm24RGB, ioBMP_V5, ioBMP_UNCOMPRESSED}));
 
 TEST(BmpRoundTrip, KeepsAlphaAndNibbles) {
     auto source = test::MakeNoise(zm24RGB, 33, 9, 5);

@@ -78,8 +78,8 @@ TBytes RichJpeg(bool progressive) {
     TRawSettings settings;
     settings.progressive = progressive;
     settings.write_markers = [](jpeg_compress_struct& encoder) {
-        const std::string block(
-            "Exif\0\0MM\0\52\0\0\0\10\0\1\1\22\0\3\0\0\0\1\0\6\0\0\0\0\0\0", 32);
+        const std::string block("Exif\0\0MM\0\52\0\0\0\10\0\1\1\22\0\3\0\0\0\1\0\6\0\0\0\0\0\0",
+                                32);
         jpeg_write_marker(&encoder, 0xE1, reinterpret_cast<const JOCTET*>(block.data()),
                           static_cast<unsigned>(block.size()));
         jpeg_write_marker(&encoder, JPEG_COM, reinterpret_cast<const JOCTET*>("text"), 4);
@@ -136,22 +136,22 @@ TEST(CodecMemory, WritersBearTheFailureOfEveryAllocation) {
     mask.SetFull(false);
     for (const std::int32_t samples : {1, 4}) {
         FailEveryAllocation([&](TAllocProbe& probe, std::int64_t n) {
-            return WriteWithFailure(probe, n, *bitmap,
-                                    [&](TStream& stream, TZmBitmap& image, TProgressRec& progress,
-                                        TIOParams& params) {
-                                        params.fSamplesPerPixel = samples;
-                                        WritePNGStream(stream, image, params, &mask, progress);
-                                    });
+            return WriteWithFailure(
+                probe, n, *bitmap,
+                [&](TStream& stream, TZmBitmap& image, TProgressRec& progress, TIOParams& params) {
+                    params.fSamplesPerPixel = samples;
+                    WritePNGStream(stream, image, params, &mask, progress);
+                });
         });
     }
     for (const bool progressive : {false, true}) {
         FailEveryAllocation([&](TAllocProbe& probe, std::int64_t n) {
-            return WriteWithFailure(probe, n, *bitmap,
-                                    [&](TStream& stream, TZmBitmap& image, TProgressRec& progress,
-                                        TIOParams& params) {
-                                        params.fJPEG_Progressive = progressive;
-                                        WriteJPEGStream(stream, image, params, progress);
-                                    });
+            return WriteWithFailure(
+                probe, n, *bitmap,
+                [&](TStream& stream, TZmBitmap& image, TProgressRec& progress, TIOParams& params) {
+                    params.fJPEG_Progressive = progressive;
+                    WriteJPEGStream(stream, image, params, progress);
+                });
         });
     }
     ExpectSamePixels(*MakeGradient(zm24RGB, 33, 21), *bitmap);

@@ -42,8 +42,8 @@ void ReadPlainPicture(const std::filesystem::path& path, TPlainPicture& picture)
     const auto* text = reinterpret_cast<const char*>(picture.bytes.data());
     char kind = 0;
     int header = 0;
-    const int found = std::sscanf(text, "P%c %d %d 255%n", &kind, &picture.width,
-                                  &picture.height, &header);
+    const int found =
+        std::sscanf(text, "P%c %d %d 255%n", &kind, &picture.width, &picture.height, &header);
     ASSERT_EQ(found, 3) << path;
     picture.channels = kind == '5' ? 1 : 3;
     picture.pixels = picture.bytes.data() + header + 1;
@@ -84,8 +84,8 @@ TEST(CodecTools, CorpusJpegsAsTheLibrarysDecoderSeesThem) {
         }
         SCOPED_TRACE(entry.path.string());
         const std::filesystem::path out = folder.File("djpeg.ppm");
-        const std::string command = "djpeg -dct int -pnm -outfile " + out.string() + " " +
-                                    entry.path.string();
+        const std::string command =
+            "djpeg -dct int -pnm -outfile " + out.string() + " " + entry.path.string();
         const bool is_good = RunProcess(command, folder.Path()).exit_status == 0;
         TZmBitmap bitmap;
         TIOParams params;
@@ -211,8 +211,8 @@ TEST(CodecTools, WrittenJpegsOpenInTheLibrarysDecoder) {
             SaveTo(folder, "out.jpg", *bitmap, ioJPEG, params);
             const std::filesystem::path out = folder.File("out.ppm");
             const TProcessResult result =
-                RunProcess("djpeg -verbose -verbose -dct int -pnm -outfile " + out.string() +
-                               " " + folder.File("out.jpg").string(),
+                RunProcess("djpeg -verbose -verbose -dct int -pnm -outfile " + out.string() + " " +
+                               folder.File("out.jpg").string(),
                            folder.Path());
             ASSERT_EQ(result.exit_status, 0) << result.standard_error;
             EXPECT_NE(result.standard_error.find("note"), std::string::npos);
@@ -260,8 +260,8 @@ TEST(CodecTools, TurnedPhotosLieAsAnotherProgramTurnsThem) {
         }
         SCOPED_TRACE(entry.path.string());
         const std::filesystem::path out = folder.File("out.ppm");
-        const std::string command = "convert " + entry.path.string() +
-                                    " -auto-orient -depth 8 PPM:" + out.string();
+        const std::string command =
+            "convert " + entry.path.string() + " -auto-orient -depth 8 PPM:" + out.string();
         ASSERT_EQ(RunProcess(command, folder.Path()).exit_status, 0);
         TIOParams params;
         params.fJPEG_EnableAdjustOrientation = true;

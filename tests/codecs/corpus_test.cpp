@@ -37,8 +37,8 @@ void DecodeExpanded(const std::filesystem::path& path, TExpandedPng& png) {
         const std::uint8_t* at;
         std::size_t left;
     } source{bytes.data(), bytes.size()};
-    png_structp library = png_create_read_struct(
-        PNG_LIBPNG_VER_STRING, nullptr, nullptr, [](png_structp, png_const_charp) {});
+    png_structp library = png_create_read_struct(PNG_LIBPNG_VER_STRING, nullptr, nullptr,
+                                                 [](png_structp, png_const_charp) {});
     png_infop info = png_create_info_struct(library);
     if (setjmp(png_jmpbuf(library)) == 0) {
         png_set_read_fn(library, &source, [](png_structp self, png_bytep target, size_t count) {
@@ -145,8 +145,8 @@ TEST(Corpus, DamagedFilesComeBack) {
         for (const std::int32_t type : {ioBMP, ioJPEG, ioPNG}) {
             TZmBitmap bitmap;
             TIOParams params;
-            const bool is_read = bitmap.Read(
-                bytes.data(), static_cast<std::int64_t>(bytes.size()), type, &params);
+            const bool is_read =
+                bitmap.Read(bytes.data(), static_cast<std::int64_t>(bytes.size()), type, &params);
             EXPECT_TRUE(!is_read || !bitmap.IsEmpty());
         }
     }

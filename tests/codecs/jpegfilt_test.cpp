@@ -42,7 +42,6 @@ void ExpectRgb(const TRawJpeg& raw, TZmBitmap& bitmap) {
     }
 }
 
-
 TBytes InsertAt(TBytes bytes, std::size_t at, const TBytes& added) {
     bytes.insert(bytes.begin() + static_cast<std::ptrdiff_t>(at), added.begin(), added.end());
     return bytes;
@@ -50,8 +49,8 @@ TBytes InsertAt(TBytes bytes, std::size_t at, const TBytes& added) {
 
 std::size_t FindMarker(const TBytes& bytes, std::uint8_t type) {
     const std::uint8_t marker[2] = {0xFF, type};
-    return static_cast<std::size_t>(
-        std::search(bytes.begin(), bytes.end(), marker, marker + 2) - bytes.begin());
+    return static_cast<std::size_t>(std::search(bytes.begin(), bytes.end(), marker, marker + 2) -
+                                    bytes.begin());
 }
 
 TEST(JpegReader, ColorsEqualTheLibrarysOwn) {
@@ -83,8 +82,9 @@ TEST(JpegReader, ColorsEqualTheLibrarysOwn) {
         settings.arithmetic = one.arithmetic;
         const TBytes file = EncodeRawJpeg(settings);
         for (const TIOJPEGScale scale : {ioJPEG_FULLSIZE, ioJPEG_HALF, ioJPEG_EIGHTH}) {
-            const unsigned denominator =
-                scale == ioJPEG_FULLSIZE ? 1 : scale == ioJPEG_HALF ? 2 : 8;
+            const unsigned denominator = scale == ioJPEG_FULLSIZE ? 1
+                                         : scale == ioJPEG_HALF   ? 2
+                                                                  : 8;
             TLoaded loaded;
             loaded.params.fJPEG_Scale = scale;
             Load(loaded, file);
@@ -190,11 +190,10 @@ TEST(JpegReader, AutomaticScale) {
         std::int32_t wanted_width;
         std::int32_t wanted_height;
         std::int32_t denominator;
-    } const cases[] = {{1600, 1200, 400, 300, 4}, {1600, 1200, 401, 300, 2},
-                       {1600, 1200, 200, 150, 8}, {1600, 1200, 1, 1, 8},
-                       {1600, 1200, 801, 600, 1}, {1600, 1200, 0, 300, 1},
-                       {1600, 1200, 400, -1, 1},  {1599, 1200, 400, 300, 2},
-                       {100, 100, 2000, 2000, 1}};
+    } const cases[] = {
+        {1600, 1200, 400, 300, 4}, {1600, 1200, 401, 300, 2}, {1600, 1200, 200, 150, 8},
+        {1600, 1200, 1, 1, 8},     {1600, 1200, 801, 600, 1}, {1600, 1200, 0, 300, 1},
+        {1600, 1200, 400, -1, 1},  {1599, 1200, 400, 300, 2}, {100, 100, 2000, 2000, 1}};
     for (const auto& one : cases) {
         TRawSettings settings;
         settings.width = one.width;
@@ -205,8 +204,7 @@ TEST(JpegReader, AutomaticScale) {
         loaded.params.fHeight = one.wanted_height;
         Load(loaded, EncodeRawJpeg(settings));
         EXPECT_EQ(loaded.params.fJPEG_ScaleUsed, one.denominator);
-        EXPECT_EQ(loaded.bitmap.GetWidth(),
-                  (one.width + one.denominator - 1) / one.denominator);
+        EXPECT_EQ(loaded.bitmap.GetWidth(), (one.width + one.denominator - 1) / one.denominator);
         EXPECT_EQ(loaded.params.fWidth, one.wanted_width);  // still the wish
     }
 }
@@ -254,15 +252,15 @@ TEST(JpegReader, MarkersSurviveLoadAndSaveInOrder) {
         return result;
     };
     EXPECT_EQ(texts(loaded.params.fJPEG_MarkerList),
-              (std::vector<std::string>{"254:first", "237:thirteen", "225:one",
-                                        "224:another APP0", "238:not Adobe's", "239:"}));
+              (std::vector<std::string>{"254:first", "237:thirteen", "225:one", "224:another APP0",
+                                        "238:not Adobe's", "239:"}));
     TMemoryStream saved;
     WriteJPEGStream(saved, loaded.bitmap, loaded.params, loaded.progress.record);
     TLoaded again;
     Load(again, saved.Bytes());
     EXPECT_EQ(texts(again.params.fJPEG_MarkerList),
-              (std::vector<std::string>{"254:first", "237:thirteen", "225:one",
-                                        "224:another APP0", "239:"}));
+              (std::vector<std::string>{"254:first", "237:thirteen", "225:one", "224:another APP0",
+                                        "239:"}));
 }
 
 TEST(JpegReader, TruncationAtEveryByte) {
@@ -335,8 +333,7 @@ TEST(JpegReader, HostileFiles) {
     EXPECT_EQ(refused.params.fOriginalWidth, 65280);
 
     const std::uint8_t scan_marker[2] = {0xFF, 0xDA};
-    const auto last_scan =
-        std::find_end(file.begin(), file.end(), scan_marker, scan_marker + 2);
+    const auto last_scan = std::find_end(file.begin(), file.end(), scan_marker, scan_marker + 2);
     const TBytes scan(last_scan, file.end() - 2);
     TBytes many(file.begin(), file.end() - 2);
     for (int i = 0; i < 1000; ++i) {
@@ -367,8 +364,8 @@ TEST(JpegReader, AbortAtEveryStepAndRaisingStreams) {
     for (const std::int64_t good : {std::int64_t{0}, static_cast<std::int64_t>(file.size()) - 1}) {
         TRaisingStream stream(file, good);
         TLoaded loaded;
-        EXPECT_NO_THROW(ReadJPEGStream(stream, loaded.bitmap, {}, loaded.progress.record,
-                                       loaded.params));
+        EXPECT_NO_THROW(
+            ReadJPEGStream(stream, loaded.bitmap, {}, loaded.progress.record, loaded.params));
         EXPECT_TRUE(loaded.progress.aborting);
     }
 }

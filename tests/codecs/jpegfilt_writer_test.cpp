@@ -26,9 +26,10 @@ void MakeSmooth(TZmBitmap& bitmap) {
     ASSERT_TRUE(bitmap.Allocate(33, 21, zm24RGB));
     for (std::int32_t y = 0; y < 21; ++y) {
         for (std::int32_t x = 0; x < 33; ++x) {
-            bitmap.SetPixels_zm24RGB(x, y, TRGB{static_cast<std::uint8_t>(40 + x * 4),
-                                                static_cast<std::uint8_t>(200 - y * 5),
-                                                static_cast<std::uint8_t>(90 + x * 2 + y)});
+            bitmap.SetPixels_zm24RGB(
+                x, y,
+                TRGB{static_cast<std::uint8_t>(40 + x * 4), static_cast<std::uint8_t>(200 - y * 5),
+                     static_cast<std::uint8_t>(90 + x * 2 + y)});
         }
     }
 }

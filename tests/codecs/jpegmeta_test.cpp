@@ -28,15 +28,13 @@ TBytes BytesOfText(const std::string& text) {
 /// A directory of two entries, the second the orientation.
 TBytes ExifBlock(bool big_endian, std::uint8_t orientation) {
     if (big_endian) {
-        return {'M', 'M', 0, 42, 0, 0, 0, 8, 0, 2,                       // directory at 8
-                1,   0x0F, 0, 2, 0, 0, 0, 4, 'a', 'b', 'c', 0,           // maker
-                1,   0x12, 0, 3, 0, 0, 0, 1, 0,   orientation, 0, 0,     // orientation, short
+        return {'M', 'M',  0, 42, 0, 0, 0, 8, 0,   2,                    // directory at 8
+                1,   0x0F, 0, 2,  0, 0, 0, 4, 'a', 'b',         'c', 0,  // maker
+                1,   0x12, 0, 3,  0, 0, 0, 1, 0,   orientation, 0,   0,  // orientation, short
                 0,   0,    0, 0};
     }
-    return {'I',  'I', 42, 0, 8, 0, 0, 0, 2,   0,
-            0x0F, 1,   2,  0, 4, 0, 0, 0, 'a', 'b', 'c', 0,
-            0x12, 1,   3,  0, 1, 0, 0, 0, orientation, 0, 0, 0,
-            0,    0,   0,  0};
+    return {'I', 'I', 42, 0,    8, 0, 0, 0, 2, 0, 0x0F, 1,           2, 0, 4, 0, 0, 0, 'a',
+            'b', 'c', 0,  0x12, 1, 3, 0, 1, 0, 0, 0,    orientation, 0, 0, 0, 0, 0, 0, 0};
 }
 
 TBytes ExifMarker(std::uint8_t orientation) {
@@ -109,7 +107,7 @@ TEST(ExifOrientation, BothByteOrdersAndDamage) {
 
 /// Letters by row as they lie in the file, and upright.
 TEST(TurnUpright, ByHand) {
-    const char* const expected[8] = {"abc/def", "cba/fed", "fed/cba", "def/abc",
+    const char* const expected[8] = {"abc/def",  "cba/fed",  "fed/cba",  "def/abc",
                                      "ad/be/cf", "da/eb/fc", "fc/eb/da", "cf/be/ad"};
     for (std::int32_t orientation = 1; orientation <= 8; ++orientation) {
         TZmBitmap bitmap(3, 2, zm8g);
@@ -178,11 +176,13 @@ TEST(JpegOrientation, IsAppliedOnlyWhenEnabledAndTheMarkerFollows) {
 }
 
 TEST(JpegMetadata, IptcAndXmpAreReadAndNotWhenUnwanted) {
-    TBytes resource = BytesOfText(std::string("Photoshop 3.0\0" "8BIM\4\4\0\0\0\0\0\10", 26));
+    TBytes resource =
+        BytesOfText(std::string("Photoshop 3.0\0"
+                                "8BIM\4\4\0\0\0\0\0\10",
+                                26));
     resource.insert(resource.end(), {0x1C, 2, 5, 0, 3, 'T', 'i', 't'});
     const std::string packet = "<x:xmpmeta/>";
-    const TBytes xmp =
-        BytesOfText(std::string("http://ns.adobe.com/xap/1.0/\0", 29) + packet);
+    const TBytes xmp = BytesOfText(std::string("http://ns.adobe.com/xap/1.0/\0", 29) + packet);
     const TBytes file = FileWith({{0xED, {0x1C, 2, 5, 0, 1, 'X'}}, {0xED, resource}, {0xE1, xmp}});
     TLoaded loaded;
     Load(loaded, file);
@@ -212,9 +212,9 @@ TEST(JpegProfile, PiecesAreJoinedByNumberAndCutAgain) {
     EXPECT_EQ(join({ProfilePiece(1, 1, "one")}), "one");
     EXPECT_EQ(join({ProfilePiece(2, 2, "two"), ProfilePiece(1, 2, "one")}), "onetwo");
     EXPECT_EQ(join({}), "");
-    EXPECT_EQ(join({ProfilePiece(1, 2, "one")}), "");                             // lacks one
-    EXPECT_EQ(join({ProfilePiece(1, 2, "a"), ProfilePiece(1, 2, "b")}), "");      // twice
-    EXPECT_EQ(join({ProfilePiece(1, 2, "a"), ProfilePiece(2, 3, "b")}), "");      // disagree
+    EXPECT_EQ(join({ProfilePiece(1, 2, "one")}), "");                         // lacks one
+    EXPECT_EQ(join({ProfilePiece(1, 2, "a"), ProfilePiece(1, 2, "b")}), "");  // twice
+    EXPECT_EQ(join({ProfilePiece(1, 2, "a"), ProfilePiece(2, 3, "b")}), "");  // disagree
     EXPECT_EQ(join({ProfilePiece(0, 1, "a")}), "");
     EXPECT_EQ(join({ProfilePiece(255, 1, "a")}), "");
 
@@ -285,19 +285,21 @@ private:
 };
 
 TMarkers AllMarkers(const std::string& profile) {
-    TBytes resource = BytesOfText(std::string("Photoshop 3.0\0" "8BIM\4\4\0\0\0\0\0\6", 26));
+    TBytes resource =
+        BytesOfText(std::string("Photoshop 3.0\0"
+                                "8BIM\4\4\0\0\0\0\0\6",
+                                26));
     resource.insert(resource.end(), {0x1C, 2, 5, 0, 1, 'T'});
     const TBytes xmp = BytesOfText(std::string("http://ns.adobe.com/xap/1.0/\0", 29) + "<x/>");
-    return {{0xE2, ProfilePiece(1, 1, profile)}, {0xE1, xmp}, {0xE1, ExifMarker(1)},
-            {0xED, resource}};
+    return {
+        {0xE2, ProfilePiece(1, 1, profile)}, {0xE1, xmp}, {0xE1, ExifMarker(1)}, {0xED, resource}};
 }
 
 TEST(JpegHooks, RunInTheStatedOrderWhateverTheMarkersOrder) {
     const TRecordingHooks hooks;
     TLoaded loaded;
     Load(loaded, FileWith(AllMarkers("own")));
-    EXPECT_EQ(hooks.calls,
-              (std::vector<std::string>{"exif after T", "profile own after <x/>"}));
+    EXPECT_EQ(hooks.calls, (std::vector<std::string>{"exif after T", "profile own after <x/>"}));
     EXPECT_EQ(loaded.params.GetDpiX(), 72);  // the file's 1 by 1 is a placeholder
     EXPECT_EQ(loaded.params.GetDpiY(), 96);
     hooks.calls.clear();

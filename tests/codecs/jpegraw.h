@@ -89,9 +89,8 @@ inline void DecodeRawJpeg(const std::vector<std::uint8_t>& bytes, J_COLOR_SPACE 
         jpeg_start_decompress(&decoder);
         raw.width = static_cast<int>(decoder.output_width);
         raw.height = static_cast<int>(decoder.output_height);
-        const std::size_t row_bytes =
-            static_cast<std::size_t>(decoder.output_width) *
-            static_cast<std::size_t>(decoder.output_components);
+        const std::size_t row_bytes = static_cast<std::size_t>(decoder.output_width) *
+                                      static_cast<std::size_t>(decoder.output_components);
         raw.pixels.resize(row_bytes * decoder.output_height);
         while (decoder.output_scanline < decoder.output_height) {
             JSAMPROW row = raw.pixels.data() + decoder.output_scanline * row_bytes;

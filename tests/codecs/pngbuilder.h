@@ -106,9 +106,9 @@ inline TBytes TPngPicture::Build() const {
     TBytes header;
     PutU32BE(header, width);
     PutU32BE(header, height);
-    header.insert(header.end(), {static_cast<std::uint8_t>(depth),
-                                 static_cast<std::uint8_t>(color_type), 0, 0,
-                                 static_cast<std::uint8_t>(interlaced ? 1 : 0)});
+    header.insert(header.end(),
+                  {static_cast<std::uint8_t>(depth), static_cast<std::uint8_t>(color_type), 0, 0,
+                   static_cast<std::uint8_t>(interlaced ? 1 : 0)});
     append(PngChunk("IHDR", header));
     if (color_type == 3) {
         TBytes palette;

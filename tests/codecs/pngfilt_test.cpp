@@ -77,11 +77,11 @@ TEST(PngReader, EveryColorTypeDepthAndInterlacing) {
     for (const TKind kind : kKinds) {
         for (const auto& size : kSizes) {
             for (const bool interlaced : {false, true}) {
-                const TPngPicture picture{size[0],         size[1],    kind.depth,
-                                          kind.color_type, interlaced, {}, {}};
-                SCOPED_TRACE(testing::Message() << "type " << kind.color_type << " depth "
-                                                << kind.depth << " interlaced " << interlaced
-                                                << " width " << size[0]);
+                const TPngPicture picture{size[0],    size[1], kind.depth, kind.color_type,
+                                          interlaced, {},      {}};
+                SCOPED_TRACE(testing::Message()
+                             << "type " << kind.color_type << " depth " << kind.depth
+                             << " interlaced " << interlaced << " width " << size[0]);
                 TLoaded loaded;
                 Load(loaded, picture.Build());
                 ASSERT_FALSE(loaded.progress.aborting);
@@ -111,9 +111,9 @@ TEST(PngReader, NativeModeKeepsWholeByteGrayAndPalette) {
         Load(loaded, picture.Build());
         ASSERT_FALSE(loaded.progress.aborting);
         const bool is_gray = kind.color_type == 0;
-        const TZmPixelFormat expected = is_gray && kind.depth == 1     ? zm1g
-                                        : is_gray && kind.depth == 8   ? zm8g
-                                        : is_gray && kind.depth == 16  ? zm16g
+        const TZmPixelFormat expected = is_gray && kind.depth == 1                ? zm1g
+                                        : is_gray && kind.depth == 8              ? zm8g
+                                        : is_gray && kind.depth == 16             ? zm16g
                                         : kind.color_type == 3 && kind.depth == 8 ? zm8p
                                                                                   : zm24RGB;
         ASSERT_EQ(loaded.bitmap.GetPixelFormat(), expected);
@@ -124,7 +124,6 @@ TEST(PngReader, NativeModeKeepsWholeByteGrayAndPalette) {
         }
     }
 }
-
 
 TEST(PngReader, TransparencyChunkBecomesAlpha) {
     const auto low = [](std::uint32_t value) { return static_cast<std::uint8_t>(value); };
@@ -173,8 +172,9 @@ TEST(PngReader, ResolutionIsRoundedAndFallsBackToTheSettings) {
         std::int32_t dpi_x;
         std::int32_t dpi_y;
     } const cases[] = {
-        {PhysChunk(2835, 11811, 1), 72, 300}, {PhysChunk(3937, 3780, 1), 100, 96},
-        {PhysChunk(19, 20, 1), 300, 1},       // 0.4826 and 0.508
+        {PhysChunk(2835, 11811, 1), 72, 300},
+        {PhysChunk(3937, 3780, 1), 100, 96},
+        {PhysChunk(19, 20, 1), 300, 1},        // 0.4826 and 0.508
         {PhysChunk(4000, 4000, 0), 300, 300},  // an aspect ratio only
         {{}, 300, 300},
     };
@@ -289,8 +289,8 @@ TEST(PngReader, BackgroundByColorType) {
         {3, 2, {2}, {220, 139, 58}},  // entry 2 of the palette: 58, 139, 220
     };
     for (const auto& one : cases) {
-        const TPngPicture picture{1, 1, one.depth, one.color_type, false,
-                                  PngChunk("bKGD", one.data), {}};
+        const TPngPicture picture{
+            1, 1, one.depth, one.color_type, false, PngChunk("bKGD", one.data), {}};
         TLoaded loaded;
         Load(loaded, picture.Build(), /*params_only=*/true);
         EXPECT_EQ(loaded.params.fPNG_Background, one.expected) << one.color_type;
@@ -442,8 +442,8 @@ TEST(PngReader, RaisingStreamsEndAsFailure) {
     for (const std::int64_t good : {std::int64_t{0}, static_cast<std::int64_t>(file.size()) - 1}) {
         TRaisingStream stream(file, good);
         TLoaded loaded;
-        EXPECT_NO_THROW(ReadPNGStream(stream, loaded.bitmap, loaded.params, false,
-                                      loaded.progress.record));
+        EXPECT_NO_THROW(
+            ReadPNGStream(stream, loaded.bitmap, loaded.params, false, loaded.progress.record));
         EXPECT_TRUE(loaded.progress.aborting);
     }
 }

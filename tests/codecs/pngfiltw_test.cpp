@@ -115,8 +115,7 @@ TBytes SaveAs(TZmBitmap& bitmap, std::int32_t samples, std::int32_t bits) {
 TRGB RawColor(const TRawPng& raw, std::size_t x, std::size_t y) {
     const TBytes& row = raw.rows[y];
     switch (raw.color_type) {
-        case PNG_COLOR_TYPE_PALETTE:
-            return raw.palette[row[x]];
+        case PNG_COLOR_TYPE_PALETTE: return raw.palette[row[x]];
         case PNG_COLOR_TYPE_GRAY: {
             const std::uint8_t value = raw.depth == 16  ? row[x * 2]
                                        : raw.depth == 1 ? static_cast<std::uint8_t>(row[x] * 255)
@@ -152,15 +151,15 @@ TEST(PngWriter, LayoutBySourceAndParameters) {
         int color_type;
         int depth;
     } const cases[] = {
-        {zm1g, 1, 1, PNG_COLOR_TYPE_GRAY, 1},      {zm1g, 3, 8, PNG_COLOR_TYPE_RGB, 8},
-        {zm1g, 1, 8, PNG_COLOR_TYPE_GRAY, 8},      {zm8p, 1, 8, PNG_COLOR_TYPE_PALETTE, 8},
-        {zm8p, 1, 4, PNG_COLOR_TYPE_PALETTE, 8},   {zm8p, 3, 8, PNG_COLOR_TYPE_RGB, 8},
-        {zm8g, 1, 8, PNG_COLOR_TYPE_GRAY, 8},      {zm8g, 3, 8, PNG_COLOR_TYPE_RGB, 8},
-        {zm16g, 1, 16, PNG_COLOR_TYPE_GRAY, 16},   {zm16g, 1, 12, PNG_COLOR_TYPE_GRAY, 16},
-        {zm16g, 1, 8, PNG_COLOR_TYPE_GRAY, 8},     {zm24RGB, 3, 8, PNG_COLOR_TYPE_RGB, 8},
-        {zm24RGB, 3, 16, PNG_COLOR_TYPE_RGB, 8},   {zm24RGB, 1, 8, PNG_COLOR_TYPE_PALETTE, 8},
+        {zm1g, 1, 1, PNG_COLOR_TYPE_GRAY, 1},        {zm1g, 3, 8, PNG_COLOR_TYPE_RGB, 8},
+        {zm1g, 1, 8, PNG_COLOR_TYPE_GRAY, 8},        {zm8p, 1, 8, PNG_COLOR_TYPE_PALETTE, 8},
+        {zm8p, 1, 4, PNG_COLOR_TYPE_PALETTE, 8},     {zm8p, 3, 8, PNG_COLOR_TYPE_RGB, 8},
+        {zm8g, 1, 8, PNG_COLOR_TYPE_GRAY, 8},        {zm8g, 3, 8, PNG_COLOR_TYPE_RGB, 8},
+        {zm16g, 1, 16, PNG_COLOR_TYPE_GRAY, 16},     {zm16g, 1, 12, PNG_COLOR_TYPE_GRAY, 16},
+        {zm16g, 1, 8, PNG_COLOR_TYPE_GRAY, 8},       {zm24RGB, 3, 8, PNG_COLOR_TYPE_RGB, 8},
+        {zm24RGB, 3, 16, PNG_COLOR_TYPE_RGB, 8},     {zm24RGB, 1, 8, PNG_COLOR_TYPE_PALETTE, 8},
         {zm24RGB, 1, 16, PNG_COLOR_TYPE_PALETTE, 8}, {zm32RGB, 4, 8, PNG_COLOR_TYPE_RGB, 8},
-        {zmCMYK, 4, 8, PNG_COLOR_TYPE_RGB, 8},     {zm48RGB, 3, 16, PNG_COLOR_TYPE_RGB, 8},
+        {zmCMYK, 4, 8, PNG_COLOR_TYPE_RGB, 8},       {zm48RGB, 3, 16, PNG_COLOR_TYPE_RGB, 8},
     };
     for (const auto& one : cases) {
         SCOPED_TRACE(testing::Message() << "format " << static_cast<int>(one.source) << " samples "
@@ -336,8 +335,7 @@ TEST(PngWriter, FullAndRaisingStreamsEndAsFailure) {
         for (std::int64_t room = 0; room < size; room += 53) {
             TFullStream stream(room, raises);
             TTestProgress progress;
-            EXPECT_NO_THROW(
-                WritePNGStream(stream, *bitmap, params, nullptr, progress.record));
+            EXPECT_NO_THROW(WritePNGStream(stream, *bitmap, params, nullptr, progress.record));
             EXPECT_TRUE(progress.aborting) << room;
         }
     }

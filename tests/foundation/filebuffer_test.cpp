@@ -126,8 +126,8 @@ TEST(FileBufferWindows, AWalkOverRowsMapsAnewOncePerWindow) {
     int breaks = 0;  // rows that do not follow the one before in memory: a new window
     const std::uint8_t* expected = nullptr;
     for (std::int64_t row = 0; row < kRows; ++row) {
-        auto* const address = static_cast<std::uint8_t*>(
-            buffer.Map(row * kRowBytes, kRowBytes, zmdReadWrite));
+        auto* const address =
+            static_cast<std::uint8_t*>(buffer.Map(row * kRowBytes, kRowBytes, zmdReadWrite));
         ASSERT_NE(address, nullptr);
         breaks += address == expected ? 0 : 1;
         expected = address + kRowBytes;

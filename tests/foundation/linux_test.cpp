@@ -180,11 +180,11 @@ TEST(LinuxNames, AnyBytesNameAFile) {
 
 TEST(LinuxBoundary, HostMessagesGoToTheFunction) {
     static std::uint32_t seen = 0;
-    const platform::THostMessageFunction function =
-        [](std::uint32_t message, std::uintptr_t wparam, std::intptr_t lparam) {
-            seen = message;
-            return static_cast<std::intptr_t>(wparam) - lparam;
-        };
+    const platform::THostMessageFunction function = [](std::uint32_t message, std::uintptr_t wparam,
+                                                       std::intptr_t lparam) {
+        seen = message;
+        return static_cast<std::intptr_t>(wparam) - lparam;
+    };
     EXPECT_EQ(platform::SendHostMessage(reinterpret_cast<void*>(function), 24601, 50, 8), 42);
     EXPECT_EQ(seen, 24601u);
 }

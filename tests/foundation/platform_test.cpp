@@ -158,8 +158,8 @@ TEST(Memory, WindowsOfAMappingShowTheFile) {
     const auto mapping = CreateTemporaryMapping(u"", "a/../b", size);
     ASSERT_NE(mapping, nullptr);
     auto* const whole = static_cast<std::uint8_t*>(mapping->MapWindow(0, 3 * step));
-    auto* const last = static_cast<std::uint8_t*>(
-        mapping->MapWindow(static_cast<std::int64_t>(2 * step), step));
+    auto* const last =
+        static_cast<std::uint8_t*>(mapping->MapWindow(static_cast<std::int64_t>(2 * step), step));
     ASSERT_NE(whole, nullptr);
     ASSERT_NE(last, nullptr);
     whole[2 * step + 5] = 99;

@@ -41,8 +41,7 @@ TEST_F(Settings, ColourAndTextDefaultsHaveTheirExactValues) {
     EXPECT_EQ(settings.fMViewExplorerThumbnailExts.size(), 89u);
     EXPECT_EQ(settings.MemoShortCuts[11], 0x4047);
     EXPECT_EQ(settings.MeasureUnits[7], u"nanometers");
-    EXPECT_EQ(settings.fRedToGrayCoef + settings.fGreenToGrayCoef + settings.fBlueToGrayCoef,
-              100);
+    EXPECT_EQ(settings.fRedToGrayCoef + settings.fGreenToGrayCoef + settings.fBlueToGrayCoef, 100);
     EXPECT_EQ(settings.fEXIFInteroperabilityIndexUsage, 2);
     EXPECT_EQ(settings.fEXIFMakerNotesHandling, 1);
     EXPECT_EQ(settings.fDICOMWindowingStrategy, 2);
@@ -93,13 +92,20 @@ TEST_F(Settings, LanguageFollowsTheLocale) {
         const char* locale;
         TMsgLanguage language;
     } rows[] = {
-        {"", msEnglish},          {"en_US.UTF-8", msEnglish},
-        {"de_AT.UTF-8@euro", msGerman}, {"pt-BR", msPortuguese},
-        {"nb_NO", msNorwegian},   {"hr-HR", msSerbian},
-        {"zh_CN.UTF-8", msChinese}, {"zh-TW", msChineseTraditionalBig5},
-        {"zh-Hant-TW", msChineseTraditionalBig5}, {"zh_HK", msSystem},
-        {"zh", msSystem},         {"fil-PH", msEnglish},
-        {"FR", msFrench},         {"eo", msEnglish},
+        {"", msEnglish},
+        {"en_US.UTF-8", msEnglish},
+        {"de_AT.UTF-8@euro", msGerman},
+        {"pt-BR", msPortuguese},
+        {"nb_NO", msNorwegian},
+        {"hr-HR", msSerbian},
+        {"zh_CN.UTF-8", msChinese},
+        {"zh-TW", msChineseTraditionalBig5},
+        {"zh-Hant-TW", msChineseTraditionalBig5},
+        {"zh_HK", msSystem},
+        {"zh", msSystem},
+        {"fil-PH", msEnglish},
+        {"FR", msFrench},
+        {"eo", msEnglish},
     };
     for (const auto& row : rows) {
         EXPECT_EQ(MsgLanguageOfLocale(row.locale), row.language) << row.locale;

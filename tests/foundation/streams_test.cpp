@@ -129,8 +129,8 @@ std::string MessageOf(TCall call) {
 
 TEST(FileStreams, FailuresNameTheFileAndTheReason) {
     const TempFolder folder;
-    const std::string missing = MessageOf<EFOpenError>(
-        [&] { TFileStream(folder.Name("missing.png"), fmOpenRead); });
+    const std::string missing =
+        MessageOf<EFOpenError>([&] { TFileStream(folder.Name("missing.png"), fmOpenRead); });
     EXPECT_NE(missing.find("missing.png\". "), std::string::npos) << missing;
     EXPECT_GT(missing.size(), missing.find("\". ") + 6) << "the reason follows: " << missing;
     EXPECT_THROW(TFileStream(folder.Name("missing.png"), fmOpenReadWrite), EFOpenError);

@@ -134,12 +134,9 @@ TEST(Strings, PartsOfFileNames) {
         const char16_t* base;
         const char16_t* extension;
     } rows[] = {
-        {u"", u"", u"", u""},
-        {u"a.JPG", u"", u"a.JPG", u".JPG"},
-        {u"x.y/a", u"x.y/", u"a", u""},
-        {u"/x/a.tar.gz", u"/x/", u"a.tar.gz", u".gz"},
-        {u"x/", u"x/", u"", u""},
-        {u"x/a.", u"x/", u"a.", u"."},
+        {u"", u"", u"", u""},           {u"a.JPG", u"", u"a.JPG", u".JPG"},
+        {u"x.y/a", u"x.y/", u"a", u""}, {u"/x/a.tar.gz", u"/x/", u"a.tar.gz", u".gz"},
+        {u"x/", u"x/", u"", u""},       {u"x/a.", u"x/", u"a.", u"."},
     };
     for (const auto& row : rows) {
         EXPECT_EQ(FileFolder(row.name), row.folder);

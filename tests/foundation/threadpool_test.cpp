@@ -68,7 +68,8 @@ TEST(ThreadPool, JoinFreesInListOrder) {
     std::string freed;
     TZmThreadPool pool;
     for (const char name : std::string("abc")) {
-        pool.Add(std::make_unique<TWork>(name != 'b', [] {}, &freed, name));
+        pool.Add(std::make_unique<TWork>(
+            name != 'b', [] {}, &freed, name));
     }
     pool.Join();
     EXPECT_EQ(freed, "abc");
@@ -122,11 +123,9 @@ TEST_F(ThreadsForSize, FollowsPixelsLimitAndCores) {
         std::int32_t cores;
         std::int32_t threads;
     } rows[] = {
-        {1000, 1000, 4, 4},
-        {255, 255, 4, 1},  // 65025 pixels
-        {256, 256, 4, 4},  // 65536 pixels: the limit itself counts as large
-        {1000, 1000, 2, 2},
-        {1000, 1000, 64, 4},
+        {1000, 1000, 4, 4},   {255, 255, 4, 1},  // 65025 pixels
+        {256, 256, 4, 4},                        // 65536 pixels: the limit itself counts as large
+        {1000, 1000, 2, 2},   {1000, 1000, 64, 4},
         {65536, 32768, 4, 1},  // the product wraps to the smallest number
         {65536, 65536, 4, 1},  // the product wraps to 0
         {65536, 65537, 4, 4},  // the product wraps to 65536

@@ -63,8 +63,7 @@ TEST(Win32Boundary, ThreadsHaveMessagesOfTheirOwn) {
             for (int round = 0; round < 200; ++round) {
                 std::u16string message;
                 platform::CallCatchingHostExceptions(
-                    [&] { platform::GuardHostCall([&] { throw EZmException(text); }); },
-                    message);
+                    [&] { platform::GuardHostCall([&] { throw EZmException(text); }); }, message);
                 ASSERT_EQ(message, std::u16string(text.begin(), text.end()));
             }
         });

@@ -92,8 +92,8 @@ TEST_F(QvRun, AFailedStepIsShownAndTheOthersGoOn) {
 
 TEST_F(QvRun, ShowsStepsThatFailSilentlyAndThoseThatRaise) {
     SavePicture("a.png", 8, 8);
-    const std::string silent = WriteText(
-        "silent.qvjob", "[Open Image]\nimage_file={file}\n[Resize Image]\nimage_w=5\n");
+    const std::string silent =
+        WriteText("silent.qvjob", "[Open Image]\nimage_file={file}\n[Resize Image]\nimage_w=5\n");
     TProcessResult result = Run("run " + silent + " " + Path("a.png"));
     EXPECT_EQ(result.exit_status, 1);
     EXPECT_NE(result.standard_error.find("step 2 (Resize Image, line 3) failed: "),

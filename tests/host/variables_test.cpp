@@ -26,8 +26,8 @@ TEST(Variables, Table) {
         {u"{dir}/x", u"photos/summer/x"},
         {u"{ext}|{index}|{out}", u"JPG|7|out"},
         {u"{date}T{time}", u"2026-11-21T14-05-09"},
-        {u"{name}", u"mine"},              // --set wins over the built-in one
-        {u"{size}", u"{file}"},            // and is not expanded again
+        {u"{name}", u"mine"},    // --set wins over the built-in one
+        {u"{size}", u"{file}"},  // and is not expanded again
         {u"{unknown}{index}", u"{unknown}7"},
         {u"{{index}}", u"{7}"},
         {u"{index", u"{index"},

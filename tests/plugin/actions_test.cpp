@@ -326,12 +326,9 @@ TEST_F(ActionsTest, RotateTurnsClockwiseAndFlips) {
         const char16_t* text;
         double angle;  // of the bitmap, 0 for a flip
         TFlipDir flip;
-    } kCases[] = {{u"angle=90", -90, fdNone},
-                  {u"action=0\r\nangle= -30 ", 30, fdNone},
-                  {u"angle={degrees}", -7, fdNone},
-                  {u"angle=-2147483648", 2147483648.0, fdNone},
-                  {u"angle=360", 360, fdNone},
-                  {u"action=1\r\nangle=90", 0, fdHorizontal},
+    } kCases[] = {{u"angle=90", -90, fdNone},       {u"action=0\r\nangle= -30 ", 30, fdNone},
+                  {u"angle={degrees}", -7, fdNone}, {u"angle=-2147483648", 2147483648.0, fdNone},
+                  {u"angle=360", 360, fdNone},      {u"action=1\r\nangle=90", 0, fdHorizontal},
                   {u"action=2", 0, fdVertical}};
     plugin.host.variables[u"degrees"] = u"7";
     for (const auto& c : kCases) {

@@ -37,8 +37,7 @@ TRGB Color(std::uint8_t red, std::uint8_t green, std::uint8_t blue) {
 }
 
 // One row of colours.
-void MakeRow(TZmBitmap& bitmap, const std::vector<TRGB>& colors,
-             TZmPixelFormat format = zm24RGB) {
+void MakeRow(TZmBitmap& bitmap, const std::vector<TRGB>& colors, TZmPixelFormat format = zm24RGB) {
     ASSERT_TRUE(bitmap.Allocate(static_cast<std::int32_t>(colors.size()), 1, format));
     for (std::size_t x = 0; x < colors.size(); ++x) {
         bitmap.SetPixels(static_cast<std::int32_t>(x), 0, colors[x]);
@@ -71,9 +70,9 @@ TEST(Quantizer, CountsColoursUpToTheLimit) {
     TZmBitmap bitmap;
     ASSERT_TRUE(bitmap.Allocate(32, 32, zm24RGB));
     for (std::int32_t i = 0; i < 1024; ++i) {
-        bitmap.SetPixels_zm24RGB(i % 32, i / 32,
-                                 TRGB{static_cast<std::uint8_t>(i),
-                                      static_cast<std::uint8_t>(i / 256), 99});
+        bitmap.SetPixels_zm24RGB(
+            i % 32, i / 32,
+            TRGB{static_cast<std::uint8_t>(i), static_cast<std::uint8_t>(i / 256), 99});
     }
     std::vector<TRGB> map;
     TZmQuantizer exact(bitmap, map, 1024);
@@ -280,9 +279,10 @@ void MakeFormulaPicture(TZmBitmap& bitmap) {
     ASSERT_TRUE(bitmap.Allocate(40, 30, zm24RGB));
     for (std::int32_t y = 0; y < 30; ++y) {
         for (std::int32_t x = 0; x < 40; ++x) {
-            bitmap.SetPixels_zm24RGB(x, y, Color(static_cast<std::uint8_t>(x * 7 + y * 13),
-                                                 static_cast<std::uint8_t>(x * x + y * 5),
-                                                 static_cast<std::uint8_t>(x * y * 3)));
+            bitmap.SetPixels_zm24RGB(x, y,
+                                     Color(static_cast<std::uint8_t>(x * 7 + y * 13),
+                                           static_cast<std::uint8_t>(x * x + y * 5),
+                                           static_cast<std::uint8_t>(x * y * 3)));
         }
     }
 }
@@ -296,9 +296,9 @@ void ExpectPalette(std::int32_t method, std::int32_t quality,
     TZmQuantizer quantizer(bitmap, map, static_cast<std::int32_t>(expected.size()));
     for (std::size_t i = 0; i < expected.size(); ++i) {
         const std::uint32_t rgb = expected[i];
-        EXPECT_EQ(map[i], Color(static_cast<std::uint8_t>(rgb >> 16),
-                                static_cast<std::uint8_t>(rgb >> 8),
-                                static_cast<std::uint8_t>(rgb)))
+        EXPECT_EQ(map[i],
+                  Color(static_cast<std::uint8_t>(rgb >> 16), static_cast<std::uint8_t>(rgb >> 8),
+                        static_cast<std::uint8_t>(rgb)))
             << i;
     }
 }
@@ -309,23 +309,20 @@ TEST(Quantizer, WholeNeuralPalettes) {
                   {0x3D27DD, 0x262C86, 0x1F120F, 0x431F2E, 0x722117, 0xD83910, 0xCD3A5E, 0xD0946D,
                    0xF245C7, 0xC157E4, 0xAD14B1, 0x84447E, 0xAE6DA7, 0x4A7311, 0x24DD38, 0x32B11F,
                    0x127126, 0x307C77, 0x61424B, 0x6C8F52, 0x9F4E1B, 0xB4B510, 0xCFE549, 0xD4932D,
-                   0x7CCE94, 0x72D529, 0x25CE8A, 0x1E74C3, 0x6E91D4, 0xA5C7E6, 0x2ECEE0,
-                   0xE7CAB6});
+                   0x7CCE94, 0x72D529, 0x25CE8A, 0x1E74C3, 0x6E91D4, 0xA5C7E6, 0x2ECEE0, 0xE7CAB6});
     // One pixel in 30: the outer neurons stay where they began.
     ExpectPalette(kNeural, 0,
                   {0x000000, 0x010101, 0x040404, 0x1E1010, 0x2A1817, 0x137827, 0x08A43B, 0x2A6F54,
                    0x502A8E, 0x731681, 0x6D3857, 0x9E3258, 0xE22640, 0xE33534, 0xE4BC7D, 0x7A9753,
                    0x89A25D, 0x9CCD89, 0x93C59D, 0x63AF8D, 0x398193, 0x2C66C1, 0x26ABC4, 0x5BE5BE,
-                   0x98A3D3, 0xA758E8, 0xC25CC6, 0xD3A4EE, 0xE0E0E0, 0xE8E8E8, 0xF0F0F0,
-                   0xF8F8F8});
+                   0x98A3D3, 0xA758E8, 0xC25CC6, 0xD3A4EE, 0xE0E0E0, 0xE8E8E8, 0xF0F0F0, 0xF8F8F8});
 }
 
 TEST(Quantizer, WholeBoxPalette) {
     ExpectPalette(kBoxes, -1,
                   {0x302810, 0x3040D0, 0xD04020, 0x38C830, 0xD050D0, 0x304080, 0xD0D030, 0x38D0D8,
                    0x307830, 0xD05088, 0x9058C8, 0x50D088, 0xD8D0D0, 0x803030, 0x885088, 0xD08828,
-                   0x4090D0, 0x88C830, 0x90D0D8, 0x808838, 0x389088, 0x383048, 0xD8D088,
-                   0xD03860});
+                   0x4090D0, 0x88C830, 0x90D0D8, 0x808838, 0x389088, 0x383048, 0xD8D088, 0xD03860});
 }
 
 TEST(Quantizer, NeuralLookupFindsTheNearestEntry) {
@@ -385,8 +382,8 @@ TEST(Quantizer, ContestsAgree) {
         return static_cast<std::int32_t>((state >> 8) % static_cast<std::uint32_t>(count));
     };
     for (std::int32_t count = 1; count <= 70; ++count) {
-        const std::size_t padded = (static_cast<std::size_t>(count) + kContestBlock - 1) /
-                                   kContestBlock * kContestBlock;
+        const std::size_t padded =
+            (static_cast<std::size_t>(count) + kContestBlock - 1) / kContestBlock * kContestBlock;
         std::vector<std::int32_t> channels[3];
         for (auto& channel : channels) {
             channel.assign(padded, kContestFarAway);
@@ -420,10 +417,10 @@ TEST(Quantizer, SamplingFactor) {
         std::int32_t quality;
         std::int64_t pixels;
         std::int32_t factor;
-    } cases[] = {{100, 5000, 1},    {0, 5000, 30},      {50, 5000, 15},     {99, 5000, 1},
-                 {96, 5000, 2},     {200, 5000, 1},     {-1000, 5000, 30},  {-1, 0, 1},
-                 {-1, 1000, 1},     {-1, 1999, 1},      {-1, 2000, 2},      {-1, 150000, 15},
-                 {-1, 320769, 30},  {-1, 12000000, 30}};
+    } cases[] = {{100, 5000, 1},   {0, 5000, 30},     {50, 5000, 15},    {99, 5000, 1},
+                 {96, 5000, 2},    {200, 5000, 1},    {-1000, 5000, 30}, {-1, 0, 1},
+                 {-1, 1000, 1},    {-1, 1999, 1},     {-1, 2000, 2},     {-1, 150000, 15},
+                 {-1, 320769, 30}, {-1, 12000000, 30}};
     for (const auto& c : cases) {
         EXPECT_EQ(NeuralSamplingFactor(c.quality, c.pixels), c.factor)
             << c.quality << ", " << c.pixels;

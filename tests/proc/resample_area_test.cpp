@@ -21,8 +21,8 @@ namespace {
 constexpr auto kLinear = TAreaInterpolation::kLinear;
 constexpr auto kCubic = TAreaInterpolation::kCubic;
 
-TMatrix Area(TZmPixelFormat format, const TMatrix& values, std::int32_t width,
-             std::int32_t height, TAreaInterpolation interpolation) {
+TMatrix Area(TZmPixelFormat format, const TMatrix& values, std::int32_t width, std::int32_t height,
+             TAreaInterpolation interpolation) {
     const auto source = GrayPicture(format, values);
     const auto target = TargetFor(*source, width, height);
     EXPECT_TRUE(ResampleAreaPlain(*source, *target, nullptr, interpolation, kNobody));
@@ -53,7 +53,11 @@ TEST(ResampleAreaTest, HandWorkedValues) {
         {"fractions", kLinear, {{0, 90, 180}}, 2, 1, {{30, 150}}},
         // Both enlarge: a target pixel has the value at its far end, here at 0.5, 1, 1.5, 2. The
         // row above the edge: 50 100 | 100 100, the row below: 130 60 | 60 60.
-        {"enlarge", kLinear, kSquare, 4, 4,
+        {"enlarge",
+         kLinear,
+         kSquare,
+         4,
+         4,
          {{90, 80, 80, 80}, {130, 60, 60, 60}, {130, 60, 60, 60}, {130, 60, 60, 60}}},
         // Only the width enlarges: the same row values, averaged over the two rows.
         {"wider", kLinear, kSquare, 4, 1, {{90, 80, 80, 80}}},
@@ -64,19 +68,27 @@ TEST(ResampleAreaTest, HandWorkedValues) {
         {"one pixel", kLinear, {{77}}, 3, 2, {{77, 77, 77}, {77, 77, 77}}},
         // Four-point weights at 0.5: -0.125, 0.625, 0.625, -0.125; at 1 the right sample.
         // x=0: -0.125 * 200 is limited to 0. x=2: 0.5 * 200. x=4: 1.125 * 200.
-        {"cubic wider", kCubic, {{0, 0, 200, 200}}, 8, 1,
-         {{0, 0, 100, 200, 225, 200, 200, 200}}},
+        {"cubic wider", kCubic, {{0, 0, 200, 200}}, 8, 1, {{0, 0, 100, 200, 225, 200, 200, 200}}},
         // 1.125 * 250 is limited to 255.
-        {"cubic limit", kCubic, {{0, 0, 250, 250}}, 8, 1,
-         {{0, 0, 125, 250, 255, 250, 250, 250}}},
-        {"cubic higher", kCubic, {{0}, {0}, {200}, {200}}, 1, 8,
+        {"cubic limit", kCubic, {{0, 0, 250, 250}}, 8, 1, {{0, 0, 125, 250, 255, 250, 250, 250}}},
+        {"cubic higher",
+         kCubic,
+         {{0}, {0}, {200}, {200}},
+         1,
+         8,
          {{0}, {0}, {100}, {200}, {225}, {200}, {200}, {200}}},
         // Both enlarge. The rows first, rounded: 0 0 2 3 3 3 3 3 (from 1.5 and 3.375) and
         // 0 0 4 9 10 9 9 9 (from 4.5 and 10.125). Then the columns: half of both; the second;
         // 1.125 times the second less 0.125 times the first; the second. Unrounded rows would
         // give 6.75, so 7, at x = 4 of the first row instead of the even neighbour of 6.5.
-        {"cubic rounds rows", kCubic, {{0, 0, 3, 3}, {0, 0, 9, 9}}, 8, 4,
-         {{0, 0, 3, 6, 6, 6, 6, 6}, {0, 0, 4, 9, 10, 9, 9, 9}, {0, 0, 4, 10, 11, 10, 10, 10},
+        {"cubic rounds rows",
+         kCubic,
+         {{0, 0, 3, 3}, {0, 0, 9, 9}},
+         8,
+         4,
+         {{0, 0, 3, 6, 6, 6, 6, 6},
+          {0, 0, 4, 9, 10, 9, 9, 9},
+          {0, 0, 4, 10, 11, 10, 10, 10},
           {0, 0, 4, 9, 10, 9, 9, 9}}},
     };
     for (const TAreaCase& test : cases) {
@@ -214,8 +226,8 @@ private:
         for (const TPiece& row : rows) {
             for (const TPiece& column : columns) {
                 const double weight = column.length * row.length;
-                sum += weight * (cubic_ ? Cubic(column, row, channel)
-                                        : Linear(column, row, channel));
+                sum +=
+                    weight * (cubic_ ? Cubic(column, row, channel) : Linear(column, row, channel));
             }
         }
         return sum * (1 / (sx_ * sy_));
@@ -231,10 +243,8 @@ private:
         std::array<double, 4> corner{};
         std::array<int, 4> opacity{};
         for (std::size_t i = 0; i < 4; ++i) {
-            const int x = std::min(column.source + static_cast<int>(i % 2),
-                                   source_.GetWidth() - 1);
-            const int y = std::min(row.source + static_cast<int>(i / 2),
-                                   source_.GetHeight() - 1);
+            const int x = std::min(column.source + static_cast<int>(i % 2), source_.GetWidth() - 1);
+            const int y = std::min(row.source + static_cast<int>(i / 2), source_.GetHeight() - 1);
             corner[i] = At(x, y, channel);
             opacity[i] = alpha_ != nullptr ? alpha_->GetPixels_zm8(x, y) : 255;
         }
@@ -304,10 +314,10 @@ private:
 
 void CompareWithReference(TZmPixelFormat format, TZmImageSize from, TZmImageSize to, bool cubic,
                           bool with_alpha) {
-    SCOPED_TRACE(testing::Message() << PixelFormatInfo(format).name << ' ' << from.width << 'x'
-                                    << from.height << " to " << to.width << 'x' << to.height
-                                    << (cubic ? " cubic" : " linear")
-                                    << (with_alpha ? " alpha" : ""));
+    SCOPED_TRACE(testing::Message()
+                 << PixelFormatInfo(format).name << ' ' << from.width << 'x' << from.height
+                 << " to " << to.width << 'x' << to.height << (cubic ? " cubic" : " linear")
+                 << (with_alpha ? " alpha" : ""));
     const auto seed = static_cast<std::uint32_t>(from.width * 1000 + from.height + to.width);
     const auto source = MakeNoise(format, from.width, from.height, seed);
     if (with_alpha) {
@@ -326,8 +336,17 @@ void CompareWithReference(TZmPixelFormat format, TZmImageSize from, TZmImageSize
 }
 
 TEST(ResampleAreaTest, EqualsAnIndependentReference) {
-    const std::array<TZmImageSize, 12> sizes{{{1, 1}, {1, 9}, {9, 1}, {2, 3}, {5, 7}, {13, 4},
-                                              {16, 15}, {31, 8}, {7, 33}, {40, 40}, {3, 50},
+    const std::array<TZmImageSize, 12> sizes{{{1, 1},
+                                              {1, 9},
+                                              {9, 1},
+                                              {2, 3},
+                                              {5, 7},
+                                              {13, 4},
+                                              {16, 15},
+                                              {31, 8},
+                                              {7, 33},
+                                              {40, 40},
+                                              {3, 50},
                                               {61, 2}}};
     for (const TZmPixelFormat format : {zm8g, zm24RGB, zm32RGB, zm16g, zm48RGB}) {
         for (const TZmImageSize from : sizes) {
@@ -350,10 +369,10 @@ constexpr TZmPixelFormat kAreaFormats[] = {zm8g, zm24RGB, zm32RGB, zm16g, zm48RG
 
 void CompareFastWithPlain(TZmPixelFormat format, TZmImageSize from, TZmImageSize to,
                           TContent content, TAreaInterpolation interpolation) {
-    SCOPED_TRACE(testing::Message() << PixelFormatInfo(format).name << ' ' << from.width << 'x'
-                                    << from.height << " to " << to.width << 'x' << to.height
-                                    << " content " << int{content} << " interpolation "
-                                    << static_cast<int>(interpolation));
+    SCOPED_TRACE(testing::Message()
+                 << PixelFormatInfo(format).name << ' ' << from.width << 'x' << from.height
+                 << " to " << to.width << 'x' << to.height << " content " << int{content}
+                 << " interpolation " << static_cast<int>(interpolation));
     // Odd addresses, but for words.
     const std::size_t mask = format == zm16g || format == zm48RGB ? 6 : 7;
     const auto offset = static_cast<std::size_t>(from.width + to.height) % 7;
@@ -386,8 +405,7 @@ TEST(ResampleAreaFastTest, EqualsThePlainFormWhenShrinking) {
         for (const std::int32_t divisor : {1, 2, 3, 5, 64}) {
             const TZmImageSize to{std::max(width * 3 / (divisor * 2 + 1), 1),
                                   std::max(height / divisor, 1)};
-            CompareAllFormats({width, height}, to,
-                              static_cast<TContent>(width % kContentCount));
+            CompareAllFormats({width, height}, to, static_cast<TContent>(width % kContentCount));
             ASSERT_FALSE(testing::Test::HasFailure());
         }
     }
@@ -397,8 +415,7 @@ TEST(ResampleAreaFastTest, EqualsThePlainFormWhenEnlarging) {
     for (std::int32_t width = 1; width <= 70; ++width) {
         const std::int32_t height = 1 + width * 5 % 17;
         for (const std::int32_t growth : {1, 2, 3 + width % 5}) {
-            const TZmImageSize to{width * growth + width % 5 + 1,
-                                  height * growth + width % 3 + 1};
+            const TZmImageSize to{width * growth + width % 5 + 1, height * growth + width % 3 + 1};
             CompareAllFormats({width, height}, to,
                               static_cast<TContent>((width + growth) % kContentCount));
             ASSERT_FALSE(testing::Test::HasFailure());
@@ -412,11 +429,11 @@ TEST(ResampleAreaFastTest, EqualsThePlainFormOnWholeAndTiedRatios) {
         TZmImageSize to;
     };
     const std::vector<TRatio> ratios{
-        {{64, 48}, {16, 12}},  {{64, 48}, {32, 24}}, {{60, 60}, {20, 12}}, {{125, 125}, {32, 32}},
-        {{16, 12}, {64, 48}},  {{16, 12}, {32, 36}}, {{20, 30}, {30, 45}}, {{1, 1}, {65, 66}},
-        {{65, 3}, {1, 1}},     {{2, 2}, {70, 3}},    {{3, 2}, {20011, 5}}, {{20011, 5}, {3, 2}},
-        {{300, 2}, {299, 1}},  {{299, 2}, {300, 3}}, {{1, 70}, {2, 71}},   {{700, 700}, {7, 7}},
-        {{2, 1}, {65535, 2}},  {{65535, 2}, {1, 1}}, {{48, 36}, {64, 48}}, {{64, 8}, {1024, 80}},
+        {{64, 48}, {16, 12}}, {{64, 48}, {32, 24}}, {{60, 60}, {20, 12}}, {{125, 125}, {32, 32}},
+        {{16, 12}, {64, 48}}, {{16, 12}, {32, 36}}, {{20, 30}, {30, 45}}, {{1, 1}, {65, 66}},
+        {{65, 3}, {1, 1}},    {{2, 2}, {70, 3}},    {{3, 2}, {20011, 5}}, {{20011, 5}, {3, 2}},
+        {{300, 2}, {299, 1}}, {{299, 2}, {300, 3}}, {{1, 70}, {2, 71}},   {{700, 700}, {7, 7}},
+        {{2, 1}, {65535, 2}}, {{65535, 2}, {1, 1}}, {{48, 36}, {64, 48}}, {{64, 8}, {1024, 80}},
     };
     for (const TRatio& ratio : ratios) {
         for (int content = 0; content < kContentCount; ++content) {
@@ -441,11 +458,10 @@ TEST(ResampleAreaTest, ProgressCountsEveryRow) {
     const auto source = MakeNoise(zm24RGB, 8, 8, 3);
     TZmBitmap target(4, 3, zm24RGB);
     std::vector<std::int32_t> percents;
-    const TResampleListener listener{
-        &percents, [&](void* sender, std::int32_t percent) {
-            EXPECT_EQ(sender, &percents);
-            percents.push_back(percent);
-        }};
+    const TResampleListener listener{&percents, [&](void* sender, std::int32_t percent) {
+                                         EXPECT_EQ(sender, &percents);
+                                         percents.push_back(percent);
+                                     }};
     ASSERT_TRUE(ResampleAreaPlain(*source, target, nullptr, kLinear, listener));
     EXPECT_EQ(percents, (std::vector<std::int32_t>{33, 66, 100}));
     percents.clear();

@@ -75,7 +75,9 @@ const std::vector<TEngineCase> kFastLinearCases{
     {"rows", {{0}, {100}}, 1, 4, {{0}, {50}, {100}, {100}}},
     // The plane between the passes is not limited: (280 + 100 + 100) / 3 = 160 at x = 3.
     {"unlimited plane",
-     {{0, 100, 200, 40}, {0, 100, 100, 100}, {0, 100, 100, 100}, {0, 0, 0, 0}}, 8, 2,
+     {{0, 100, 200, 40}, {0, 100, 100, 100}, {0, 100, 100, 100}, {0, 0, 0, 0}},
+     8,
+     2,
      {{0, 50, 100, 160, 133, 106, 80, 80}, {0, 50, 100, 100, 100, 100, 100, 100}}},
     // A width that stays is still averaged with the next column: left 0 1 2, right 1 2 2.
     {"same width", {{10, 20, 40}, {10, 20, 40}}, 3, 1, {{15, 30, 40}}},
@@ -100,8 +102,7 @@ TEST(ResampleFastLinearTest, SixteenBitsLimitAt65535) {
     const auto source = GrayPicture(zm16g, {{0, 30000, 60000, 10}});
     const auto target = TargetFor(*source, 8, 1);
     ASSERT_TRUE(ResampleFastLinear(*source, *target, nullptr, kNobody));
-    EXPECT_EQ(ValuesOf(*target),
-              (TMatrix{{0, 15000, 30000, 65535, 60000, 30005, 10, 10}}));
+    EXPECT_EQ(ValuesOf(*target), (TMatrix{{0, 15000, 30000, 65535, 60000, 30005, 10, 10}}));
 }
 
 TEST(ResampleFastLinearTest, RectangleIsInclusiveAndLimited) {
@@ -112,17 +113,17 @@ TEST(ResampleFastLinearTest, RectangleIsInclusiveAndLimited) {
         TRect asked;
         TRect computed;
     };
-    for (const TRectCase& test : {TRectCase{{2, 1, 4, 3}, {2, 1, 4, 3}},
-                                  TRectCase{{-5, 6, 2, 99}, {0, 6, 2, 7}},
-                                  TRectCase{{0, 0, -1, -1}, {0, 0, 8, 7}}}) {
+    for (const TRectCase& test :
+         {TRectCase{{2, 1, 4, 3}, {2, 1, 4, 3}}, TRectCase{{-5, 6, 2, 99}, {0, 6, 2, 7}},
+          TRectCase{{0, 0, -1, -1}, {0, 0, 8, 7}}}) {
         const auto part = TargetFor(*source, 9, 8);
         part->Fill(0);
         ASSERT_TRUE(ResampleFastLinear(*source, *part, &test.asked, kNobody));
         for (std::int32_t y = 0; y < 8; ++y) {
             for (std::int32_t x = 0; x < 9; ++x) {
                 const TRect& inside = test.computed;
-                const bool computed = x >= inside.left && x <= inside.right &&
-                                      y >= inside.top && y <= inside.bottom;
+                const bool computed =
+                    x >= inside.left && x <= inside.right && y >= inside.top && y <= inside.bottom;
                 EXPECT_EQ(part->GetPixels_zm24RGB(x, y),
                           computed ? whole->GetPixels_zm24RGB(x, y) : TRGB{})
                     << x << ',' << y;
@@ -148,12 +149,10 @@ TEST(ResampleBitsTest, EnlargesWithSeventeenFractionalBits) {
 
 TEST(ResampleBitsTest, ReducesToTheShareOfSetBits) {
     // Factor 2: columns 0..1 and 1..3, rows the same.
-    const auto source =
-        GrayPicture(zm1g, {{1, 1, 0, 0}, {1, 0, 0, 0}, {0, 0, 0, 1}, {0, 1, 1, 1}});
+    const auto source = GrayPicture(zm1g, {{1, 1, 0, 0}, {1, 0, 0, 0}, {0, 0, 0, 1}, {0, 1, 1, 1}});
     TZmBitmap target(2, 2, zm24RGB);
     ASSERT_TRUE(ResampleBitsFastLinear(*source, target));
-    EXPECT_EQ(ValuesOf(target),
-              (TMatrix{{3 * 255 / 4, 1 * 255 / 6}, {2 * 255 / 6, 4 * 255 / 9}}));
+    EXPECT_EQ(ValuesOf(target), (TMatrix{{3 * 255 / 4, 1 * 255 / 6}, {2 * 255 / 6, 4 * 255 / 9}}));
 }
 
 TEST(ResampleBitsTest, FootprintsOfRowsEndEarlierThanThoseOfColumns) {
@@ -199,8 +198,7 @@ TEST(ResampleKernelTest, HandWorkedValuesOfTheTriangle) {
         EXPECT_EQ(ValuesOf(*Kernel(*color, test.width, test.height, rfTriangle)), test.expected);
         for (const TZmPixelFormat format : {zm8g, zm16g}) {
             const auto gray = GrayPicture(format, test.source);
-            EXPECT_EQ(ValuesOf(*Kernel(*gray, test.width, test.height, rfTriangle)),
-                      test.expected);
+            EXPECT_EQ(ValuesOf(*Kernel(*gray, test.width, test.height, rfTriangle)), test.expected);
         }
     }
 }
@@ -256,9 +254,9 @@ TEST(ResampleKernelTest, WeightsThatVanishGiveBlack) {
     // Shrinking 2000 to 1: each weight is below half a 256th, and no tap is left.
     const auto source = GrayPicture(zm8g, TMatrix{std::vector<int>(2000, 255)});
     EXPECT_EQ(ValuesOf(*Kernel(*source, 1, 1, rfTriangle)), (TMatrix{{0}}));
-    EXPECT_EQ(ValuesOf(*Kernel(*ColorPicture(TMatrix{std::vector<int>(2000, 255)}), 1, 1,
-                               rfTriangle)),
-              (TMatrix{{0}}));
+    EXPECT_EQ(
+        ValuesOf(*Kernel(*ColorPicture(TMatrix{std::vector<int>(2000, 255)}), 1, 1, rfTriangle)),
+        (TMatrix{{0}}));
 }
 
 TEST(ResampleKernelTest, BitsBecomeGrays) {

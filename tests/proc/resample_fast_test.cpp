@@ -18,9 +18,9 @@ namespace {
 template <typename Engine>
 void CompareForms(TZmPixelFormat format, TZmImageSize from, TZmImageSize to, TContent content,
                   const Engine& engine) {
-    SCOPED_TRACE(testing::Message() << PixelFormatInfo(format).name << ' ' << from.width << 'x'
-                                    << from.height << " to " << to.width << 'x' << to.height
-                                    << " content " << int{content});
+    SCOPED_TRACE(testing::Message()
+                 << PixelFormatInfo(format).name << ' ' << from.width << 'x' << from.height
+                 << " to " << to.width << 'x' << to.height << " content " << int{content});
     const std::size_t offset = format == zm16g ? 2 : static_cast<std::size_t>(from.width) % 5;
     TGuardedPicture source(format, from.width, from.height, offset);
     TGuardedPicture fast(format, to.width, to.height, offset);

@@ -25,9 +25,7 @@ inline std::unique_ptr<TZmBitmap> GrayPicture(TZmPixelFormat format, const TMatr
             const int value = values[static_cast<std::size_t>(y)][static_cast<std::size_t>(x)];
             switch (format) {
                 case zm1g: bitmap->SetPixels_zm1g(x, y, value != 0); break;
-                case zm16g:
-                    bitmap->SetPixels_zm16g(x, y, static_cast<std::uint16_t>(value));
-                    break;
+                case zm16g: bitmap->SetPixels_zm16g(x, y, static_cast<std::uint16_t>(value)); break;
                 default: bitmap->SetPixels_zm8(x, y, static_cast<std::uint8_t>(value)); break;
             }
         }

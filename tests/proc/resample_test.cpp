@@ -29,20 +29,20 @@ TEST(CalcResampleSizeTest, Table) {
         {100, 100, 200, 400, true, 50, 100},
         {1000, 1000, 400, 200, true, 1000, 500},  // the fit enlarges
         {100, 100, 400, 200, false, 100, 100},
-        {1, 1, 400, 200, true, 1, 1},              // Round(0.5) is 0, raised to 1
+        {1, 1, 400, 200, true, 1, 1},  // Round(0.5) is 0, raised to 1
         {3, 3, 2, 2, true, 3, 3},
-        {5, 5, 4, 2, true, 5, 2},                  // Round(2.5) is even
+        {5, 5, 4, 2, true, 5, 2},  // Round(2.5) is even
         {-1, 50, 400, 200, false, 100, 50},
-        {-1, 50, 400, 200, true, 100, 50},         // the flag does not count below 1
+        {-1, 50, 400, 200, true, 100, 50},  // the flag does not count below 1
         {50, -1, 400, 200, false, 50, 25},
         {0, 50, 400, 200, false, 400, 50},
         {50, 0, 400, 200, true, 50, 200},
         {0, 0, 400, 200, true, 400, 200},
         {-5, 7, 400, 200, false, 5, 7},
         {7, -5, 400, 200, true, 7, 5},
-        {-1, 0, 400, 200, false, 1, 200},          // 0 * 400 / 200 is below 1
+        {-1, 0, 400, 200, false, 1, 200},  // 0 * 400 / 200 is below 1
         {0, -1, 400, 200, false, 400, 200},
-        {-1, 1, 2, 400, false, 1, 1},              // 1 * 2 / 400
+        {-1, 1, 2, 400, false, 1, 1},  // 1 * 2 / 400
         {-5, -7, 400, 200, false, -5, -7},
         {-1, -1, 400, 200, true, -1, -1},
         {-1, 2000000, 5000, 1, false, kMaxInt32, 2000000},  // no wrap
@@ -52,12 +52,10 @@ TEST(CalcResampleSizeTest, Table) {
     for (const TSizeCase& test : cases) {
         const TZmImageSize size = CalcResampleSize(test.new_width, test.new_height, test.width,
                                                    test.height, test.keep_aspect);
-        EXPECT_EQ(size.width, test.expected_width)
-            << test.new_width << 'x' << test.new_height << " of " << test.width << 'x'
-            << test.height;
-        EXPECT_EQ(size.height, test.expected_height)
-            << test.new_width << 'x' << test.new_height << " of " << test.width << 'x'
-            << test.height;
+        EXPECT_EQ(size.width, test.expected_width) << test.new_width << 'x' << test.new_height
+                                                   << " of " << test.width << 'x' << test.height;
+        EXPECT_EQ(size.height, test.expected_height) << test.new_width << 'x' << test.new_height
+                                                     << " of " << test.width << 'x' << test.height;
     }
 }
 
@@ -90,7 +88,7 @@ std::size_t FilterColumn(int filter) {
     if (filter <= rfLinear) {
         return 1;
     }
-    return filter <= rfBicubic ? static_cast<std::size_t>(filter - rfFastLinear) + 2
+    return filter <= rfBicubic     ? static_cast<std::size_t>(filter - rfFastLinear) + 2
            : filter <= rfProjectWB ? 5
                                    : 6;
 }
@@ -105,8 +103,7 @@ TEST(ResampleDispatcherTest, FormatOfTheResult) {
                                                 << filter << " to " << width << 'x' << height);
                 const auto target = TargetFor(*source, width, height);
                 ASSERT_TRUE(ResampleBitmapInto(*source, *target,
-                                               static_cast<TResampleFilter>(filter), nullptr,
-                                               {}));
+                                               static_cast<TResampleFilter>(filter), nullptr, {}));
                 EXPECT_EQ(target->GetPixelFormat(), row.results[FilterColumn(filter)]);
                 EXPECT_EQ(target->GetWidth(), width);
                 EXPECT_EQ(target->GetHeight(), height);
@@ -146,8 +143,7 @@ TEST(ResampleDispatcherTest, EveryFilterSurvivesThinPictures) {
             for (int filter = 0; filter < kResampleFilterCount; ++filter) {
                 const auto target = TargetFor(*source, test.to.width, test.to.height);
                 EXPECT_TRUE(ResampleBitmapInto(*source, *target,
-                                               static_cast<TResampleFilter>(filter), nullptr,
-                                               {}))
+                                               static_cast<TResampleFilter>(filter), nullptr, {}))
                     << format << ' ' << filter;
                 EXPECT_EQ(target->GetWidth(), test.to.width);
             }
@@ -193,11 +189,10 @@ TEST(ResampleDispatcherTest, TargetOfAnotherFormatIsBroughtIntoFit) {
     for (int filter = 0; filter < kResampleFilterCount; ++filter) {
         // Fewer bytes than a row of the source's format needs.
         TZmBitmap target(5, 4, zm1g);
-        ASSERT_TRUE(ResampleBitmapInto(*color, target, static_cast<TResampleFilter>(filter),
-                                       nullptr, {}));
-        EXPECT_NE(target.GetPixelFormat(), filter == rfProjectBW || filter == rfProjectWB
-                                               ? zm24RGB
-                                               : zm1g);
+        ASSERT_TRUE(
+            ResampleBitmapInto(*color, target, static_cast<TResampleFilter>(filter), nullptr, {}));
+        EXPECT_NE(target.GetPixelFormat(),
+                  filter == rfProjectBW || filter == rfProjectWB ? zm24RGB : zm1g);
     }
 }
 
@@ -283,8 +278,8 @@ TEST(ResampleAlphaTest, PlanesThatDoNotFitAreBroughtIntoFit) {
     target.ReplaceAlphaChannel(MakeNoise(zm8g, 2, 2, 3));
     for (int filter = 0; filter < kResampleFilterCount; ++filter) {
         const bool projected = filter == rfProjectBW || filter == rfProjectWB;
-        ASSERT_TRUE(ResampleBitmapInto(*source, target, static_cast<TResampleFilter>(filter),
-                                       nullptr, {}));
+        ASSERT_TRUE(
+            ResampleBitmapInto(*source, target, static_cast<TResampleFilter>(filter), nullptr, {}));
         EXPECT_EQ(target.GetPixelFormat(), projected ? zm1g : zm24RGB);
         EXPECT_EQ(target.GetAlphaChannel()->GetWidth(), 16);
         EXPECT_EQ(target.GetAlphaChannel()->GetHeight(), 12);
@@ -401,8 +396,8 @@ TEST(ZalmoProcResampleTest, StoppingAtAnyStepLeavesTheBitmap) {
     for (const TZmPixelFormat format : {zm8g, zm16g, zm24RGB, zm32RGB}) {
         const auto before = MakeNoise(format, 20, 18, 2);
         for (const TResampleFilter filter : {rfBilinear, rfBicubic, rfLanczos3, rfFastLinear}) {
-            for (const TZmImageSize to : {TZmImageSize{13, 9}, TZmImageSize{33, 27},
-                                          TZmImageSize{9, 30}}) {
+            for (const TZmImageSize to :
+                 {TZmImageSize{13, 9}, TZmImageSize{33, 27}, TZmImageSize{9, 30}}) {
                 const auto image = MakeNoise(format, 20, 18, 2);
                 std::int32_t stop = 1;
                 while (StopsAt(*image, stop, to, filter)) {

@@ -4,8 +4,10 @@
 
 #include <vector>
 
+#include "engine/bitmap/zmmask.h"
 #include "engine/bitmap/zmxBitmaps.h"
 #include "engine/proc/zalmoproc.h"
+#include "engine/proc/zmresample.h"
 #include "tests/support/testimages.h"
 
 namespace zm::test {
@@ -202,7 +204,8 @@ TEST_F(ZalmoProcTest, RegionIsTheSelectionOrTheWholeBitmap) {
                                        TSelectionCase{{2, 2, 1, 1}, false, {0, 0, 3, 2}}}) {
         proc_.Select(test.asked);
         TRect region;
-        EXPECT_EQ(proc_.GetReSel(region.left, region.top, region.right, region.bottom),
+        TZmMask* mask = nullptr;
+        EXPECT_EQ(proc_.GetReSel(region.left, region.top, region.right, region.bottom, mask),
                   test.selected);
         EXPECT_EQ(region.left, test.region.left);
         EXPECT_EQ(region.top, test.region.top);
@@ -211,20 +214,21 @@ TEST_F(ZalmoProcTest, RegionIsTheSelectionOrTheWholeBitmap) {
     }
     proc_.Deselect();
     TRect region;
-    EXPECT_FALSE(proc_.GetReSel(region.left, region.top, region.right, region.bottom));
+    TZmMask* mask = nullptr;
+    EXPECT_FALSE(proc_.GetReSel(region.left, region.top, region.right, region.bottom, mask));
 }
 
 TEST_F(ZalmoProcTest, BeginConvertsOrRefusesAndSavesFirst) {
     std::int32_t x1, y1, x2, y2;
     TZmBitmap* bitmap = nullptr;
     proc_.SetAutoConvertFormat(false);
-    EXPECT_FALSE(proc_.BeginImageProcessing(TZmPixelFormatSet(zm24RGB), x1, y1, x2, y2, u"op",
-                                            bitmap, 5));
+    EXPECT_FALSE(
+        proc_.BeginImageProcessing(TZmPixelFormatSet(zm24RGB), x1, y1, x2, y2, u"op", bitmap, 5));
     EXPECT_EQ(image_.GetPixelFormat(), zm8g);
     proc_.SetAutoConvertFormat(true);
     proc_.SetAutoUndo(true);
-    EXPECT_TRUE(proc_.BeginImageProcessing(TZmPixelFormatSet(zm24RGB), x1, y1, x2, y2, u"op",
-                                           bitmap, 5));
+    EXPECT_TRUE(
+        proc_.BeginImageProcessing(TZmPixelFormatSet(zm24RGB), x1, y1, x2, y2, u"op", bitmap, 5));
     EXPECT_EQ(bitmap, &image_);
     EXPECT_EQ(x2, 3);
     EXPECT_EQ(y2, 2);
@@ -235,7 +239,9 @@ TEST_F(ZalmoProcTest, BeginConvertsOrRefusesAndSavesFirst) {
     EXPECT_EQ(changes, 1);
     proc_.Undo(false);
     EXPECT_EQ(image_.GetPixelFormat(), zm8g) << "the state before the conversion";
-    EXPECT_TRUE(proc_.BeginImageAnalysis(TZmPixelFormatSet(), x1, y1, x2, y2, bitmap));
+    TZmMask* mask = nullptr;
+    EXPECT_TRUE(proc_.BeginImageAnalysis(TZmPixelFormatSet(), x1, y1, x2, y2, bitmap, mask));
+    EXPECT_EQ(mask, nullptr);
     proc_.EndImageAnalysis(bitmap);
     EXPECT_EQ(proc_.GetUndoCount(), 1) << "analysis saves nothing";
 }
@@ -250,11 +256,129 @@ TEST_F(ZalmoProcTest, MissingBitmapIsRefusedWithTheFramesText) {
     } catch (const EZmException& error) {
         EXPECT_STREQ(error.what(), "Active layer does not contain bitmap");
     }
-    EXPECT_THROW(proc_.BeginImageAnalysis(TZmPixelFormatSet(), x1, y1, x2, y2, bitmap),
+    TZmMask* mask = nullptr;
+    EXPECT_THROW(proc_.BeginImageAnalysis(TZmPixelFormatSet(), x1, y1, x2, y2, bitmap, mask),
                  EZmException);
     EXPECT_NO_THROW(proc_.Update());
     EXPECT_NO_THROW(proc_.SaveUndo(zmuImage, true));
     EXPECT_NO_THROW(proc_.Undo(true));
+}
+
+/// A selection by mask on a picture of 4 by 3 pixels whose values are 10 * y + x.
+class MaskSelectionTest : public testing::Test {
+protected:
+    MaskSelectionTest() : image_(4, 3, zm8g), proc_(&image_) {
+        for (std::int32_t y = 0; y < 3; ++y) {
+            for (std::int32_t x = 0; x < 4; ++x) {
+                image_.SetPixels_zm8(x, y, static_cast<std::uint8_t>(10 * y + x));
+            }
+        }
+        // Feathered: columns 1 to 3, rows 1 and 2.
+        EXPECT_TRUE(mask_.AllocateBits(4, 3, 8));
+        mask_.SetPixel(1, 1, 255);
+        mask_.SetPixel(2, 1, 128);
+        mask_.SetPixel(3, 2, 51);
+    }
+
+    /// Fills the region that the frame hands out, pixels and the alpha of the copy.
+    void FillRegion(int value, int alpha) {
+        TZmMask* mask = nullptr;
+        ASSERT_TRUE(proc_.BeginImageProcessing(TZmPixelFormatSet(), x1_, y1_, x2_, y2_, u"fill",
+                                               region_, mask, 5));
+        ASSERT_NE(region_, &image_);
+        size_ = TZmImageSize{region_->GetWidth(), region_->GetHeight()};
+        corner_ = region_->GetPixels_zm8(0, 0);
+        region_->Fill(value);
+        if (alpha >= 0) {
+            region_->SetAlpha(0, 0, static_cast<std::uint8_t>(alpha));
+        }
+        proc_.EndImageProcessing(region_, mask);
+    }
+    std::vector<int> Values() {
+        std::vector<int> values;
+        for (std::int32_t i = 0; i < 12; ++i) {
+            values.push_back(image_.GetPixels_zm8(i % 4, i / 4));
+        }
+        return values;
+    }
+
+    TZmBitmap image_;
+    TZalmoProc proc_;
+    TZmMask mask_;
+    std::int32_t x1_ = -1, y1_ = -1, x2_ = -1, y2_ = -1;
+    TZmBitmap* region_ = nullptr;
+    TZmImageSize size_;
+    int corner_ = -1;
+};
+
+TEST_F(MaskSelectionTest, OperationWorksOnTheBoxAndGoesBackThroughTheMask) {
+    proc_.SelectMask(mask_);
+    mask_.Empty();  // a copy was taken
+    FillRegion(211, -1);
+    EXPECT_EQ((std::vector{x1_, y1_, x2_, y2_}), (std::vector{0, 0, 3, 2}));
+    EXPECT_EQ(size_.width, 3);
+    EXPECT_EQ(size_.height, 2);
+    EXPECT_EQ(corner_, 11);
+    // 12 and 211 by 128/255: 111.9; 23 and 211 by 51/255: 60.6
+    EXPECT_EQ(Values(), (std::vector{0, 1, 2, 3, 10, 211, 112, 13, 20, 21, 22, 61}));
+    EXPECT_FALSE(image_.HasAlphaChannel());
+}
+
+TEST_F(MaskSelectionTest, AlphaGoesBackOnlyWhereItIsNotFull) {
+    proc_.SelectMask(mask_);
+    TZmBitmap* const plane = image_.GetAlphaChannel();
+    plane->SyncFull();
+    ASSERT_TRUE(plane->GetFull());
+    FillRegion(211, -1);
+    EXPECT_TRUE(plane->GetFull()) << "nothing to write";
+    FillRegion(211, 100);
+    EXPECT_FALSE(plane->GetFull());
+    EXPECT_EQ(image_.GetAlpha(1, 1), 100);
+    EXPECT_EQ(image_.GetAlpha(2, 1), 255);
+    EXPECT_EQ(image_.GetAlpha(0, 0), 255);
+    image_.SetAlpha(2, 1, 7);
+    TZmMask* mask = nullptr;
+    ASSERT_TRUE(
+        proc_.BeginImageAnalysis(TZmPixelFormatSet(), x1_, y1_, x2_, y2_, region_, mask));
+    EXPECT_EQ(region_->GetAlpha(1, 0), 7) << "the copy has the alpha of its place";
+    region_->Fill(1);
+    proc_.EndImageAnalysis(region_);
+    EXPECT_EQ(image_.GetPixels_zm8(1, 1), 211) << "an analysis changes nothing";
+}
+
+TEST_F(MaskSelectionTest, MasksBesideTheImageAndEmptyOnes) {
+    TZmMask wide;
+    ASSERT_TRUE(wide.AllocateBits(100, 100, 1));
+    wide.SetPixel(3, 2, 1);
+    wide.SetPixel(90, 90, 1);
+    proc_.SelectMask(wide);
+    FillRegion(200, -1);
+    EXPECT_EQ(size_.width, 1) << "the box ends with the image";
+    EXPECT_EQ(image_.GetPixels_zm8(3, 2), 200);
+    EXPECT_EQ(image_.GetPixels_zm8(2, 2), 22);
+    TZmMask beside;
+    ASSERT_TRUE(beside.AllocateBits(9, 9, 8));
+    beside.SetPixel(4, 0, 255);
+    proc_.SelectMask(beside);
+    TZmMask* mask = nullptr;
+    EXPECT_FALSE(proc_.BeginImageProcessing(TZmPixelFormatSet(), x1_, y1_, x2_, y2_, u"fill",
+                                            region_, mask, 5));
+    proc_.EndImageProcessing(region_, mask);
+    beside.Empty();
+    proc_.SelectMask(beside);
+    EXPECT_FALSE(proc_.GetReSel(x1_, y1_, x2_, y2_, mask));
+    EXPECT_EQ(mask, nullptr);
+    EXPECT_EQ(x2_, 4);
+}
+
+TEST_F(MaskSelectionTest, OperationsWithoutSelectionsWorkOnTheImage) {
+    proc_.SelectMask(mask_);
+    ASSERT_TRUE(proc_.BeginImageProcessing(TZmPixelFormatSet(), x1_, y1_, x2_, y2_, u"text",
+                                           region_, 5));
+    EXPECT_EQ(region_, &image_);
+    proc_.EndImageProcessing(region_);
+    proc_.Resample(2, 2, rfNone, false);
+    EXPECT_EQ(image_.GetWidth(), 2);
 }
 
 }  // namespace

@@ -117,8 +117,8 @@ std::vector<CorpusEntry> CorpusEntries() {
         if (columns.size() < 8) {
             continue;
         }
-        entries.push_back({*folder / PathFromUtf8(columns[0]), columns[1],
-                           ColumnNumber(columns[2]), ColumnNumber(columns[3]), columns[7]});
+        entries.push_back({*folder / PathFromUtf8(columns[0]), columns[1], ColumnNumber(columns[2]),
+                           ColumnNumber(columns[3]), columns[7]});
     }
     return entries;
 }

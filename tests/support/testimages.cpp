@@ -23,8 +23,8 @@ private:
 void SetTestPalette(TZmBitmap& bitmap) {
     for (std::int32_t i = 0; i < 256; ++i) {
         const auto byte = static_cast<std::uint8_t>(i);
-        bitmap.SetPalette(i, TRGB{static_cast<std::uint8_t>(255 - i), byte,
-                                  static_cast<std::uint8_t>(i * 7)});
+        bitmap.SetPalette(
+            i, TRGB{static_cast<std::uint8_t>(255 - i), byte, static_cast<std::uint8_t>(i * 7)});
     }
 }
 
@@ -35,15 +35,9 @@ void SetChannel(TZmBitmap& bitmap, std::int32_t x, std::int32_t y, std::int32_t 
     const auto column = static_cast<std::size_t>(x);
     const auto index = static_cast<std::size_t>(channel);
     switch (bitmap.GetPixelFormat()) {
-        case zm1g:
-            bitmap.SetPixels_zm1g(x, y, value >= 32768);
-            break;
-        case zm16g:
-            bitmap.SetPixels_zm16g(x, y, static_cast<std::uint16_t>(value));
-            break;
-        case zm32f:
-            bitmap.SetPixels_zm32f(x, y, static_cast<float>(value) / 65535.0f);
-            break;
+        case zm1g: bitmap.SetPixels_zm1g(x, y, value >= 32768); break;
+        case zm16g: bitmap.SetPixels_zm16g(x, y, static_cast<std::uint16_t>(value)); break;
+        case zm32f: bitmap.SetPixels_zm32f(x, y, static_cast<float>(value) / 65535.0f); break;
         case zm48RGB: {
             const auto word = static_cast<std::uint16_t>(value);
             std::memcpy(row + column * 6 + index * 2, &word, 2);
@@ -72,14 +66,10 @@ std::uint32_t GradientValue(std::int32_t x, std::int32_t y, std::int32_t channel
     const auto column = static_cast<std::uint32_t>(x);
     const auto line = static_cast<std::uint32_t>(y);
     switch (channel) {
-        case 0:
-            return (column * 1799 + line * 257) & 65535u;
-        case 1:
-            return (line * 2313 + column * 771) & 65535u;
-        case 2:
-            return ((column + line) * 1285 + 8192) & 65535u;
-        default:
-            return (65535 - column * 1028 - line * 514) & 65535u;
+        case 0: return (column * 1799 + line * 257) & 65535u;
+        case 1: return (line * 2313 + column * 771) & 65535u;
+        case 2: return ((column + line) * 1285 + 8192) & 65535u;
+        default: return (65535 - column * 1028 - line * 514) & 65535u;
     }
 }
 
@@ -105,13 +95,11 @@ std::unique_ptr<TZmBitmap> MakeGradient(TZmPixelFormat format, std::int32_t widt
     return MakePicture(format, width, height, GradientValue);
 }
 
-std::unique_ptr<TZmBitmap> MakeNoise(TZmPixelFormat format, std::int32_t width,
-                                     std::int32_t height, std::uint32_t seed) {
+std::unique_ptr<TZmBitmap> MakeNoise(TZmPixelFormat format, std::int32_t width, std::int32_t height,
+                                     std::uint32_t seed) {
     TNoise noise(seed);
     return MakePicture(format, width, height,
-                       [&noise](std::int32_t, std::int32_t, std::int32_t) {
-                           return noise.Next();
-                       });
+                       [&noise](std::int32_t, std::int32_t, std::int32_t) { return noise.Next(); });
 }
 
 void AddNoiseAlpha(TZmBitmap& bitmap, std::uint32_t seed) {
@@ -121,8 +109,9 @@ void AddNoiseAlpha(TZmBitmap& bitmap, std::uint32_t seed) {
         for (std::int32_t x = 0; x < plane->GetWidth(); ++x) {
             const std::uint32_t kind = noise.Next() % 3;
             const auto value = static_cast<std::uint8_t>(noise.Next());
-            const std::uint8_t alpha = kind == 0 ? std::uint8_t{255}
-                                       : kind == 1 ? std::uint8_t{0} : value;
+            const std::uint8_t alpha = kind == 0   ? std::uint8_t{255}
+                                       : kind == 1 ? std::uint8_t{0}
+                                                   : value;
             plane->SetPixels_zm8(x, y, alpha);
         }
     }
@@ -132,22 +121,17 @@ void AddNoiseAlpha(TZmBitmap& bitmap, std::uint32_t seed) {
 double ChannelValue(TZmBitmap& bitmap, std::int32_t x, std::int32_t y, std::int32_t channel) {
     const auto index = static_cast<std::size_t>(channel);
     switch (bitmap.GetPixelFormat()) {
-        case zm1g:
-            return bitmap.GetPixels_zm1g(x, y) ? 1 : 0;
-        case zm16g:
-            return bitmap.GetPixels_zm16g(x, y);
-        case zm32f:
-            return static_cast<double>(bitmap.GetPixels_zm32f(x, y));
+        case zm1g: return bitmap.GetPixels_zm1g(x, y) ? 1 : 0;
+        case zm16g: return bitmap.GetPixels_zm16g(x, y);
+        case zm32f: return static_cast<double>(bitmap.GetPixels_zm32f(x, y));
         case zm48RGB: {
             const TRGB48 pixel = bitmap.GetPixels_zm48RGB(x, y);
             return channel == 0 ? pixel.r : channel == 1 ? pixel.g : pixel.b;
         }
-        default:
-            break;
+        default: break;
     }
     const auto channels = static_cast<std::size_t>(bitmap.GetChannelCount());
-    const std::uint8_t byte =
-        bitmap.GetScanLine(y)[static_cast<std::size_t>(x) * channels + index];
+    const std::uint8_t byte = bitmap.GetScanLine(y)[static_cast<std::size_t>(x) * channels + index];
     const bool is_signed = bitmap.GetPixelFormat() == zmCIELab && channel > 0;
     return is_signed ? static_cast<double>(static_cast<std::int8_t>(byte)) : byte;
 }

@@ -15,8 +15,8 @@ std::unique_ptr<TZmBitmap> MakeGradient(TZmPixelFormat format, std::int32_t widt
                                         std::int32_t height);
 
 /// Evenly distributed noise in all channels (finite floats of 0 to 1 in zm32f) from a seed.
-std::unique_ptr<TZmBitmap> MakeNoise(TZmPixelFormat format, std::int32_t width,
-                                     std::int32_t height, std::uint32_t seed);
+std::unique_ptr<TZmBitmap> MakeNoise(TZmPixelFormat format, std::int32_t width, std::int32_t height,
+                                     std::uint32_t seed);
 
 /// Gives the bitmap an alpha plane of noise; about one value in three is 255, one in three 0.
 void AddNoiseAlpha(TZmBitmap& bitmap, std::uint32_t seed);

@@ -25,8 +25,7 @@ inline std::string ReadWholeText(const std::filesystem::path& name) {
 inline TProcessResult RunProcess(const std::string& command, const std::filesystem::path& folder) {
     const std::filesystem::path out = folder / "stdout.txt";
     const std::filesystem::path err = folder / "stderr.txt";
-    const int status =
-        std::system((command + " >" + out.string() + " 2>" + err.string()).c_str());
+    const int status = std::system((command + " >" + out.string() + " 2>" + err.string()).c_str());
     TProcessResult result;
 #ifdef WEXITSTATUS
     result.exit_status = WIFEXITED(status) ? WEXITSTATUS(status) : -1;

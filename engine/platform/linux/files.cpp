@@ -196,12 +196,9 @@ int OpenFlags(TFileMode mode, mode_t existing_mode) {
     // Without O_NONBLOCK the opening of a pipe would wait for its other end, perhaps for ever.
     const int common = O_CLOEXEC | O_NONBLOCK | O_NOCTTY;
     switch (mode) {
-    case fmOpenRead:
-        return common | O_RDONLY;
-    case fmOpenReadWrite:
-        return common | O_RDWR;
-    case fmCreate:
-        break;
+        case fmOpenRead: return common | O_RDONLY;
+        case fmOpenReadWrite: return common | O_RDWR;
+        case fmCreate: break;
     }
     const bool plain = existing_mode == 0 || S_ISREG(existing_mode) || S_ISDIR(existing_mode);
     return plain ? common | O_RDWR | O_CREAT | O_TRUNC : common | O_WRONLY;
@@ -341,8 +338,7 @@ std::unique_ptr<TFileHandle> OpenFile(const std::u16string& name, TFileMode mode
     if (descriptor < 0) {
         return Fail(errno, error_text);
     }
-    const int unfit =
-        ::fstat(descriptor, &info) != 0 ? errno : UnfitKind(info.st_mode, mode);
+    const int unfit = ::fstat(descriptor, &info) != 0 ? errno : UnfitKind(info.st_mode, mode);
     if (unfit != 0) {
         ::close(descriptor);
         return Fail(unfit, error_text);

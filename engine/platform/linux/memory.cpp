@@ -49,8 +49,8 @@ std::string ControlGroupFolder() {
 /// The machine's memory, or the share of it that the process's control group and the groups
 /// around it leave, since beyond that share the process would be killed.
 std::int64_t LimitByControlGroups(std::int64_t bytes) {
-    bytes = std::min(bytes, LimitIn(std::string(kControlGroups) +
-                                        "/memory/memory.limit_in_bytes", bytes));
+    bytes = std::min(bytes,
+                     LimitIn(std::string(kControlGroups) + "/memory/memory.limit_in_bytes", bytes));
     std::string group = ControlGroupFolder();
     while (true) {
         bytes = std::min(bytes, LimitIn(kControlGroups + group + "/memory.max", bytes));
@@ -137,8 +137,8 @@ void* SystemHeapAllocate(std::size_t size_bytes) {
     if (size_bytes == 0) {
         return nullptr;
     }
-    void* const block = ::mmap(nullptr, size_bytes, PROT_READ | PROT_WRITE,
-                               MAP_PRIVATE | MAP_ANONYMOUS, -1, 0);
+    void* const block =
+        ::mmap(nullptr, size_bytes, PROT_READ | PROT_WRITE, MAP_PRIVATE | MAP_ANONYMOUS, -1, 0);
     if (block == MAP_FAILED) {
         return nullptr;
     }

@@ -50,8 +50,8 @@ bool TLinuxMapping::Resize(std::int64_t size_bytes) {
 }
 
 void* TLinuxMapping::MapWindow(std::int64_t position, std::size_t size_bytes) {
-    void* const window = ::mmap(nullptr, size_bytes, PROT_READ | PROT_WRITE, MAP_SHARED,
-                                descriptor_, position);
+    void* const window =
+        ::mmap(nullptr, size_bytes, PROT_READ | PROT_WRITE, MAP_SHARED, descriptor_, position);
     return window == MAP_FAILED ? nullptr : window;
 }
 

@@ -36,8 +36,8 @@ void WriteToFile(HANDLE handle, const std::string& text) {
     std::size_t done = 0;
     while (done < text.size()) {
         DWORD written = 0;
-        if (WriteFile(handle, text.data() + done, static_cast<DWORD>(text.size() - done),
-                      &written, nullptr) == FALSE ||
+        if (WriteFile(handle, text.data() + done, static_cast<DWORD>(text.size() - done), &written,
+                      nullptr) == FALSE ||
             written == 0) {
             return;
         }
@@ -102,9 +102,8 @@ std::optional<std::string> EnvironmentVariable(const std::string& name) {
 std::string LocaleName() {
     std::array<wchar_t, LOCALE_NAME_MAX_LENGTH> name{};
     const int length = GetUserDefaultLocaleName(name.data(), static_cast<int>(name.size()));
-    return length > 1
-               ? Utf8FromUtf16(FromWide(name.data(), static_cast<std::size_t>(length - 1)))
-               : std::string();
+    return length > 1 ? Utf8FromUtf16(FromWide(name.data(), static_cast<std::size_t>(length - 1)))
+                      : std::string();
 }
 
 }  // namespace zm::platform

@@ -16,8 +16,8 @@ namespace zm::platform {
 namespace {
 
 constexpr std::size_t kLongNameLength = 240;  // leaves room for the system's own additions
-constexpr DWORD kKeptAttributes = FILE_ATTRIBUTE_HIDDEN | FILE_ATTRIBUTE_SYSTEM |
-                                  FILE_ATTRIBUTE_NOT_CONTENT_INDEXED;
+constexpr DWORD kKeptAttributes =
+    FILE_ATTRIBUTE_HIDDEN | FILE_ATTRIBUTE_SYSTEM | FILE_ATTRIBUTE_NOT_CONTENT_INDEXED;
 constexpr int kMaxNameAttempts = 100;
 constexpr std::int64_t kUnixEpochTicks = 116'444'736'000'000'000;  // 1601 to 1970, in 100 ns
 
@@ -127,10 +127,9 @@ DWORD RefusalOf(const std::u16string& name) {
 /// Whether the last part of a name is one of the system's devices, such as NUL.
 bool IsDeviceName(const std::u16string& name) {
     std::array<wchar_t, 64> path{};
-    const DWORD length = GetFullPathNameW(WideOf(name), static_cast<DWORD>(path.size()),
-                                          path.data(), nullptr);
-    return length > 4 && length < path.size() &&
-           FromWide(path.data(), 4) == u"\\\\.\\";
+    const DWORD length =
+        GetFullPathNameW(WideOf(name), static_cast<DWORD>(path.size()), path.data(), nullptr);
+    return length > 4 && length < path.size() && FromWide(path.data(), 4) == u"\\\\.\\";
 }
 
 std::u16string RandomName() {
@@ -150,8 +149,7 @@ std::int64_t NanosecondsOf(const FILETIME& time) {
 
 FILETIME TimeOf(std::int64_t nanoseconds) {
     const std::int64_t rest = nanoseconds % 100;
-    const std::int64_t ticks =
-        nanoseconds / 100 - (rest < 0 ? 1 : 0) + kUnixEpochTicks;
+    const std::int64_t ticks = nanoseconds / 100 - (rest < 0 ? 1 : 0) + kUnixEpochTicks;
     return {static_cast<DWORD>(ticks), static_cast<DWORD>(ticks >> 32)};
 }
 
@@ -198,16 +196,14 @@ std::u16string NativeName(const std::u16string& name) {
 std::string ErrorText(DWORD error_code) {
     wchar_t* text = nullptr;
     const DWORD length = FormatMessageW(
-        FORMAT_MESSAGE_ALLOCATE_BUFFER | FORMAT_MESSAGE_FROM_SYSTEM |
-            FORMAT_MESSAGE_IGNORE_INSERTS,
+        FORMAT_MESSAGE_ALLOCATE_BUFFER | FORMAT_MESSAGE_FROM_SYSTEM | FORMAT_MESSAGE_IGNORE_INSERTS,
         nullptr, error_code, 0, reinterpret_cast<wchar_t*>(&text), 0, nullptr);
     std::u16string message = length > 0 ? FromWide(text, length) : std::u16string();
     LocalFree(text);
     while (!message.empty() && message.back() <= u' ') {
         message.pop_back();
     }
-    return message.empty() ? "System error " + std::to_string(error_code)
-                           : Utf8FromUtf16(message);
+    return message.empty() ? "System error " + std::to_string(error_code) : Utf8FromUtf16(message);
 }
 
 std::unique_ptr<TFileHandle> OpenFile(const std::u16string& name, TFileMode mode,
@@ -218,8 +214,8 @@ std::unique_ptr<TFileHandle> OpenFile(const std::u16string& name, TFileMode mode
     const DWORD access = mode == fmOpenRead ? GENERIC_READ : GENERIC_READ | GENERIC_WRITE;
     const DWORD share = mode == fmOpenRead ? FILE_SHARE_READ : 0;
     const DWORD disposition = mode == fmCreate ? CREATE_ALWAYS : OPEN_EXISTING;
-    const HANDLE handle = CreateFileW(WideOf(NativeName(name)), access, share, nullptr,
-                                      disposition, FILE_ATTRIBUTE_NORMAL, nullptr);
+    const HANDLE handle = CreateFileW(WideOf(NativeName(name)), access, share, nullptr, disposition,
+                                      FILE_ATTRIBUTE_NORMAL, nullptr);
     if (handle == INVALID_HANDLE_VALUE) {
         return Fail(GetLastError(), error_text);
     }
@@ -238,9 +234,8 @@ std::unique_ptr<TFileHandle> CreateTemporaryBeside(const std::u16string& target_
     }
     for (int attempt = 0; attempt < kMaxNameAttempts; ++attempt) {
         const std::u16string name = FileFolder(target_name) + RandomName();
-        const HANDLE handle =
-            CreateFileW(WideOf(NativeName(name)), GENERIC_READ | GENERIC_WRITE, 0, nullptr,
-                        CREATE_NEW, FILE_ATTRIBUTE_NORMAL, nullptr);
+        const HANDLE handle = CreateFileW(WideOf(NativeName(name)), GENERIC_READ | GENERIC_WRITE, 0,
+                                          nullptr, CREATE_NEW, FILE_ATTRIBUTE_NORMAL, nullptr);
         if (handle != INVALID_HANDLE_VALUE) {
             temporary_name = name;
             return std::make_unique<TWin32File>(handle, /*seekable=*/true);
@@ -272,18 +267,17 @@ std::unique_ptr<TFileHandle> CreateDeletingFile(const std::u16string& name,
 
 std::u16string ResolveLinkTarget(const std::u16string& target_name) {
     const DWORD attributes = AttributesOf(target_name);
-    if (attributes == INVALID_FILE_ATTRIBUTES ||
-        (attributes & FILE_ATTRIBUTE_REPARSE_POINT) == 0) {
+    if (attributes == INVALID_FILE_ATTRIBUTES || (attributes & FILE_ATTRIBUTE_REPARSE_POINT) == 0) {
         return target_name;
     }
     const THandle file(CreateFileW(WideOf(NativeName(target_name)), 0,
-                                   FILE_SHARE_READ | FILE_SHARE_WRITE | FILE_SHARE_DELETE,
-                                   nullptr, OPEN_EXISTING, FILE_FLAG_BACKUP_SEMANTICS, nullptr));
+                                   FILE_SHARE_READ | FILE_SHARE_WRITE | FILE_SHARE_DELETE, nullptr,
+                                   OPEN_EXISTING, FILE_FLAG_BACKUP_SEMANTICS, nullptr));
     std::vector<wchar_t> path(32768);
     const DWORD length =
-        file.IsValid() ? GetFinalPathNameByHandleW(file.Get(), path.data(),
-                                                   static_cast<DWORD>(path.size()), 0)
-                       : 0;
+        file.IsValid()
+            ? GetFinalPathNameByHandleW(file.Get(), path.data(), static_cast<DWORD>(path.size()), 0)
+            : 0;
     return length > 0 && length < path.size() ? FromWide(path.data(), length) : target_name;
 }
 
@@ -370,8 +364,8 @@ bool SetFileTimes(const std::u16string& name, const TFileTimes& times) {
         return false;
     }
     const THandle file(CreateFileW(WideOf(NativeName(name)), FILE_WRITE_ATTRIBUTES,
-                                   FILE_SHARE_READ | FILE_SHARE_WRITE | FILE_SHARE_DELETE,
-                                   nullptr, OPEN_EXISTING, FILE_FLAG_BACKUP_SEMANTICS, nullptr));
+                                   FILE_SHARE_READ | FILE_SHARE_WRITE | FILE_SHARE_DELETE, nullptr,
+                                   OPEN_EXISTING, FILE_FLAG_BACKUP_SEMANTICS, nullptr));
     const FILETIME created = TimeOf(times.created_ns);
     const FILETIME accessed = TimeOf(times.accessed_ns);
     const FILETIME modified = TimeOf(times.modified_ns);

@@ -52,8 +52,7 @@ bool FailsWithMessage(const std::function<void()>& body, TMessage& message) {
 
 struct TCatchFrame;
 
-using THandler = EXCEPTION_DISPOSITION(__cdecl*)(EXCEPTION_RECORD*, TCatchFrame*, CONTEXT*,
-                                                 void*);
+using THandler = EXCEPTION_DISPOSITION(__cdecl*)(EXCEPTION_RECORD*, TCatchFrame*, CONTEXT*, void*);
 
 /// An entry of the thread's chain of handlers. The system reads the first two fields.
 struct TCatchFrame {
@@ -76,8 +75,7 @@ void SetChainHead(void* head) {
 /// The text of an operating-system exception: that of one of ours, or its code.
 void DescribeException(const EXCEPTION_RECORD& record, TMessage& message) {
     if (record.ExceptionCode == kHostExceptionCode && record.NumberParameters >= 2) {
-        const auto* const text =
-            reinterpret_cast<const char16_t*>(record.ExceptionInformation[0]);
+        const auto* const text = reinterpret_cast<const char16_t*>(record.ExceptionInformation[0]);
         message.Set({text, static_cast<std::size_t>(record.ExceptionInformation[1])});
         return;
     }
@@ -145,8 +143,7 @@ bool CallCatchingHostExceptions(const std::function<void()>& body, std::u16strin
 
 std::intptr_t SendHostMessage(void* window, std::uint32_t message, std::uintptr_t wparam,
                               std::intptr_t lparam) {
-    return window == nullptr ? 0
-                             : SendMessageW(static_cast<HWND>(window), message, wparam, lparam);
+    return window == nullptr ? 0 : SendMessageW(static_cast<HWND>(window), message, wparam, lparam);
 }
 
 }  // namespace zm::platform

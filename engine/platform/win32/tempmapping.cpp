@@ -64,11 +64,10 @@ bool TWin32Mapping::Resize(std::int64_t size_bytes) {
 
 void* TWin32Mapping::MapWindow(std::int64_t position, std::size_t size_bytes) {
     const auto start = static_cast<std::uint64_t>(position);
-    return mapping_ == nullptr
-               ? nullptr
-               : MapViewOfFile(mapping_, FILE_MAP_READ | FILE_MAP_WRITE,
-                               static_cast<DWORD>(start >> 32), static_cast<DWORD>(start),
-                               size_bytes);
+    return mapping_ == nullptr ? nullptr
+                               : MapViewOfFile(mapping_, FILE_MAP_READ | FILE_MAP_WRITE,
+                                               static_cast<DWORD>(start >> 32),
+                                               static_cast<DWORD>(start), size_bytes);
 }
 
 std::u16string UniqueName(const std::string& descriptor) {
