@@ -24,7 +24,7 @@ configure = cmake --preset $(1) $(launcher) $(2) >build/$(1).configure.log || \
 # $(call compile,PRESET,TARGETS)
 compile = cmake --build --preset $(1) -j $(JOBS) $(if $(2),--target $(2))
 
-.PHONY: help build debug demo test bench windows test-windows sanitize tsan fuzz check format \
+.PHONY: help build debug demo gallery test bench windows test-windows sanitize tsan fuzz check format \
 	clean clean-cache
 
 help: ## Show this list
@@ -47,6 +47,10 @@ debug: | build/.folder ## Build everything for the debugger
 
 demo: build ## Run an example job on IMAGE=my.jpg, or on a sample picture drawn here
 	@scripts/demo.sh build/release/bin "$(IMAGE)" "$(JOB)"
+
+gallery: build ## Make the pictures of docs/gallery anew
+	$(call say,Making the pictures of docs/gallery)
+	@scripts/make_gallery.py build/release/bin
 
 test: | build/.folder ## Build and run all tests
 	$(call say,Testing: all test programs, optimized)

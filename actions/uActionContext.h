@@ -30,6 +30,18 @@ public:
     virtual bool GetBoolDef(std::u16string_view key, bool default_value) const = 0;
 };
 
+/// Both sides of it. A key is stored in its old place or at the end; storing an empty text removes
+/// the key.
+class IStepSettings : public IStepParams {
+public:
+    virtual void SetInteger(std::u16string_view key, std::int32_t value) = 0;
+    virtual void SetString(std::u16string_view key, std::u16string_view value) = 0;
+    /// Stores 0 or 1.
+    virtual void SetBool(std::u16string_view key, bool value) = 0;
+    /// Removes all keys.
+    virtual void Clear() = 0;
+};
+
 /// Kind of a host log line that tells of an error.
 inline constexpr std::int32_t kInfoKindError = 2;
 
@@ -50,6 +62,10 @@ public:
     /// Does nothing with a host that has no such service.
     virtual void SetLastError(std::int32_t job_id, std::int32_t code,
                               const std::u16string& text) = 0;
+    /// The host's scale of its forms, 100 to 250 percent.
+    virtual std::int32_t DefaultScale() const = 0;
+    /// The host's main window as the host gave it; nil when it has none.
+    virtual void* MainWindow() const = 0;
 };
 
 /// Installs the services for the process; the caller keeps them alive. Done at start, before

@@ -69,6 +69,24 @@ constexpr TColorName kColorNames[] = {
     {0x20000000, u"clDefault"},
 };
 
+/// Rows of the table that a colour box offers, after its entry for custom colours.
+constexpr std::int32_t kColorBoxRows = 20;
+
+/// An identifier as people write it: without "cl", words apart, nothing abbreviated.
+std::u16string PrettyName(std::u16string_view identifier) {
+    if (identifier == u"clMedGray") {
+        return u"Medium Gray";
+    }
+    std::u16string name;
+    for (const char16_t character : identifier.substr(2)) {
+        if (!name.empty() && character >= u'A' && character <= u'Z') {
+            name += u' ';
+        }
+        name += character;
+    }
+    return name;
+}
+
 std::u16string HexadecimalText(std::uint32_t value) {
     constexpr char16_t kDigits[] = u"0123456789ABCDEF";
     std::u16string text = u"$";
@@ -99,6 +117,28 @@ std::u16string ColorDescription(TColor color) {
         return u"#" + name.substr(3);
     }
     return name;
+}
+
+std::vector<std::u16string> ColorBoxItems() {
+    std::vector<std::u16string> items{u"Custom..."};
+    for (std::int32_t row = 0; row < kColorBoxRows; ++row) {
+        items.push_back(PrettyName(kColorNames[row].name));
+    }
+    return items;
+}
+
+std::int32_t ColorBoxIndex(TColor color) {
+    for (std::int32_t index = 1; index <= kColorBoxRows; ++index) {
+        if (ColorBoxColor(index) == color) {
+            return index;
+        }
+    }
+    return 0;
+}
+
+TColor ColorBoxColor(std::int32_t index) {
+    return index < 1 || index > kColorBoxRows ? 0
+                                              : static_cast<TColor>(kColorNames[index - 1].value);
 }
 
 }  // namespace zm

@@ -17,6 +17,9 @@ constexpr std::int32_t kErrorFileMissing = 3;
 constexpr std::int32_t kErrorNotReadable = 4;
 constexpr std::int32_t kErrorNotSaved = 5;
 
+/// Told of images on the clipboard, in dots per inch.
+constexpr std::int32_t kClipboardDpi = 200;
+
 constexpr std::array<TSaveFormat, kSaveFormatCount> kSaveFormatCodes{{
     {ioJPEG, u"JPEG"},
     {ioPNG, u"PNG"},
@@ -105,14 +108,20 @@ bool TQVImageList::OpenFromFile(const IStepParams& params, TZmBitmap& bitmap) {
     return true;
 }
 
-bool TQVImageList::Open(const IStepParams& params) {
-    if (params.GetInteger(u"source") != 0) {
+bool TQVImageList::OpenFromClipboard(const IStepParams& params, TZmBitmap& bitmap) {
+    if (!bitmap.PasteFromClipboard()) {
         ReportJobError(params.GetTaskId(), kErrorNotReadable,
                        u"Clipboard does not contain image data");
         return false;
     }
+    return true;
+}
+
+bool TQVImageList::Open(const IStepParams& params) {
     auto bitmap = std::make_unique<TZmBitmap>();
-    if (!OpenFromFile(params, *bitmap)) {
+    const bool is_open = params.GetInteger(u"source") != 0 ? OpenFromClipboard(params, *bitmap)
+                                                           : OpenFromFile(params, *bitmap);
+    if (!is_open) {
         return false;
     }
     StoreBitmap(params.GetTaskId(), std::move(bitmap));
@@ -148,16 +157,23 @@ bool TQVImageList::SaveToFile(const IStepParams& params, TZmBitmap& bitmap) {
     return saved;
 }
 
+bool TQVImageList::SaveToClipboard(const IStepParams& params, TZmBitmap& bitmap) {
+    const bool copied = bitmap.CopyToClipboard(/*IncludeZalmoFormat=*/true,
+                                               /*IncludePNGFormat=*/false, kClipboardDpi,
+                                               kClipboardDpi);
+    if (!copied) {
+        ReportJobError(params.GetTaskId(), kErrorNotSaved, u"Cannot copy image to clipboard");
+    }
+    return copied;
+}
+
 bool TQVImageList::Save(const IStepParams& params) {
     TZmBitmap* bitmap = JobBitmap(params.GetTaskId());
     if (bitmap == nullptr) {
         return false;
     }
-    if (params.GetInteger(u"dest") != 0) {
-        ReportJobError(params.GetTaskId(), kErrorNotSaved, u"Cannot copy image to clipboard");
-        return false;
-    }
-    return SaveToFile(params, *bitmap);
+    return params.GetInteger(u"dest") != 0 ? SaveToClipboard(params, *bitmap)
+                                           : SaveToFile(params, *bitmap);
 }
 
 }  // namespace zm

@@ -51,8 +51,14 @@ public:
     /// Keys as Crop, as widths of the borders, and `color`.
     bool AddBorder(const IStepParams& params);
 
-    /// Draw nothing: the engine has neither text nor rendering. False, without a report.
+    /// Writes a text. Keys: `text` (expanded), `font_name`, `font_size` (points), `font_color`,
+    /// `font_styles` (1 bold, 2 italic, 4 underlined, 8 struck out), `x_pos`, `y_pos` (0 left or
+    /// top, 1 centred, 2 right or bottom, else `custom_x`, `custom_y`, expanded). A font that is
+    /// missing is replaced; an empty text succeeds.
     bool TextOut(const IStepParams& params);
+    /// Lays a picture over the image, which becomes zm24RGB and keeps its alpha. Keys:
+    /// `image_file` (expanded), positions as above, `opacity` (percent, expanded). False without a
+    /// report for a file that is missing, not readable or empty.
     bool DrawImage(const IStepParams& params);
 
 private:
@@ -62,7 +68,9 @@ private:
     void StoreBitmap(std::int32_t job_id, std::unique_ptr<TZmBitmap> bitmap);
     std::unique_ptr<TZmBitmap> TakeBitmap(std::int32_t job_id);
     bool OpenFromFile(const IStepParams& params, TZmBitmap& bitmap);
+    bool OpenFromClipboard(const IStepParams& params, TZmBitmap& bitmap);
     bool SaveToFile(const IStepParams& params, TZmBitmap& bitmap);
+    bool SaveToClipboard(const IStepParams& params, TZmBitmap& bitmap);
 
     std::unordered_map<std::int32_t, std::unique_ptr<TZmBitmap>> FList;
     std::mutex FLock;

@@ -3,6 +3,9 @@
 
 #include <benchmark/benchmark.h>
 
+#include <cstring>
+#include <vector>
+
 #include "engine/bitmap/zmblend.h"
 #include "engine/bitmap/zmxBitmaps.h"
 
@@ -55,8 +58,29 @@ void RenderOverlay(benchmark::State& state) {
     Draw(state, 2000, 2000, zm24RGB, TBenchPlane::kNoise, 0.8, zmlNormal);
 }
 
+/// The operation alone; what mixing by alpha adds is the difference of RenderWhole's rows.
+constexpr std::int32_t kOverlaySide = 1000;
+
+/// The overlay of a drawing step: 1 megapixel with alpha, at its own size.
+void DrawImage(benchmark::State& state, double opacity) {
+    Draw(state, kOverlaySide, kOverlaySide, zm24RGB, TBenchPlane::kNoise, opacity, zmlNormal);
+}
+
+/// Its yardstick: the overlay's pixels, its plane and the picture below, copied.
+void CopyOverlay(benchmark::State& state) {
+    const std::size_t bytes = std::size_t{kOverlaySide} * kOverlaySide * (3 + 1 + 3);
+    const std::vector<std::uint8_t> source(bytes, 7);
+    std::vector<std::uint8_t> dest(bytes);
+    for (auto _ : state) {
+        std::memcpy(dest.data(), source.data(), bytes);
+        benchmark::DoNotOptimize(dest.data());
+        benchmark::ClobberMemory();
+    }
+    CountPixels(state, kOverlaySide, kOverlaySide);
+}
+
 void RenderOperation(benchmark::State& state, TZmRenderOperation operation) {
-    Draw(state, kWidth, kHeight, zm24RGB, TBenchPlane::kNoise, 0.8, operation);
+    Draw(state, kWidth, kHeight, zm24RGB, TBenchPlane::kNone, 1.0, operation);
 }
 
 /// The whole picture at half its size.
@@ -87,6 +111,9 @@ BENCHMARK_CAPTURE(RenderWhole, zm32RGB_plane, zm32RGB, TBenchPlane::kNoise, 1.0)
 BENCHMARK_CAPTURE(RenderWhole, zm48RGB_plane, zm48RGB, TBenchPlane::kNoise, 1.0)
     ->Unit(benchmark::kMillisecond);
 BENCHMARK(RenderOverlay)->Unit(benchmark::kMillisecond);
+BENCHMARK_CAPTURE(DrawImage, alpha, 1.0)->Unit(benchmark::kMillisecond);
+BENCHMARK_CAPTURE(DrawImage, alpha_and_opacity, 0.85)->Unit(benchmark::kMillisecond);
+BENCHMARK(CopyOverlay)->Unit(benchmark::kMillisecond);
 BENCHMARK_CAPTURE(RenderOperation, zmlMul, zmlMul)->Unit(benchmark::kMillisecond);
 BENCHMARK_CAPTURE(RenderOperation, zmlScreen, zmlScreen)->Unit(benchmark::kMillisecond);
 BENCHMARK_CAPTURE(RenderOperation, zmlOverlay, zmlOverlay)->Unit(benchmark::kMillisecond);

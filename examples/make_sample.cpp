@@ -12,6 +12,9 @@
 /// make_sample FILE [WIDTH HEIGHT]: draws a mountain lake at sunset and saves it in the format
 /// that the file's extension names. Every point is computed, so that any size has fine detail
 /// and smooth slopes, as a photo has.
+///
+/// make_sample --logo FILE: draws a round badge with a transparent margin, for laying over
+/// pictures; a format with transparency has to be named.
 namespace zm {
 namespace {
 
@@ -139,6 +142,62 @@ bool DrawPicture(TZmBitmap& bitmap, std::int32_t width, std::int32_t height) {
     return true;
 }
 
+// The badge: two mountains before an evening sky, in a white ring.
+constexpr std::int32_t kBadgeSide = 160;
+constexpr double kBadgeRadius = 64.0;
+constexpr double kBadgeRing = 6.0;
+constexpr std::int32_t kSamples = 4;  // a side: colours are the mean of points within a pixel
+
+/// At x, y from the middle, in radii, y upward.
+TColorF BadgeColor(double x, double y) {
+    const double ridge = std::max(0.35 - 0.9 * std::abs(x - 0.25), 0.1 - 0.8 * std::abs(x + 0.4));
+    if (y < -0.45) {
+        return {36, 66, 110};
+    }
+    if (y < ridge) {
+        return y > ridge - 0.18 ? TColorF{244, 246, 250} : TColorF{72, 76, 118};
+    }
+    return Mix({250, 186, 110}, {222, 100, 92}, y);
+}
+
+/// Means over the points of one pixel; alpha is the part of them that lie on the badge.
+void DrawBadgePixel(TZmBitmap& bitmap, std::int32_t px, std::int32_t py) {
+    TColorF sum;
+    std::int32_t count = 0;
+    for (std::int32_t i = 0; i < kSamples * kSamples; ++i) {
+        const double x = px + (i % kSamples + 0.5) / kSamples - kBadgeSide / 2.0;
+        const double y = kBadgeSide / 2.0 - py - (i / kSamples + 0.5) / kSamples;
+        const double distance = std::hypot(x, y);
+        if (distance >= kBadgeRadius) {
+            continue;
+        }
+        const TColorF color = distance > kBadgeRadius - kBadgeRing
+                                  ? TColorF{255, 255, 255}
+                                  : BadgeColor(x / kBadgeRadius, y / kBadgeRadius);
+        sum = {sum.r + color.r, sum.g + color.g, sum.b + color.b};
+        ++count;
+    }
+    bitmap.SetAlpha(px, py, Clamp8(255 * count / (kSamples * kSamples)));
+    if (count > 0) {
+        bitmap.SetPixels(
+            px, py,
+            TRGB{Clamp8(RoundHalfEven(sum.b / count)), Clamp8(RoundHalfEven(sum.g / count)),
+                 Clamp8(RoundHalfEven(sum.r / count))});
+    }
+}
+
+bool DrawBadge(TZmBitmap& bitmap) {
+    if (!bitmap.Allocate(kBadgeSide, kBadgeSide, /*fill_color=*/0, /*alpha=*/0)) {
+        return false;
+    }
+    for (std::int32_t y = 0; y < kBadgeSide; ++y) {
+        for (std::int32_t x = 0; x < kBadgeSide; ++x) {
+            DrawBadgePixel(bitmap, x, y);
+        }
+    }
+    return true;
+}
+
 /// A side from 1 to kMaxSide; 0 when the text is none.
 std::int32_t ParseSide(const std::string& text) {
     const bool digits = !text.empty() && text.size() <= 5 &&
@@ -148,20 +207,23 @@ std::int32_t ParseSide(const std::string& text) {
 }
 
 int Main(const std::vector<std::string>& arguments) {
+    const bool is_badge = arguments.size() == 3 && arguments[1] == "--logo";
     const bool sized = arguments.size() == 4;
     const std::int32_t width = sized ? ParseSide(arguments[2]) : kDefaultWidth;
     const std::int32_t height = sized ? ParseSide(arguments[3]) : kDefaultHeight;
-    if ((!sized && arguments.size() != 2) || width < 1 || height < 1) {
-        platform::WriteStderr("usage: make_sample FILE [WIDTH HEIGHT]\n");
+    if ((!sized && !is_badge && arguments.size() != 2) || width < 1 || height < 1) {
+        platform::WriteStderr(
+            "usage: make_sample FILE [WIDTH HEIGHT]\n       make_sample --logo FILE\n");
         return 2;
     }
     TZmBitmap bitmap;
-    if (!DrawPicture(bitmap, width, height)) {
+    if (is_badge ? !DrawBadge(bitmap) : !DrawPicture(bitmap, width, height)) {
         platform::WriteStderr("make_sample: no memory for the picture\n");
         return 1;
     }
-    if (!bitmap.Write(Utf16FromUtf8(arguments[1]), nullptr)) {
-        platform::WriteStderr("make_sample: cannot write " + arguments[1] + "\n");
+    const std::string& name = arguments[is_badge ? 2 : 1];
+    if (!bitmap.Write(Utf16FromUtf8(name), nullptr)) {
+        platform::WriteStderr("make_sample: cannot write " + name + "\n");
         return 1;
     }
     return 0;

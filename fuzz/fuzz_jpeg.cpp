@@ -3,6 +3,7 @@
 
 #include <cstddef>
 #include <cstdint>
+#include <cstdlib>
 
 #include "engine/bitmap/zmxBitmaps.h"
 #include "engine/codecs/jpegfilt.h"
@@ -38,6 +39,21 @@ void Load(const std::uint8_t* data, std::size_t size, const zm::TJpegReadOptions
     zm::WriteJPEGStream(output, bitmap, params, progress);
 }
 
+/// An exchanged file takes the same exchange once more.
+void Exchange(const std::uint8_t* data, std::size_t size, zm::TJpegBlock block) {
+    constexpr std::uint8_t kBlock[] = {'E', 'x', 'i', 'f', 0, 0, 'M', 'M'};
+    zm::TBorrowedMemoryStream stream(data, static_cast<std::int64_t>(size));
+    zm::TMemoryStream output;
+    if (!zm::ExchangeJpegBlock(stream, output, block, kBlock)) {
+        return;
+    }
+    output.SetPosition(0);
+    zm::TMemoryStream again;
+    if (!zm::ExchangeJpegBlock(output, again, block, kBlock)) {
+        std::abort();
+    }
+}
+
 }  // namespace
 
 extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size) {
@@ -45,6 +61,8 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size
     if (!has_limits || size > kMaxInputBytes) {
         return 0;
     }
+    Exchange(data, size, zm::kJpegBlockIptc);
+    Exchange(data, size, zm::kJpegBlockExif);
     zm::TJpegReadOptions options;
     Load(data, size, options, zm::ioJPEG_FULLSIZE);
     Load(data, size, options, zm::ioJPEG_EIGHTH);

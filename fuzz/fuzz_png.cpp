@@ -4,7 +4,6 @@
 #include <cstddef>
 #include <cstdint>
 
-#include "engine/bitmap/zmmask.h"
 #include "engine/bitmap/zmxBitmaps.h"
 #include "engine/codecs/pngfilt.h"
 #include "engine/foundation/zmstreams.h"
@@ -33,13 +32,8 @@ void Load(const std::uint8_t* data, std::size_t size, bool native, bool params_o
     if (aborting || params_only) {
         return;
     }
-    zm::TZmMask alpha;
-    if (bitmap.HasAlphaChannel()) {
-        bitmap.CopyToTZmMask(alpha);
-    }
     zm::TMemoryStream output;
-    zm::WritePNGStream(output, bitmap, params, bitmap.HasAlphaChannel() ? &alpha : nullptr,
-                       progress);
+    zm::WritePNGStreamWithAlpha(output, bitmap, params, progress);
 }
 
 }  // namespace

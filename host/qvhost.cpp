@@ -16,6 +16,8 @@ constexpr char16_t kSilentFailure[] = u"the action failed without telling why";
 
 // The callbacks carry no job, and every job has a thread of its own.
 thread_local THostJob* current_job = nullptr;
+// Who is asked while a dialog of the plug-in is open.
+thread_local IHostDesk* current_desk = nullptr;
 
 void ZM_STDCALL GetMemory(void** block, std::int32_t size_bytes) {
     *block = size_bytes < 0 ? nullptr : std::malloc(static_cast<std::size_t>(size_bytes));
@@ -29,6 +31,8 @@ void ZM_STDCALL FreeMemory(void** block, std::int32_t) {
 void ZM_STDCALL InfoOut(std::int32_t, const char16_t* text) {
     if (current_job != nullptr && text != nullptr) {
         current_job->AddLogLine(text);
+    } else if (current_desk != nullptr && text != nullptr) {
+        current_desk->AddLogLine(text);
     }
 }
 
@@ -57,11 +61,16 @@ void ZM_STDCALL ExpandText(const char16_t* text, char16_t* buffer, std::int32_t*
     }
 }
 
-/// Nobody sits at the screen: no variable is picked.
+/// Where nobody sits at the screen no variable is picked.
 void ZM_STDCALL SelectVar(char16_t* buffer, std::int32_t max_length) {
-    if (max_length > 0) {
-        buffer[0] = u'\0';
+    if (max_length <= 0) {
+        return;
     }
+    const std::u16string picked =
+        current_desk == nullptr ? std::u16string() : current_desk->SelectVariable();
+    const std::size_t length = std::min(picked.size(), static_cast<std::size_t>(max_length) - 1);
+    std::copy_n(picked.data(), length, buffer);
+    buffer[length] = u'\0';
 }
 
 /// The parameters of one call; the block belongs to the host's heap, as the contract has it.
@@ -81,6 +90,11 @@ public:
     TCallParams(const TCallParams&) = delete;
     TCallParams& operator=(const TCallParams&) = delete;
     TAFActionParams* Get() { return &params_; }
+    /// The text as the plug-in has left it.
+    std::u16string Text() const {
+        const auto* text = static_cast<const char16_t*>(params_.PPtr);
+        return text == nullptr ? std::u16string() : text;
+    }
 
 private:
     TAFActionParams params_{};
@@ -143,6 +157,23 @@ std::u16string THost::Describe(std::int32_t action_index, const std::u16string& 
     plugin_info_->ActionsInfo->ActionDescr(action_index, params.Get(), buffer.data());
     buffer.back() = u'\0';
     return buffer.data();
+}
+
+std::optional<std::u16string> THost::Configure(std::int32_t action_index,
+                                               const std::u16string& step_text,
+                                               IHostDesk& desk) const {
+    TCallParams params(step_text, 0, 0);
+    TLongBool result = kLongFalse;
+    std::u16string exception_text;
+    current_desk = &desk;
+    const bool returned = platform::CallCatchingHostExceptions(
+        [&] { result = plugin_info_->ActionsInfo->ConfigAction(action_index, params.Get()); },
+        exception_text);
+    current_desk = nullptr;
+    if (!returned) {
+        desk.AddLogLine(exception_text);
+    }
+    return returned && result != kLongFalse ? std::optional(params.Text()) : std::nullopt;
 }
 
 THostJob::THostJob(const THost& host, std::uint32_t task_id, TJobVariables variables)

@@ -2,6 +2,7 @@
 
 #include <cstdint>
 #include <memory>
+#include <optional>
 #include <string>
 #include <vector>
 
@@ -19,6 +20,15 @@ struct THostAction {
     std::u16string id;
 };
 
+/// Someone at the screen: what the plug-in asks for and tells outside of jobs, on the same thread.
+class IHostDesk {
+public:
+    virtual ~IHostDesk() = default;
+    virtual void AddLogLine(const std::u16string& line) = 0;
+    /// A variable with its braces, or empty when none was picked.
+    virtual std::u16string SelectVariable() = 0;
+};
+
 /// A loaded plug-in. One per process. After Load its members may be called from any thread.
 class THost {
 public:
@@ -33,6 +43,11 @@ public:
     THostAction Action(std::int32_t index) const;
     /// The plug-in's one-line description of a step.
     std::u16string Describe(std::int32_t action_index, const std::u16string& step_text) const;
+    /// Shows the plug-in's dialog for a step. The step's new text; nothing when it stays, because
+    /// the user cancelled or because of what the desk's log then tells.
+    std::optional<std::u16string> Configure(std::int32_t action_index,
+                                            const std::u16string& step_text,
+                                            IHostDesk& desk) const;
 
 private:
     friend class THostJob;

@@ -6,7 +6,6 @@ namespace zm::qvrun {
 namespace {
 
 constexpr std::u16string_view kBlanks = u" \t";
-constexpr std::string_view kByteOrderMark = "\xEF\xBB\xBF";
 
 std::u16string_view Trimmed(std::u16string_view text) {
     const auto first = text.find_first_not_of(kBlanks);
@@ -25,35 +24,43 @@ bool RefersToInputFile(std::u16string_view value) {
     return false;
 }
 
+TJobLine FaultyLine(const char* message) {
+    return {jlFault, {}, message};
+}
+
 /// Adds one line to the job; the message of the fault, or empty.
 std::string AddLine(std::u16string_view line, std::int32_t number, TJobFile& job) {
+    TJobLine read = ReadJobLine(line);
+    if (read.kind == jlHead) {
+        job.steps.push_back({std::move(read.action), {}, number});
+    } else if (read.kind == jlSetting && job.steps.empty()) {
+        return "a key stands before the first section";
+    } else if (read.kind == jlSetting) {
+        job.uses_input_file = job.uses_input_file || RefersToInputFile(line);
+        job.steps.back().text.append(line).append(u"\r\n");
+    }
+    return read.fault;
+}
+
+}  // namespace
+
+TJobLine ReadJobLine(std::u16string_view line) {
     const std::u16string_view trimmed = Trimmed(line);
     if (trimmed.empty() || trimmed.front() == u'#' || trimmed.front() == u';') {
         return {};
     }
-    if (trimmed.front() == u'[') {
-        if (trimmed.back() != u']') {
-            return "a section head must end in \"]\"";
-        }
-        const std::u16string_view action = Trimmed(trimmed.substr(1, trimmed.size() - 2));
-        if (action.empty()) {
-            return "a section head must name an action";
-        }
-        job.steps.push_back({std::u16string(action), {}, number});
-        return {};
+    if (trimmed.front() != u'[') {
+        return line.find(u'=') == std::u16string_view::npos
+                   ? FaultyLine("expected \"[action]\" or \"key=value\"")
+                   : TJobLine{jlSetting, {}, {}};
     }
-    if (line.find(u'=') == std::u16string_view::npos) {
-        return "expected \"[action]\" or \"key=value\"";
+    if (trimmed.back() != u']') {
+        return FaultyLine("a section head must end in \"]\"");
     }
-    if (job.steps.empty()) {
-        return "a key stands before the first section";
-    }
-    job.uses_input_file = job.uses_input_file || RefersToInputFile(line);
-    job.steps.back().text.append(line).append(u"\r\n");
-    return {};
+    const std::u16string_view action = Trimmed(trimmed.substr(1, trimmed.size() - 2));
+    return action.empty() ? FaultyLine("a section head must name an action")
+                          : TJobLine{jlHead, std::u16string(action), {}};
 }
-
-}  // namespace
 
 bool ParseJobText(std::string_view text, TJobFile& job, TJobFileError& error) {
     job = {};

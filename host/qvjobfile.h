@@ -21,13 +21,31 @@ struct TJobFile {
     bool uses_input_file = false;
 };
 
+/// What one line of a job file is. Lines come without their ends.
+enum TJobLineKind : std::uint8_t {
+    jlNothing,  ///< blank or a comment (first non-blank character # or ;)
+    jlHead,     ///< `[action]`
+    jlSetting,  ///< `key=value`
+    jlFault,
+};
+
+struct TJobLine {
+    TJobLineKind kind = jlNothing;
+    std::u16string action;  ///< of a head: text between the brackets, blanks around it removed
+    std::string fault;      ///< UTF-8
+};
+
+TJobLine ReadJobLine(std::u16string_view line);
+
 struct TJobFileError {
     std::int32_t line = 0;  ///< from 1; 0 when the fault is the file as a whole
     std::string message;    ///< UTF-8, without place
 };
 
-/// Parses a job text. A line is blank, a comment (first non-blank character # or ;), a section
-/// head `[action]`, or `key=value`. True when `job` holds at least one step; otherwise `error`
+/// Byte order mark that a job text may begin with.
+inline constexpr std::string_view kByteOrderMark = "\xEF\xBB\xBF";
+
+/// Parses a job text. True when `job` holds at least one step; otherwise `error`
 /// tells the first fault.
 [[nodiscard]] bool ParseJobText(std::string_view text, TJobFile& job, TJobFileError& error);
 

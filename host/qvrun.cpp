@@ -8,6 +8,7 @@
 #include "engine/platform/console.h"
 #include "engine/platform/files.h"
 #include "engine/platform/module.h"
+#include "host/qvedit.h"
 #include "host/qvprogress.h"
 #include "host/qvrunner.h"
 
@@ -214,6 +215,39 @@ int RunJobFile(const TOptions& options) {
     return RunResolved(options, host, request);
 }
 
+/// The job's text; nothing, without an error, when there is no such file yet.
+std::optional<std::string> ReadJobToEdit(const std::string& name, std::string& error_text) {
+    if (platform::GetFileKind(Utf16FromUtf8(name)) == platform::fkNone) {
+        return std::nullopt;
+    }
+    return ReadTextFile(name, error_text);
+}
+
+int EditJobFile(const TOptions& options) {
+    std::string error_text;
+    const auto text = ReadJobToEdit(options.job_file, error_text);
+    if (!error_text.empty()) {
+        return UsageError("cannot read the job file: " + error_text);
+    }
+    THost host;
+    if (!LoadPlugin(options, host)) {
+        return kExitUsage;
+    }
+    std::u16string reason;
+    IJobEditorWindow* const window = FindEditWindow(FileFolder(platform::ProgramPath()), reason);
+    TJobEditor editor(host, Utf16FromUtf8(options.job_file), window);
+    TJobFileError error;
+    if (!editor.Open(text, error)) {
+        return JobFileError(options.job_file, error);
+    }
+    if (window == nullptr) {
+        return UsageError("cannot open the job editor: " + Utf8FromUtf16(reason) +
+                          "; a job file is plain text, any text editor changes it too");
+    }
+    window->Run(editor);
+    return kExitDone;
+}
+
 void DeclareRunOptions(CLI::App& run, TOptions& options) {
     run.add_option("job", options.job_file, "Job file")->required();
     run.add_option("files", options.files,
@@ -224,6 +258,7 @@ void DeclareRunOptions(CLI::App& run, TOptions& options) {
     run.add_option("-j,--jobs", options.jobs, "Jobs at a time")->check(CLI::Range(1, 256));
     run.add_option("--set", options.settings, "NAME=VALUE: a variable {NAME} for the job")
         ->expected(1)
+        ->allow_extra_args(false)  // what follows may be the job or a file
         ->take_all();
     run.add_option("-o,--output", options.output, "Folder that {out} stands for (made if missing)")
         ->check([](const std::string& name) {
@@ -241,7 +276,9 @@ int Main(const std::vector<std::string>& arguments) {
     app.require_subcommand(1);
     CLI::App* run = app.add_subcommand("run", "Run a job file over pictures");
     CLI::App* actions = app.add_subcommand("actions", "List the plug-in's actions and their ids");
-    for (CLI::App* command : {run, actions}) {
+    CLI::App* edit = app.add_subcommand("edit", "Make or change a job file in a window");
+    edit->add_option("job", options.job_file, "Job file; made when it is not there")->required();
+    for (CLI::App* command : {run, actions, edit}) {
         command->add_option("--plugin", options.plugin,
                             "The plug-in (default: Graphics.qvp beside qvrun)");
     }
@@ -251,6 +288,9 @@ int Main(const std::vector<std::string>& arguments) {
         app.parse(reversed);
     } catch (const CLI::ParseError& error) {
         return app.exit(error) == 0 ? kExitDone : kExitUsage;
+    }
+    if (edit->parsed()) {
+        return EditJobFile(options);
     }
     return actions->parsed() ? ListActions(options) : RunJobFile(options);
 }

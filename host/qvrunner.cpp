@@ -11,16 +11,6 @@
 namespace zm::qvrun {
 namespace {
 
-std::optional<std::int32_t> FindAction(const std::u16string& wanted, const THost& host) {
-    for (std::int32_t index = 0; index < host.ActionCount(); ++index) {
-        const THostAction action = host.Action(index);
-        if (AsciiEqualNoCase(wanted, action.name) || AsciiEqualNoCase(wanted, action.id)) {
-            return index;
-        }
-    }
-    return std::nullopt;
-}
-
 TJobVariables VariablesOfJob(const TRunRequest& request, std::size_t index) {
     TJobVariables variables;
     variables.file = request.files[index];
@@ -56,6 +46,16 @@ TJobOutcome RunOneJob(const THost& host, const TRunRequest& request, std::size_t
 }
 
 }  // namespace
+
+std::optional<std::int32_t> FindAction(const std::u16string& wanted, const THost& host) {
+    for (std::int32_t index = 0; index < host.ActionCount(); ++index) {
+        const THostAction action = host.Action(index);
+        if (AsciiEqualNoCase(wanted, action.name) || AsciiEqualNoCase(wanted, action.id)) {
+            return index;
+        }
+    }
+    return std::nullopt;
+}
 
 bool ResolveSteps(const TJobFile& job, const THost& host, std::vector<TRunStep>& steps,
                   TJobFileError& error) {

@@ -2,6 +2,7 @@
 
 #include <cstdint>
 #include <functional>
+#include <optional>
 #include <string>
 #include <vector>
 
@@ -20,8 +21,10 @@ struct TRunStep {
     std::int32_t line = 0;  ///< in the job file
 };
 
-/// Finds the plug-in's action for each step, by name or by ActionID, without case. False with
-/// the first unknown one in `error`.
+/// Index of the plug-in's action by its name or ActionID, without case; nothing when it has none.
+std::optional<std::int32_t> FindAction(const std::u16string& wanted, const THost& host);
+
+/// Finds the plug-in's action for each step. False with the first unknown one in `error`.
 [[nodiscard]] bool ResolveSteps(const TJobFile& job, const THost& host,
                                 std::vector<TRunStep>& steps, TJobFileError& error);
 

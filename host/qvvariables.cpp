@@ -72,6 +72,21 @@ std::u16string Digits(std::int32_t number, std::size_t width) {
 
 }  // namespace
 
+const std::vector<TVariableInfo>& KnownVariables() {
+    static const std::vector<TVariableInfo> variables{
+        {u"{file}", u"the picture that the job runs for"},
+        {u"{dir}", u"its folder"},
+        {u"{name}", u"its name without folder and extension"},
+        {u"{ext}", u"its extension without the dot"},
+        {u"{out}", u"the output folder (--output)"},
+        {u"{index}", u"number of the picture, from 1"},
+        {u"{date}", u"date at the start, as 2026-11-21"},
+        {u"{time}", u"time at the start, as 14-05-09"},
+        {u"{env:HOME}", u"a variable of the environment, here HOME"},
+    };
+    return variables;
+}
+
 void SetVariablesClock(TJobVariables& variables) {
     const platform::TLocalTime now = platform::LocalNow();
     variables.date = Digits(now.year, 4) + u"-" + Digits(now.month, 2) + u"-" + Digits(now.day, 2);

@@ -4,6 +4,7 @@
 #include <map>
 #include <string>
 #include <string_view>
+#include <vector>
 
 /// The variables of qvrun, written in braces in a job's values.
 namespace zm::qvrun {
@@ -17,6 +18,15 @@ struct TJobVariables {
     std::u16string time;     ///< {time}: hour-minute-second, 14-05-09, fit for file names
     std::map<std::u16string, std::u16string> user;  ///< --set; they win over all others
 };
+
+/// A variable as it is offered to someone who writes a job.
+struct TVariableInfo {
+    std::u16string reference;  ///< as it is written, with its braces
+    std::u16string meaning;    ///< a few words in English
+};
+
+/// All variables that every job has.
+const std::vector<TVariableInfo>& KnownVariables();
 
 /// Fills `date` and `time` from the local clock.
 void SetVariablesClock(TJobVariables& variables);

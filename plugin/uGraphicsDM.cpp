@@ -1,12 +1,15 @@
 #include "plugin/uGraphicsDM.h"
 
+#include <array>
 #include <memory>
 #include <vector>
 
 #include "actions/uActionDescriptions.h"
+#include "actions/uActionFormModel.h"
 #include "actions/uImageList.h"
 #include "engine/foundation/zmsettings.h"
 #include "engine/platform/process.h"
+#include "plugin/AFPlugin_p.h"
 #include "plugin/uVersionCompare.h"
 
 namespace zm {
@@ -39,33 +42,47 @@ public:
     void SetLastError(std::int32_t job_id, std::int32_t code, const std::u16string& text) override {
         HostSetLastError(job_id, code, text.c_str());
     }
+    std::int32_t DefaultScale() const override { return Component().DefaultScale(); }
+    void* MainWindow() const override { return Component().GetAppInfo().WHandle; }
+
+private:
+    static const TAFPlugin& Component() {
+        const TAFPlugin* plugin = PluginInstance();
+        if (plugin == nullptr) {
+            throw EPluginException("The plug-in has not been initialised by a host");
+        }
+        return *plugin;
+    }
 };
 THostServices host_services;
 
-// The three functions of each action are its operation, its form (see SetActionForm) and its
-// description.
+// The three functions of each action are its operation, its form and its description.
 struct TActionRow {
     const char16_t* name;
     const char16_t* id;
     TIconGlyph glyph;
     bool (TQVImageList::*execute)(const IStepParams& params);
+    const TActionFormDesign& (*form)();
     void (*describe)(const IStepParams& params, std::u16string& Descr);
 };
 
 constexpr std::array<TActionRow, kGraphicsActionCount> kActionRows{{
-    {u"Open Image", u"A_GRAPHICS_OPEN_IMAGE", igOpen, &TQVImageList::Open, &DescribeOpenImage},
-    {u"Save Image", u"A_GRAPHICS_SAVE_IMAGE", igSave, &TQVImageList::Save, &DescribeSaveImage},
-    {u"Resize Image", u"A_GRAPHICS_RESIZE_IMAGE", igResize, &TQVImageList::Resize,
+    {u"Open Image", u"A_GRAPHICS_OPEN_IMAGE", igOpen, &TQVImageList::Open, &OpenImageForm,
+     &DescribeOpenImage},
+    {u"Save Image", u"A_GRAPHICS_SAVE_IMAGE", igSave, &TQVImageList::Save, &SaveImageForm,
+     &DescribeSaveImage},
+    {u"Resize Image", u"A_GRAPHICS_RESIZE_IMAGE", igResize, &TQVImageList::Resize, &ResizeImageForm,
      &DescribeResizeImage},
-    {u"Crop Image", u"A_GRAPHICS_CROP_IMAGE", igCrop, &TQVImageList::Crop, &DescribeCropImage},
-    {u"Rotate Image", u"A_GRAPHICS_ROTATE_IMAGE", igRotate, &TQVImageList::Rotate,
+    {u"Crop Image", u"A_GRAPHICS_CROP_IMAGE", igCrop, &TQVImageList::Crop, &CropImageForm,
+     &DescribeCropImage},
+    {u"Rotate Image", u"A_GRAPHICS_ROTATE_IMAGE", igRotate, &TQVImageList::Rotate, &RotateImageForm,
      &DescribeRotateImage},
     {u"Draw Text on Image", u"A_GRAPHICS_DRAW_TEXT_ON_IMAGE", igText, &TQVImageList::TextOut,
-     &DescribeTextOnImage},
+     &TextOnImageForm, &DescribeTextOnImage},
     {u"Draw Image on Image", u"A_GRAPHICS_DRAW_IMAGE_ON_IMAGE", igImage, &TQVImageList::DrawImage,
-     &DescribeImageOnImage},
+     &ImageOnImageForm, &DescribeImageOnImage},
     {u"Add Border to Image", u"A_GRAPHICS_ADD_BORDER_TO_IMAGE", igBorder, &TQVImageList::AddBorder,
-     &DescribeAddBorder},
+     &AddBorderForm, &DescribeAddBorder},
 }};
 
 /// Row of an item of the collection; nil for an index outside the table.
@@ -155,9 +172,7 @@ TLongBool TDM::ActionExec(TAction* sender, TAFActionParams& params) {
 TLongBool TDM::ActionConfig(TAction* sender, TAFActionParams& params) {
     TQVPluginParams step(params);
     const TActionRow* row = RowOf(*sender);
-    const TConfigureAction form =
-        row == nullptr ? nullptr : forms_[static_cast<std::size_t>(sender->GetIndex())];
-    if (form == nullptr || !form(step)) {
+    if (row == nullptr || !ConfigureStep(row->form(), step)) {
         return kLongFalse;
     }
     step.ToActionParams(params);
@@ -184,10 +199,6 @@ void TDM::PluginShutdownPlugin() {
         library_in_use_ = false;
         ZmFinalizeLibrary();
     }
-}
-
-void TDM::SetActionForm(TGraphicsAction action, TConfigureAction form) {
-    forms_[static_cast<std::size_t>(action)] = form;
 }
 
 TAFPluginInfo* StartPlugin(const TAFAppInfo* app_info) {

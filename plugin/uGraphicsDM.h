@@ -1,6 +1,5 @@
 #pragma once
 
-#include <array>
 #include <cstdint>
 #include <string>
 
@@ -22,10 +21,6 @@ enum TGraphicsAction : std::int32_t {
 };
 inline constexpr std::int32_t kGraphicsActionCount = 8;
 
-/// Opens the modal form of an action; True when the user confirmed and `params` hold the new
-/// settings.
-using TConfigureAction = bool (*)(TQVPluginParams& params);
-
 /// The data module: declares the plug-in with its eight actions and routes the host's calls to
 /// each action's own functions by the action's index. The index lookup and the parameters of a
 /// call are all the state that routing has, so that jobs may run side by side. Exceptions of the
@@ -46,7 +41,8 @@ public:
     /// Runs the step: -1 or 0.
     TLongBool ActionExec(TAction* sender, TAFActionParams& params);
     /// Shows the action's form; when confirmed, writes the settings back into the host's block.
-    /// Without a form the answer is 0 and the block stays as it is.
+    /// When the user cancels, and when no form can be shown (the host's log then tells why), the
+    /// answer is 0 and the block stays as it is.
     TLongBool ActionConfig(TAction* sender, TAFActionParams& params);
     void ActionDescr(TAction* sender, TAFActionParams& params, std::u16string& Descr);
     /// Nothing belongs to a stored step: deleting one changes no image.
@@ -56,16 +52,12 @@ public:
     /// Ends the use of the engine's library; the image list stays until the module goes.
     void PluginShutdownPlugin();
 
-    /// Puts an action's form in its place; done by the dialogs before the host's first call.
-    void SetActionForm(TGraphicsAction action, TConfigureAction form);
-
     TAFPlugin Plugin;
     TQVPluginSettings Settings;
 
 private:
     void DeclareActions();
 
-    std::array<TConfigureAction, kGraphicsActionCount> forms_{};
     bool library_in_use_ = true;
 };
 

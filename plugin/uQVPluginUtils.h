@@ -21,7 +21,7 @@ enum TQVPluginParamsType : std::uint8_t { ptAction, ptEvent };
 /// line `name_count=N` and lines `name_0` to `name_(N-1)`.
 ///
 /// An object lives for one host call and belongs to its thread.
-class TQVPluginParams : public IStepParams {
+class TQVPluginParams : public IStepSettings {
 public:
     /// Reads the text up to its terminator; the record's size is not consulted. A nil text is
     /// empty.
@@ -47,13 +47,13 @@ public:
     std::u16string GetStrings(std::u16string_view key) const;
     std::u16string GetStringsDef(std::u16string_view key, std::u16string_view default_value) const;
 
-    void SetInteger(std::u16string_view key, std::int32_t value);
+    void SetInteger(std::u16string_view key, std::int32_t value) override;
     /// Replaces the value of the key's line or appends a line. An empty value removes the line.
-    void SetString(std::u16string_view key, std::u16string_view value);
-    void SetBool(std::u16string_view key, bool value);
+    void SetString(std::u16string_view key, std::u16string_view value) override;
+    void SetBool(std::u16string_view key, bool value) override;
     /// Lines of a longer earlier list stay.
     void SetStrings(std::u16string_view key, const std::vector<std::u16string>& values);
-    void Clear() { FList.clear(); }
+    void Clear() override { FList.clear(); }
 
     /// Puts the text in place of the record's block, both of the host's heap. Raises
     /// EPluginException on an object of the other kind, std::bad_alloc when the host has no

@@ -12,10 +12,12 @@ PackagesFor() {
     case $1 in
         build)
             echo g++ cmake ninja-build libpng-dev libjpeg62-turbo-dev zlib1g-dev libhwy-dev \
-                libcli11-dev ;;
-        # ImageMagick is the independent eye that opens what the module wrote.
+                libcli11-dev libpango1.0-dev pkg-config libxcb1-dev libgtk-3-dev ;;
+        # ImageMagick is the independent eye that opens what the module wrote; the X server and
+        # its programs are the other side of the clipboard.
         test) PackagesFor build; echo libgtest-dev libgmock-dev googletest python3 imagemagick \
-            libjpeg-turbo-progs pngcheck ;;
+            libjpeg-turbo-progs pngcheck fonts-dejavu-core fonts-noto-color-emoji \
+            xvfb xauth xclip python3-xlib ;;
         bench) PackagesFor build; echo libbenchmark-dev libjpeg-turbo-progs python3 ;;
         fuzz) PackagesFor build; echo clang libclang-rt-dev ;;
         check) PackagesFor test; echo clang-format clang-tidy ;;

@@ -123,6 +123,20 @@ std::uint8_t SoftLightChannel(int source_red, int dest_channel) {
     return Clamp8(TruncToInt(255 * result));
 }
 
+/// SoftLightChannel of all pairs: first index the source's red, second the channel.
+using TSoftLightTable = std::array<std::array<std::uint8_t, 256>, 256>;
+
+TSoftLightTable MakeSoftLightTable() {
+    TSoftLightTable table{};
+    for (std::size_t red = 0; red < table.size(); ++red) {
+        for (std::size_t channel = 0; channel < table.size(); ++channel) {
+            table[red][channel] =
+                SoftLightChannel(static_cast<int>(red), static_cast<int>(channel));
+        }
+    }
+    return table;
+}
+
 // Required: the source's red stands for all its channels; stored pictures depend on the look.
 TRGB SoftLight(TRGB a, TRGB b) {
     return TRGB{SoftLightChannel(a.r, b.b), SoftLightChannel(a.r, b.g), SoftLightChannel(a.r, b.r)};
@@ -278,6 +292,14 @@ void BlendRowPlain(const TRGB* source, TRGB* dest, std::int32_t width, std::uint
                    std::uint8_t row) {
     for (std::int32_t x = 0; x < width; ++x) {
         ZmBlendPixel(source[x], dest[x], operation, row);
+    }
+}
+
+void SoftLightRow(const TRGB* source, TRGB* dest, std::int32_t width) {
+    static const TSoftLightTable table = MakeSoftLightTable();
+    for (std::int32_t x = 0; x < width; ++x) {
+        const auto& channels = table[source[x].r];
+        dest[x] = TRGB{channels[dest[x].b], channels[dest[x].g], channels[dest[x].r]};
     }
 }
 

@@ -32,7 +32,10 @@ struct TMixRule {
 /// ZmBlendPixel on each pair of pixels: dest = operation(source, dest).
 void BlendRowPlain(const TRGB* source, TRGB* dest, std::int32_t width, std::uint8_t operation,
                    std::uint8_t row);
-/// As BlendRowPlain; operations that work channel by channel without divisions run in vectors.
+/// BlendRowPlain with zmlSoftLight, from a table of 64 KiB that the first call makes.
+void SoftLightRow(const TRGB* source, TRGB* dest, std::int32_t width);
+/// As BlendRowPlain; operations that work channel by channel without divisions run in vectors,
+/// zmlSoftLight from its table.
 void BlendRow(const TRGB* source, TRGB* dest, std::int32_t width, std::uint8_t operation,
               std::uint8_t row);
 

@@ -216,6 +216,10 @@ static std::uint8_t* BytesOf(TRGB* pixels) {
 
 void BlendRow(const TRGB* source, TRGB* dest, std::int32_t width, std::uint8_t operation,
               std::uint8_t row) {
+    if (operation == zmlSoftLight) {
+        SoftLightRow(source, dest, width);
+        return;
+    }
     const std::size_t count = static_cast<std::size_t>(width) * sizeof(TRGB);
     if (!HWY_DYNAMIC_DISPATCH(BlendBytesBy)(operation, BytesOf(source), BytesOf(dest), count)) {
         BlendRowPlain(source, dest, width, operation, row);

@@ -1,9 +1,12 @@
 #pragma once
 
 #include <cstdint>
+#include <memory>
 #include <vector>
 
 #include "engine/foundation/zmdefs.h"
+#include "engine/platform/dibsection.h"
+#include "engine/platform/drawing.h"
 
 namespace zm {
 
@@ -11,8 +14,8 @@ namespace zm {
 enum TBitmapPixelFormat : std::uint8_t { pfNone, pf1bit, pf8bit, pf24bit, pf32bit };
 
 /// The platform bitmap behind the place `zmTBitmap`: an object with a size, one of four layouts,
-/// row pointers and a colour table. This one lives in plain memory, rows bottom-up and aligned to
-/// 32 bits like a device-independent bitmap.
+/// row pointers and a colour table. Its pixels are a device-independent bitmap, rows bottom-up and
+/// aligned to 32 bits, that the platform can draw on.
 class TBitmap {
 public:
     /// Changes layout and size; pixels become 0. False without room, and the size is then 0.
@@ -24,6 +27,10 @@ public:
     std::uint8_t* GetScanLine(std::int32_t row);
     /// 256 entries; used by pf8bit (and the first two by pf1bit).
     std::vector<TRGB>& ColorTable() { return color_table_; }
+    /// What the platform's drawing takes; its section changes with SetSize and is nil at size 0.
+    platform::TDrawTarget GetDrawTarget();
+    /// Another number after each SetSize: addresses alone may come back with other pixels.
+    std::uint32_t GetGeneration() const { return generation_; }
     bool GetModified() const { return modified_; }
     void SetModified(bool modified) { modified_ = modified; }
 
@@ -33,7 +40,8 @@ private:
     std::int64_t row_len_ = 0;
     TBitmapPixelFormat format_ = pfNone;
     bool modified_ = false;
-    std::vector<std::uint8_t> pixels_;
+    std::uint32_t generation_ = 0;
+    std::unique_ptr<platform::TDibSection> section_;
     std::vector<TRGB> color_table_ = std::vector<TRGB>(256);
 };
 

@@ -480,8 +480,7 @@ void Row8pTo24Fast(const std::uint8_t* source, std::uint8_t* dest, std::int32_t 
 }
 
 TZmRowFunction FindRowFunction(TZmPixelFormat from, TZmPixelFormat to) {
-    const TZmRowFunction fast =
-        from == zm8p && to == zm24RGB ? Row8pTo24Fast : FindFastRowFunction(from, to);
+    const TZmRowFunction fast = FindFastRowFunction(from, to);
     return fast != nullptr ? fast : FindPlainRowFunction(from, to);
 }
 

@@ -4,7 +4,11 @@
 ///
 /// Conversions that only move bytes work in blocks of 16, in which any byte can move anywhere:
 /// they wait for memory, and wider stores would straddle its lines. Those that compute use the
-/// widest vectors there are.
+/// widest vectors there are. Two of them, a palette and a grey, are much faster where the processor
+/// moves bytes freely through all of a 64-byte vector (VBMI); these use the compiler's own names of
+/// the instructions, for which the library has none.
+
+#define HWY_WANT_AVX3_DL  // the set with VBMI, which the library leaves out unless asked
 
 #include "engine/bitmap/zmrowconvert_fast_p.h"
 
@@ -28,6 +32,7 @@ struct TFastRows {
     TZmRowFunction from_words = nullptr;  // zm48RGB to zm24RGB
     TZmRowFunction gray_to_24 = nullptr;  // zm8g to zm24RGB
     TZmRowFunction gray_to_32 = nullptr;  // zm8g to zm32RGB
+    TZmRowFunction palette = nullptr;     // zm8p to zm24RGB
     TZmBitsAboveFunction bits_above = nullptr;
 };
 
@@ -256,6 +261,133 @@ void ToGrayRow(const std::uint8_t* source, std::uint8_t* dest, std::int32_t widt
     FindPlainRowFunction(zm24RGB, zm8g)(source, dest, left, context);
 }
 
+#if HWY_TARGET == HWY_AVX3_DL
+
+constexpr std::size_t kColors = 256;
+constexpr std::int32_t kStepsWorthATable = 4;
+
+/// Where the bytes of three vectors of channels go in three of colours: byte i of colours[k] is
+/// byte `lanes[k][i]` of blue and green one after the other, or, where `is_red`, of red.
+struct TInterleaving {
+    std::uint8_t lanes[3][64] = {};
+    std::uint64_t is_red[3] = {};
+
+    constexpr TInterleaving() {
+        for (std::size_t i = 0; i < 3 * 64; ++i) {
+            const std::size_t channel = i % 3;
+            lanes[i / 64][i % 64] = static_cast<std::uint8_t>(i / 3 + (channel == 1 ? 64 : 0));
+            is_red[i / 64] |= std::uint64_t{channel == 2} << i % 64;
+        }
+    }
+};
+constexpr TInterleaving kInterleaving;
+
+/// One channel of a palette, 256 bytes.
+struct TChannelTable {
+    __m512i quarters[4];
+
+    HWY_INLINE __m512i Find(__m512i indexes) const {
+        const __m512i low = _mm512_permutex2var_epi8(quarters[0], indexes, quarters[1]);
+        const __m512i high = _mm512_permutex2var_epi8(quarters[2], indexes, quarters[3]);
+        return _mm512_mask_blend_epi8(_mm512_movepi8_mask(indexes), low, high);
+    }
+};
+
+void PaletteRow(const std::uint8_t* source, std::uint8_t* dest, std::int32_t width,
+                const TZmRowContext& context) {
+    if (width < kStepsWorthATable * kStep) {
+        Row8pTo24Fast(source, dest, width, context);
+        return;
+    }
+    TChannelTable tables[3];
+    const auto* const palette = reinterpret_cast<const std::uint8_t*>(context.palette);
+    for (std::size_t i = 0; i < kColors / kBytes; ++i) {
+        TVector channels[3];
+        hn::LoadInterleaved3(TBytes(), palette + 3 * kBytes * i, channels[0], channels[1],
+                             channels[2]);
+        for (std::size_t channel = 0; channel < 3; ++channel) {
+            tables[channel].quarters[i] = channels[channel].raw;
+        }
+    }
+    std::int32_t left = width;
+    for (; left >= kStep; left -= kStep, source += kBytes) {
+        const __m512i indexes = _mm512_loadu_si512(source);
+        const __m512i blue = tables[0].Find(indexes);
+        const __m512i green = tables[1].Find(indexes);
+        const __m512i red = tables[2].Find(indexes);
+        for (std::size_t i = 0; i < 3; ++i, dest += kBytes) {
+            const __m512i lanes = _mm512_loadu_si512(kInterleaving.lanes[i]);
+            const __m512i two = _mm512_permutex2var_epi8(blue, lanes, green);
+            _mm512_storeu_si512(
+                dest, _mm512_mask_permutexvar_epi8(two, kInterleaving.is_red[i], lanes, red));
+        }
+    }
+    Row8pTo24Fast(source, dest, left, context);
+}
+
+/// Sixteen colours spread to four bytes each, the fourth one of no weight.
+struct TSpreadColors {
+    std::uint8_t lanes[64] = {};
+
+    constexpr TSpreadColors() {
+        for (std::size_t i = 0; i < 64; ++i) {
+            lanes[i] = static_cast<std::uint8_t>(i / 4 * 3 + i % 4 % 3);
+        }
+    }
+};
+constexpr TSpreadColors kSpreadColors;
+
+/// What two packings within blocks of 16 bytes do to the order of four bytes each.
+struct TUnpackedOrder {
+    std::uint32_t lanes[16] = {};
+
+    constexpr TUnpackedOrder() {
+        for (std::uint32_t i = 0; i < 16; ++i) {
+            lanes[i] = i % 4 * 4 + i / 4;
+        }
+    }
+};
+constexpr TUnpackedOrder kUnpackedOrder;
+
+/// Weights of at most a whole: they fit signed bytes, and no grey is above 255.
+bool AreAtMostAWhole(const TZmRowContext& context) {
+    return SumsFitWords(context) &&
+           context.red_coef + context.green_coef + context.blue_coef <= 100;
+}
+
+/// Grey of 64 colours from 208 readable bytes.
+HWY_INLINE __m512i GrayOfColors(const std::uint8_t* colors, __m512i weights) {
+    const __m512i lanes = _mm512_loadu_si512(kSpreadColors.lanes);
+    const __m512i ones = _mm512_set1_epi16(1);
+    const auto sums_of = [=](const std::uint8_t* sixteen) HWY_ATTR {
+        const __m512i spread = _mm512_permutexvar_epi8(lanes, _mm512_loadu_si512(sixteen));
+        return _mm512_madd_epi16(_mm512_maddubs_epi16(spread, weights), ones);
+    };
+    const auto per_hundred = [](__m512i sums) HWY_ATTR {
+        const __m512i factor = _mm512_set1_epi16(static_cast<short>(kPerHundredFactor));
+        return _mm512_srli_epi16(_mm512_mulhi_epu16(_mm512_srli_epi16(sums, 2), factor), 1);
+    };
+    const __m512i low = _mm512_packus_epi32(sums_of(colors), sums_of(colors + 48));
+    const __m512i high = _mm512_packus_epi32(sums_of(colors + 96), sums_of(colors + 144));
+    const __m512i gray = _mm512_packus_epi16(per_hundred(low), per_hundred(high));
+    return _mm512_permutexvar_epi32(_mm512_loadu_si512(kUnpackedOrder.lanes), gray);
+}
+
+void ToGrayRowByBytes(const std::uint8_t* source, std::uint8_t* dest, std::int32_t width,
+                      const TZmRowContext& context) {
+    constexpr std::int32_t kNeeded = (144 + 64 + 2) / 3;  // pixels that a step's loads reach over
+    std::int32_t left = AreAtMostAWhole(context) ? width : 0;
+    const __m512i weights =
+        _mm512_set1_epi32(context.blue_coef | context.green_coef << 8 | context.red_coef << 16);
+    const std::int32_t rest = width - left;
+    for (; left >= kNeeded; left -= kStep, source += 3 * kBytes, dest += kBytes) {
+        _mm512_storeu_si512(dest, GrayOfColors(source, weights));
+    }
+    ToGrayRow(source, dest, left + rest, context);
+}
+
+#endif  // HWY_AVX3_DL
+
 /// Eight pixels in the order of a byte's bits, whose lowest is the rightmost.
 struct TReversedEights {
     std::uint8_t bytes[kBytes] = {};
@@ -297,6 +429,10 @@ TFastRows GetFastRows() {
     rows.gray_to_24 = WidenRow<TGrayTo24, zm8g, zm24RGB, 0>;
     rows.gray_to_32 = WidenRow<TGrayTo32, zm8g, zm32RGB, 0xFF000000u>;
     rows.bits_above = BitsAbove;
+#if HWY_TARGET == HWY_AVX3_DL
+    rows.to_gray = ToGrayRowByBytes;
+    rows.palette = PaletteRow;
+#endif
     return rows;
 }
 
@@ -322,6 +458,7 @@ TZmRowFunction FindFastRowFunction(TZmPixelFormat from, TZmPixelFormat to) {
         case zm24RGB << 4 | zm48RGB: return rows.to_words;
         case zm32RGB << 4 | zm24RGB: return rows.drop_alpha;
         case zm48RGB << 4 | zm24RGB: return rows.from_words;
+        case zm8p << 4 | zm24RGB: return rows.palette != nullptr ? rows.palette : Row8pTo24Fast;
         case zm8g << 4 | zm24RGB: return rows.gray_to_24;
         case zm8g << 4 | zm32RGB: return rows.gray_to_32;
         default: return nullptr;

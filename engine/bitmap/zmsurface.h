@@ -9,6 +9,8 @@
 
 namespace zm {
 
+class TImageList;
+
 /// What TZmBitmap shares with the platform's drawing: canvases, regions of interest, platform
 /// bitmaps and the clipboard. A class of its own for the length of the list: TZmBitmap is the one
 /// class that derives from it. Canvases are defined in engine/canvas, the clipboard in
@@ -47,6 +49,9 @@ public:
     // Platform bitmaps. Formats that these cannot hold raise EZmException.
     void CopyFromTBitmap(TBitmap* Source);
     void CopyToTBitmap(TBitmap* Dest);
+    /// Adds a copy of the image to a list of platform bitmaps; its index there, -1 for a nil list
+    /// and without room.
+    std::int32_t AddToImageList(TImageList* Dest);
 
     // Clipboard. False when it cannot be opened, the image is smaller than 2 by 2, or nothing
     // that fits is there. Exact rules beside the definitions.

@@ -40,8 +40,9 @@ constexpr std::int64_t kMaxScanLimit = 1000;
 
 constexpr std::int32_t kThumbnailSide = 300;
 
-/// Offset of the first FF D8 FF within the allowed positions, or -1. Leaves the stream anywhere.
-std::int32_t FindStartOfImage(TStream& stream) {
+}  // namespace
+
+std::int32_t FindJpegStart(TStream& stream) {
     std::array<std::uint8_t, kStartPositions + 2> bytes{};
     const std::int32_t got = stream.Read(bytes.data(), static_cast<std::int32_t>(bytes.size()));
     for (std::int32_t i = 0; i + 2 < got; ++i) {
@@ -52,6 +53,8 @@ std::int32_t FindStartOfImage(TStream& stream) {
     }
     return -1;
 }
+
+namespace {
 
 /// The library's source over a stream. Behind the end of the data it makes up one end marker, so
 /// that complete images without one load; asked again, it fails.
@@ -508,7 +511,7 @@ bool ReadJpeg(TStream& stream, TZmBitmap& bitmap, const TJpegReadOptions& option
     const std::int64_t file_bytes = stream.GetSize() - stream.GetPosition();
     TZmBufferedReadStream buffered(&stream, kJpegStreamBufferBytes,
                                    /*use_relative_position=*/true);
-    const std::int32_t offset = FindStartOfImage(buffered);
+    const std::int32_t offset = FindJpegStart(buffered);
     buffered.SetPosition(std::max(offset, 0));
     if (offset < 0) {
         return false;

@@ -1,6 +1,7 @@
 #pragma once
 
 #include <cstdint>
+#include <span>
 #include <stdexcept>
 
 #include "engine/io/zmprogress.h"
@@ -37,5 +38,19 @@ void ReadJPEGStream(TStream& stream, TZmBitmap& bitmap, const TJpegReadOptions& 
 /// `*progress.Aborting`; errors of the library raise EZmJpegException. The bitmap is left as it
 /// was.
 void WriteJPEGStream(TStream& stream, TZmBitmap& bitmap, TIOParams& params, TProgressRec& progress);
+
+/// Metadata that can be exchanged in a file.
+enum TJpegBlock : std::uint8_t {
+    kJpegBlockIptc,  ///< resource blocks in APP13
+    kJpegBlockExif,  ///< EXIF in APP1
+};
+
+/// Copies a JPEG to `output`, which is another stream, with `data` (the bytes of a whole marker,
+/// prefix included) in the place of each such block that it has; empty data only take those out.
+/// All else stays as it is, but junk in front is left out. False for what is no JPEG, for data
+/// that fit no marker and for a failed write; `output` is then undefined. Raises what the
+/// streams raise.
+[[nodiscard]] bool ExchangeJpegBlock(TStream& input, TStream& output, TJpegBlock block,
+                                     std::span<const std::uint8_t> data);
 
 }  // namespace zm

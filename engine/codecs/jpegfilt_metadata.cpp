@@ -26,8 +26,7 @@ constexpr std::size_t kExifPrefixBytes = 6;
 
 /// A profile's piece: the prefix, the piece's number from 1, the count of pieces, the bytes.
 constexpr std::size_t kProfileHeadBytes = kProfilePrefix.size() + 2;
-constexpr std::size_t kMarkerDataBytes = 65533;
-constexpr std::size_t kProfilePieceBytes = kMarkerDataBytes - kProfileHeadBytes;
+constexpr std::size_t kProfilePieceBytes = kJpegMarkerDataBytes - kProfileHeadBytes;
 constexpr std::size_t kMostProfilePieces = 255;
 
 using TBytes = std::span<const std::uint8_t>;
@@ -52,7 +51,8 @@ bool SearchMarkers(const TZmMarkerList& markers, std::uint8_t type, const Use& u
 
 void ReadIptc(TIOParams& params) {
     SearchMarkers(params.fJPEG_MarkerList, kMarkerApp13, [&params](TBytes data) {
-        return StartsWith(data, kResourcePrefix) && params.fIPTC_Info.LoadFromStandardBuffer(data);
+        return IsJpegResourceMarker(kMarkerApp13, data) &&
+               params.fIPTC_Info.LoadFromStandardBuffer(data);
     });
 }
 
@@ -110,6 +110,10 @@ bool MakeInteropProfile(TIOParams& params) {
 }
 
 }  // namespace
+
+bool IsJpegResourceMarker(std::uint8_t type, std::span<const std::uint8_t> data) {
+    return type == kMarkerApp13 && StartsWith(data, kResourcePrefix);
+}
 
 bool IsJpegProfileMarker(std::uint8_t type, std::span<const std::uint8_t> data) {
     return type == kMarkerApp2 && data.size() >= kProfileHeadBytes &&

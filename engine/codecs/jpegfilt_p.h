@@ -19,6 +19,7 @@
 namespace zm {
 
 class TIOParams;
+class TStream;
 class TZmBitmap;
 
 /// Messages of the JPEG library have numbers 0 to 124. The numbering is that of the library's
@@ -79,6 +80,13 @@ template <typename Step>
 
 inline constexpr std::int32_t kJpegStreamBufferBytes = 65536;
 
+/// Offset of the first FF D8 FF within the positions at which an image may start, or -1. Leaves the
+/// stream anywhere.
+std::int32_t FindJpegStart(TStream& stream);
+
+/// Most bytes of a marker behind its length word.
+inline constexpr std::size_t kJpegMarkerDataBytes = 65533;
+
 /// What the reader has to know of a file's metadata.
 struct TJpegMetadata {
     std::int32_t orientation = 1;    ///< 1 to 8
@@ -96,6 +104,9 @@ TJpegMetadata ReadJpegMetadata(TIOParams& params);
 /// The markers of a file to be written: the output profile, then the list without the marker that
 /// the library writes by itself.
 TZmMarkerList JpegMarkersToWrite(TIOParams& params);
+
+/// Whether a marker holds resource blocks, of which IPTC is one.
+bool IsJpegResourceMarker(std::uint8_t type, std::span<const std::uint8_t> data);
 
 /// Whether a marker is a piece of a colour profile.
 bool IsJpegProfileMarker(std::uint8_t type, std::span<const std::uint8_t> data);

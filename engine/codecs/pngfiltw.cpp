@@ -85,7 +85,7 @@ class TPngAlpha {
 public:
     TPngAlpha() = default;
     /// A mask of another size than the image's does not count.
-    TPngAlpha(TZmMask& mask, const TZmBitmap& bitmap);
+    TPngAlpha(TZmMask& mask, TZmBitmap& bitmap);
     explicit TPngAlpha(TZmBitmap& bitmap);
     bool IsThere() const { return mask_ != nullptr || plane_ != nullptr; }
     /// Values of a row of the image, valid until the next call; nil when it cannot be reached.
@@ -99,7 +99,7 @@ private:
     std::vector<std::uint8_t> row_;  // empty where the source's own rows serve
 };
 
-TPngAlpha::TPngAlpha(TZmMask& mask, const TZmBitmap& bitmap) {
+TPngAlpha::TPngAlpha(TZmMask& mask, TZmBitmap& bitmap) {
     if (mask.GetFull() || mask.GetWidth() != bitmap.GetWidth() ||
         mask.GetHeight() != bitmap.GetHeight()) {
         return;
@@ -116,15 +116,13 @@ TPngAlpha::TPngAlpha(TZmBitmap& bitmap) {
     if (plane == nullptr || plane->GetPixelFormat() != zm8g) {
         return;
     }
-    const auto covered =
-        static_cast<std::size_t>(std::min(plane->GetWidth(), bitmap.GetWidth()));
+    const auto covered = static_cast<std::size_t>(std::min(plane->GetWidth(), bitmap.GetWidth()));
     const std::int32_t rows = std::min(plane->GetHeight(), bitmap.GetHeight());
     bool is_full = true;
     for (std::int32_t y = 0; is_full && y < rows; ++y) {
         const std::uint8_t* const row = plane->GetScanLine(y);
-        is_full = row != nullptr && std::all_of(row, row + covered, [](std::uint8_t alpha) {
-            return alpha == 255;
-        });
+        is_full = row != nullptr &&
+                  std::all_of(row, row + covered, [](std::uint8_t alpha) { return alpha == 255; });
     }
     if (is_full) {
         return;

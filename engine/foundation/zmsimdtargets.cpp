@@ -32,9 +32,9 @@ struct TCpuRegisters {
     unsigned d = 0;
 };
 
-TCpuRegisters ReadCpuLeaf(unsigned leaf) {
+TCpuRegisters ReadCpuLeaf(unsigned leaf, unsigned sub_leaf = 0) {
     TCpuRegisters regs;
-    __cpuid_count(leaf, 0, regs.a, regs.b, regs.c, regs.d);
+    __cpuid_count(leaf, sub_leaf, regs.a, regs.b, regs.c, regs.d);
     return regs;
 }
 
@@ -58,6 +58,10 @@ constexpr std::uint64_t kLeaf1Sse4 = 1u << 19 | 1u << 20 | 1u << 1 | 1u << 25;  
 constexpr std::uint64_t kLeaf1Avx = 1u << 27 | 1u << 28 | 1u << 12 | 1u << 29;  // with FMA, F16C
 constexpr std::uint64_t kLeaf7Avx2 = 1u << 5 | 1u << 3 | 1u << 8;               // with BMI, BMI2
 constexpr std::uint64_t kLeaf7Avx512 = 1u << 16 | 1u << 17 | 1u << 30 | 1u << 31;  // F DQ BW VL
+// VBMI, VBMI2, VAES, VPCLMULQDQ, VNNI, BITALG, VPOPCNTDQ in the third word, AVX-VNNI in sub-leaf 1
+constexpr std::uint64_t kLeaf7Vbmi =
+    1u << 1 | 1u << 6 | 1u << 9 | 1u << 10 | 1u << 11 | 1u << 12 | 1u << 14;
+constexpr std::uint64_t kLeaf7Sub1AvxVnni = 1u << 4;
 constexpr std::uint64_t kExtendedLzcnt = 1u << 5;
 constexpr std::uint64_t kStatesAvx = 0x06;
 constexpr std::uint64_t kStatesAvx512 = 0xE6;
@@ -86,6 +90,9 @@ std::int64_t DetectTargets() {
     targets |= HWY_AVX2;
     if (Has(leaf7, kLeaf7Avx512) && Has(states, kStatesAvx512)) {
         targets |= HWY_AVX3;
+        const bool has_vbmi =
+            Has(ReadCpuLeaf(7).c, kLeaf7Vbmi) && Has(ReadCpuLeaf(7, 1).a, kLeaf7Sub1AvxVnni);
+        targets |= has_vbmi ? HWY_AVX3_DL : 0;
     }
     return targets;
 }

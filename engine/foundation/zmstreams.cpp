@@ -6,6 +6,7 @@
 #include <new>
 
 #include "engine/foundation/zmnumbers.h"
+#include "engine/foundation/zmstreams_p.h"
 #include "engine/foundation/zmstrings.h"
 #include "engine/platform/files.h"
 
@@ -135,20 +136,19 @@ TFileStream::TFileStream(const std::u16string& file_name, TFileMode mode) {
 TFileStream::~TFileStream() = default;
 
 std::int32_t TFileStream::Read(void* buffer, std::int32_t count) {
-    return std::max(handle_->Read(buffer, count), 0);
+    return ReadOrNothing(*handle_, buffer, count);
 }
 
 std::int32_t TFileStream::Write(const void* buffer, std::int32_t count) {
-    return std::max(handle_->Write(buffer, count), 0);
+    return WriteOrNothing(*handle_, buffer, count);
 }
 
 std::int64_t TFileStream::Seek(std::int64_t offset, TSeekOrigin origin) {
-    const std::int64_t position = handle_->Seek(offset, origin);
-    return position >= 0 ? position : std::max<std::int64_t>(handle_->Seek(0, soCurrent), 0);
+    return SeekOrStay(*handle_, offset, origin);
 }
 
 std::int64_t TFileStream::GetSize() {
-    return std::max<std::int64_t>(handle_->GetSize(), 0);
+    return SizeOrNothing(*handle_);
 }
 
 TZmSaveFileStream::TZmSaveFileStream(const std::u16string& target_name)
@@ -165,6 +165,8 @@ TZmSaveFileStream::TZmSaveFileStream(const std::u16string& target_name)
     }
 }
 
+/// A process that is killed leaves its temporary file behind, and a later save lets it lie: nothing
+/// about such a file tells whether a save of another thread, process or machine still writes it.
 TZmSaveFileStream::~TZmSaveFileStream() {
     handle_.reset();  // an open file cannot be removed everywhere
     if (!temporary_name_.empty()) {
@@ -173,14 +175,14 @@ TZmSaveFileStream::~TZmSaveFileStream() {
 }
 
 std::int32_t TZmSaveFileStream::Read(void* buffer, std::int32_t count) {
-    return handle_ == nullptr ? 0 : std::max(handle_->Read(buffer, count), 0);
+    return handle_ == nullptr ? 0 : ReadOrNothing(*handle_, buffer, count);
 }
 
 std::int32_t TZmSaveFileStream::Write(const void* buffer, std::int32_t count) {
     if (count < 1) {
         return 0;
     }
-    const std::int32_t moved = handle_ == nullptr ? 0 : std::max(handle_->Write(buffer, count), 0);
+    const std::int32_t moved = handle_ == nullptr ? 0 : WriteOrNothing(*handle_, buffer, count);
     failed_ = failed_ || moved < count;
     return moved;
 }
@@ -198,7 +200,7 @@ std::int64_t TZmSaveFileStream::Seek(std::int64_t offset, TSeekOrigin origin) {
 }
 
 std::int64_t TZmSaveFileStream::GetSize() {
-    return handle_ == nullptr ? 0 : std::max<std::int64_t>(handle_->GetSize(), 0);
+    return handle_ == nullptr ? 0 : SizeOrNothing(*handle_);
 }
 
 bool TZmSaveFileStream::Commit() {

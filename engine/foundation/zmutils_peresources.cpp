@@ -10,6 +10,11 @@
 #include "engine/foundation/zmnumbers.h"
 
 namespace zm {
+
+using platform::TResource;
+using platform::TResourceName;
+using platform::TResourceType;
+
 namespace {
 
 constexpr std::uint16_t kDosMagic = 0x5A4D;     // "MZ"
@@ -17,9 +22,10 @@ constexpr std::uint32_t kPeMagic = 0x00004550;  // "PE", two zeros
 constexpr std::uint16_t kOptionalMagic32 = 0x10B;
 constexpr std::uint16_t kOptionalMagic64 = 0x20B;
 constexpr std::size_t kDosHeaderBytes = 64;
-constexpr std::size_t kPeOffsetField = 60;    // in the DOS header
-constexpr std::size_t kCoffHeaderBytes = 24;  // with the magic before it
-constexpr std::size_t kDataDirectory32 = 96;  // in the optional header
+constexpr std::size_t kPeOffsetField = 60;     // in the DOS header
+constexpr std::size_t kCoffHeaderBytes = 24;   // with the magic before it
+constexpr std::size_t kHeaderBytesField = 60;  // in the optional header
+constexpr std::size_t kDataDirectory32 = 96;   // in the optional header
 constexpr std::size_t kDataDirectory64 = 112;
 constexpr std::size_t kResourceDirectoryIndex = 2;
 constexpr std::size_t kSectionHeaderBytes = 40;
@@ -72,6 +78,7 @@ struct TSection {
 /// Where the parts of a module lie in its file.
 struct TPeLayout {
     std::uint32_t resource_address = 0;  ///< 0: no resources
+    std::uint32_t header_bytes = 0;      ///< addresses below this are places in the file itself
     std::vector<TSection> sections;
 };
 
@@ -109,6 +116,7 @@ TPeLayout ReadLayout(TStream& module) {
     if (U32At(optional, table - 4) > kResourceDirectoryIndex) {
         layout.resource_address = U32At(optional, table + kResourceDirectoryIndex * 8);
     }
+    layout.header_bytes = U32At(optional, kHeaderBytesField);
     layout.sections = ReadSections(
         module, optional_position + static_cast<std::int64_t>(optional_bytes), U16At(coff, 6));
     return layout;
@@ -133,7 +141,7 @@ std::vector<std::uint8_t> ReadAtAddress(TStream& module, const TPeLayout& layout
 
 /// One entry of a directory of the tree.
 struct TTreeEntry {
-    TPeName name;
+    TResourceName name;
     bool is_directory = false;
     std::uint32_t offset = 0;  ///< from the beginning of the tree
 };
@@ -144,28 +152,36 @@ public:
     TTreeReader(TStream& module, const TPeLayout& layout) : module_(module), layout_(layout) {}
     std::vector<TTreeEntry> ReadDirectory(std::uint32_t offset);
     /// The data of the entry itself, or of the first language below it; false when there is none.
-    bool ReadData(const TTreeEntry& entry, TPeResource& resource);
+    bool ReadData(const TTreeEntry& entry, TResource& resource);
+    /// Whether everything was there and of its level.
+    bool IsSound() const { return is_sound_; }
+    void MarkFault() { is_sound_ = false; }
 
 private:
     std::vector<std::uint8_t> Read(std::uint32_t offset, std::size_t count);
-    TPeName ReadName(std::uint32_t field);
+    TResourceName ReadName(std::uint32_t field);
 
     TStream& module_;
     const TPeLayout& layout_;
     std::int64_t bytes_left_ = kMaxTreeBytes;
+    bool is_sound_ = true;
 };
 
 std::vector<std::uint8_t> TTreeReader::Read(std::uint32_t offset, std::size_t count) {
     const auto cost = std::max(static_cast<std::int64_t>(count), kMinReadCost);
     if (cost > bytes_left_) {
+        MarkFault();
         return {};
     }
     bytes_left_ -= cost;
-    return ReadAtAddress(module_, layout_, std::uint64_t{layout_.resource_address} + offset, count);
+    const std::uint64_t address = std::uint64_t{layout_.resource_address} + offset;
+    auto bytes = ReadAtAddress(module_, layout_, address, count);
+    is_sound_ = is_sound_ && bytes.size() == count;
+    return bytes;
 }
 
-TPeName TTreeReader::ReadName(std::uint32_t field) {
-    TPeName name;
+TResourceName TTreeReader::ReadName(std::uint32_t field) {
+    TResourceName name;
     name.is_number = (field & kHighBit) == 0;
     if (name.is_number) {
         name.number = field;
@@ -195,11 +211,12 @@ std::vector<TTreeEntry> TTreeReader::ReadDirectory(std::uint32_t offset) {
     return entries;
 }
 
-bool TTreeReader::ReadData(const TTreeEntry& entry, TPeResource& resource) {
+bool TTreeReader::ReadData(const TTreeEntry& entry, TResource& resource) {
     std::uint32_t offset = entry.offset;
     if (entry.is_directory) {
         const auto languages = ReadDirectory(entry.offset);
         if (languages.empty() || languages.front().is_directory) {
+            MarkFault();
             return false;
         }
         offset = languages.front().offset;
@@ -210,33 +227,60 @@ bool TTreeReader::ReadData(const TTreeEntry& entry, TPeResource& resource) {
     return !data.empty();
 }
 
+class TFileModule : public platform::TResourceModule {
+public:
+    explicit TFileModule(const std::u16string& file_name) : file_(file_name, fmOpenRead) {}
+    std::vector<TResourceType> ReadTypes() override { return ReadPeResources(file_); }
+    std::vector<std::uint8_t> ReadData(const TResource& resource) override {
+        return ReadPeResourceData(file_, resource);
+    }
+
+private:
+    TFileStream file_;
+};
+
 }  // namespace
 
-std::vector<TPeResourceType> ReadPeResources(TStream& module) {
-    std::vector<TPeResourceType> types;
+std::vector<TResourceType> ReadPeResources(TStream& module, bool* is_sound) {
+    std::vector<TResourceType> types;
     const TPeLayout layout = ReadLayout(module);
+    if (is_sound != nullptr) {
+        *is_sound = false;
+    }
     if (layout.resource_address == 0) {
         return types;
     }
     TTreeReader reader(module, layout);
     for (const TTreeEntry& type : reader.ReadDirectory(0)) {
         if (!type.is_directory) {
+            reader.MarkFault();
             continue;
         }
         types.push_back({.name = type.name, .resources = {}});
         for (const TTreeEntry& entry : reader.ReadDirectory(type.offset)) {
-            TPeResource resource;
+            TResource resource;
             resource.name = entry.name;
             if (reader.ReadData(entry, resource)) {
                 types.back().resources.push_back(std::move(resource));
             }
         }
     }
+    if (is_sound != nullptr) {
+        *is_sound = reader.IsSound() && layout.resource_address >= layout.header_bytes;
+    }
     return types;
 }
 
-std::vector<std::uint8_t> ReadPeResourceData(TStream& module, const TPeResource& resource) {
+std::vector<std::uint8_t> ReadPeResourceData(TStream& module, const TResource& resource) {
     return ReadAtAddress(module, ReadLayout(module), resource.data_address, resource.data_bytes);
+}
+
+std::unique_ptr<platform::TResourceModule> OpenPeFile(const std::u16string& file_name) {
+    try {
+        return std::make_unique<TFileModule>(file_name);
+    } catch (const EFOpenError&) {
+        return nullptr;
+    }
 }
 
 }  // namespace zm

@@ -3,9 +3,13 @@
 #include <algorithm>
 
 #include "engine/foundation/zmstrings.h"
-#include "engine/foundation/zmutils_peresources_p.h"
 
 namespace zm {
+
+using platform::TResource;
+using platform::TResourceName;
+using platform::TResourceType;
+
 namespace {
 
 // Numbers of resource types.
@@ -38,11 +42,11 @@ constexpr std::uint32_t kMaxGroupBytes = kGroupHeaderBytes + 65535 * kGroupEntry
 constexpr std::uint32_t kMinGroupCost = 64;         // a small one takes a call of the system too
 constexpr std::int64_t kMaxSearchBytes = 16 << 20;  // of groups looked through for a frame
 
-std::u16string NameText(const TPeName& name) {
+std::u16string NameText(const TResourceName& name) {
     return name.is_number ? u"#" + IntegerToText(name.number) : name.text;
 }
 
-std::uint32_t FrameTypeOf(const TPeName& group_type) {
+std::uint32_t FrameTypeOf(const TResourceName& group_type) {
     if (!group_type.is_number) {
         return 0;
     }
@@ -64,13 +68,11 @@ std::int32_t CountOf(const std::vector<TItem>& items) {
 
 }  // namespace
 
-TZmResourceExtractor::TZmResourceExtractor(const std::u16string& Filename) {
-    try {
-        m_hlib = std::make_unique<TFileStream>(Filename, fmOpenRead);
-    } catch (const EFOpenError&) {
-        return;  // a file that cannot be read is a module without resources
+TZmResourceExtractor::TZmResourceExtractor(const std::u16string& Filename)
+    : m_hlib(platform::OpenResourceModule(Filename)) {
+    if (m_hlib != nullptr) {
+        m_typesList = m_hlib->ReadTypes();
     }
-    m_typesList = ReadPeResources(*m_hlib);
 }
 
 TZmResourceExtractor::~TZmResourceExtractor() = default;
@@ -84,12 +86,12 @@ std::int32_t TZmResourceExtractor::GetTypesCount() const {
 }
 
 std::u16string TZmResourceExtractor::GetTypes(std::int32_t TypeIndex) const {
-    const TPeResourceType* const type = ItemAt(m_typesList, TypeIndex);
+    const TResourceType* const type = ItemAt(m_typesList, TypeIndex);
     return type != nullptr ? NameText(type->name) : std::u16string();
 }
 
 std::u16string TZmResourceExtractor::GetFriendlyTypes(std::int32_t TypeIndex) const {
-    const TPeResourceType* const type = ItemAt(m_typesList, TypeIndex);
+    const TResourceType* const type = ItemAt(m_typesList, TypeIndex);
     if (type != nullptr && type->name.is_number) {
         for (const TFriendlyName& friendly : kFriendlyNames) {
             if (friendly.number == type->name.number) {
@@ -112,14 +114,14 @@ std::int32_t TZmResourceExtractor::IndexOfType(const std::u16string& TypeName) c
 
 std::int32_t TZmResourceExtractor::IndexOfNumber(std::uint32_t type_number) const {
     const auto found =
-        std::find_if(m_typesList.begin(), m_typesList.end(), [&](const TPeResourceType& type) {
+        std::find_if(m_typesList.begin(), m_typesList.end(), [&](const TResourceType& type) {
             return type.name.is_number && type.name.number == type_number;
         });
     return found == m_typesList.end() ? -1 : static_cast<std::int32_t>(found - m_typesList.begin());
 }
 
 std::int32_t TZmResourceExtractor::GetNamesCount(std::int32_t TypeIndex) const {
-    const TPeResourceType* const type = ItemAt(m_typesList, TypeIndex);
+    const TResourceType* const type = ItemAt(m_typesList, TypeIndex);
     return type != nullptr ? CountOf(type->resources) : 0;
 }
 
@@ -136,8 +138,8 @@ std::vector<std::uint8_t> TZmResourceExtractor::GetBuffer(std::int32_t TypeIndex
     if (!HasName(TypeIndex, NameIndex)) {
         return {};
     }
-    const TPeResourceType& type = *ItemAt(m_typesList, TypeIndex);
-    return ReadPeResourceData(*m_hlib, *ItemAt(type.resources, NameIndex));
+    const TResourceType& type = *ItemAt(m_typesList, TypeIndex);
+    return m_hlib->ReadData(*ItemAt(type.resources, NameIndex));
 }
 
 std::vector<std::uint8_t> TZmResourceExtractor::GetBuffer(
@@ -148,12 +150,12 @@ std::vector<std::uint8_t> TZmResourceExtractor::GetBuffer(
 }
 
 bool TZmResourceExtractor::GetIsGroup(std::int32_t TypeIndex) const {
-    const TPeResourceType* const type = ItemAt(m_typesList, TypeIndex);
+    const TResourceType* const type = ItemAt(m_typesList, TypeIndex);
     return type != nullptr && FrameTypeOf(type->name) != 0;
 }
 
 bool TZmResourceExtractor::GetIsGrouped(std::int32_t TypeIndex) const {
-    const TPeResourceType* const type = ItemAt(m_typesList, TypeIndex);
+    const TResourceType* const type = ItemAt(m_typesList, TypeIndex);
     return type != nullptr && type->name.is_number &&
            (type->name.number == kIconType || type->name.number == kCursorType);
 }
@@ -165,9 +167,9 @@ std::vector<std::uint32_t> TZmResourceExtractor::FrameNumbers(std::int32_t type,
     if (!GetIsGroup(type) || !HasName(type, name)) {
         return numbers;
     }
-    TPeResource head = *ItemAt(ItemAt(m_typesList, type)->resources, name);
+    TResource head = *ItemAt(ItemAt(m_typesList, type)->resources, name);
     head.data_bytes = std::min(head.data_bytes, kMaxGroupBytes);
-    const std::vector<std::uint8_t> group = ReadPeResourceData(*m_hlib, head);
+    const std::vector<std::uint8_t> group = m_hlib->ReadData(head);
     if (group.size() < kGroupHeaderBytes) {
         return numbers;
     }
@@ -197,7 +199,7 @@ std::vector<std::uint8_t> TZmResourceExtractor::GetFrameBuffer(std::int32_t Type
     }
     const std::int32_t frames = IndexOfNumber(FrameTypeOf(ItemAt(m_typesList, TypeIndex)->name));
     for (std::int32_t i = 0; i < GetNamesCount(frames); ++i) {
-        const TPeName& name = ItemAt(ItemAt(m_typesList, frames)->resources, i)->name;
+        const TResourceName& name = ItemAt(ItemAt(m_typesList, frames)->resources, i)->name;
         if (name.is_number && name.number == *number) {
             return GetBuffer(frames, i);
         }
@@ -211,13 +213,13 @@ bool TZmResourceExtractor::GetGroupAndFrame(std::int32_t TypeIndex, std::int32_t
     if (!GetIsGrouped(TypeIndex) || !HasName(TypeIndex, NameIndex)) {
         return false;
     }
-    const TPeResourceType& type = *ItemAt(m_typesList, TypeIndex);
-    const TPeName& name = ItemAt(type.resources, NameIndex)->name;
+    const TResourceType& type = *ItemAt(m_typesList, TypeIndex);
+    const TResourceName& name = ItemAt(type.resources, NameIndex)->name;
     const std::int32_t groups =
         IndexOfNumber(type.name.number == kIconType ? kIconGroupType : kCursorGroupType);
     std::int64_t bytes_left = kMaxSearchBytes;
     for (std::int32_t i = 0; name.is_number && i < GetNamesCount(groups); ++i) {
-        const TPeResource& group = *ItemAt(ItemAt(m_typesList, groups)->resources, i);
+        const TResource& group = *ItemAt(ItemAt(m_typesList, groups)->resources, i);
         bytes_left -= std::clamp(group.data_bytes, kMinGroupCost, kMaxGroupBytes);
         if (bytes_left < 0) {
             return false;

@@ -5,11 +5,9 @@
 #include <string>
 #include <vector>
 
-#include "engine/foundation/zmstreams.h"
+#include "engine/platform/resources.h"
 
 namespace zm {
-
-struct TPeResourceType;
 
 /// A place in a module's resources, to be kept and handed back to GetBuffer. Owned by its
 /// extractor.
@@ -75,8 +73,8 @@ private:
     std::int32_t IndexOfNumber(std::uint32_t type_number) const;
     std::vector<std::uint32_t> FrameNumbers(std::int32_t type, std::int32_t name) const;
 
-    std::unique_ptr<TStream> m_hlib;  ///< the module's file; nil when it cannot be read
-    std::vector<TPeResourceType> m_typesList;
+    std::unique_ptr<platform::TResourceModule> m_hlib;  ///< nil when it cannot be read
+    std::vector<platform::TResourceType> m_typesList;
     std::vector<std::unique_ptr<TZmResourceBookmark>> m_resourceBookmarks;
 };
 

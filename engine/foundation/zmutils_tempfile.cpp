@@ -1,7 +1,6 @@
 #include "engine/foundation/zmutils_tempfile.h"
 
-#include <algorithm>
-
+#include "engine/foundation/zmstreams_p.h"
 #include "engine/foundation/zmstrings.h"
 #include "engine/platform/files.h"
 
@@ -18,20 +17,19 @@ TZmTemporaryFileStream::TZmTemporaryFileStream(const std::u16string& FileName) {
 TZmTemporaryFileStream::~TZmTemporaryFileStream() = default;
 
 std::int32_t TZmTemporaryFileStream::Read(void* buffer, std::int32_t count) {
-    return std::max(handle_->Read(buffer, count), 0);
+    return ReadOrNothing(*handle_, buffer, count);
 }
 
 std::int32_t TZmTemporaryFileStream::Write(const void* buffer, std::int32_t count) {
-    return std::max(handle_->Write(buffer, count), 0);
+    return WriteOrNothing(*handle_, buffer, count);
 }
 
 std::int64_t TZmTemporaryFileStream::Seek(std::int64_t offset, TSeekOrigin origin) {
-    const std::int64_t position = handle_->Seek(offset, origin);
-    return position >= 0 ? position : std::max<std::int64_t>(handle_->Seek(0, soCurrent), 0);
+    return SeekOrStay(*handle_, offset, origin);
 }
 
 std::int64_t TZmTemporaryFileStream::GetSize() {
-    return std::max<std::int64_t>(handle_->GetSize(), 0);
+    return SizeOrNothing(*handle_);
 }
 
 }  // namespace zm

@@ -135,6 +135,15 @@ public:
                             TZmTextFormat format);
     virtual bool SaveToText(TStream& stream, std::int32_t file_type, TZmTextFormat format);
 
+    // Metadata put into a JPEG file that stays as it is otherwise, without recoding: the block of
+    // the parameters takes the place of the file's own, and without one the file loses its own.
+    // EXIF comes from the fields where the room of EXIF blocks is there, else as the marker list
+    // has it. The stream forms copy from one stream to another, both from their positions on.
+    bool InjectJpegIPTC(const std::u16string& file_name);
+    bool InjectJpegIPTCStream(TStream& input, TStream& output);
+    bool InjectJpegEXIF(const std::u16string& file_name);
+    bool InjectJpegEXIFStream(TStream& input, TStream& output);
+
     /// True after a failure. Setting it stops the work at its next progress step.
     bool GetAborting() const override { return fAborting; }
     void SetAborting(bool aborting) { fAborting = aborting; }
@@ -152,6 +161,10 @@ public:
     void SetAutoAdjustDPI(bool enabled) { fAutoAdjustDPI = enabled; }
     bool GetFilteredAdjustDPI() const { return fFilteredAdjustDPI; }
     void SetFilteredAdjustDPI(bool enabled) { fFilteredAdjustDPI = enabled; }
+
+    /// Loads PNG files, and JPEG files in full size, through the platform's imaging component.
+    bool GetWicFastLoading() const { return fWicFastLoading; }
+    void SetWicFastLoading(bool enabled) { fWicFastLoading = enabled; }
 
     void SetOnProgress(TZmProgressEvent event) { fOnProgress = std::move(event); }
     /// Called once at the end of each load and save, also of a failed one.
@@ -271,6 +284,7 @@ private:
     bool fAutoAdjustDPI = false;
     bool fFilteredAdjustDPI = false;
     bool fAsyncMode = false;
+    bool fWicFastLoading = false;
     std::atomic<bool> fAborting{false};
     std::atomic<bool> abort_all_{false};  // WaitThreads wants every work to end
     std::atomic<int> in_place_{0};        // works that must not move to a thread

@@ -213,6 +213,10 @@ bool TZalmoIO::LoadFromFile(const std::u16string& file_name, std::int32_t file_t
     if (file_type == ioUnknown) {
         file_type = FindFileFormat(file_name, zmfmContentOnly);
     }
+    const bool is_whole_jpeg = file_type == ioJPEG && GetParams()->fJPEG_Scale == ioJPEG_FULLSIZE;
+    if (fWicFastLoading && (file_type == ioPNG || is_whole_jpeg)) {
+        return LoadFromFileWIC(file_name, file_type);
+    }
     // Types without a row include the videos, for which there is no player here.
     const TZmFileFormatInfo* row = FindReaderRow(ReaderTypeOf(file_type));
     return row == nullptr ? FailWithNotice() : LoadFileAs(row->FileType, file_name);

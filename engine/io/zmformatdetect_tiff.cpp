@@ -71,8 +71,7 @@ bool IsRational(std::uint16_t type) {
     return type == 5 || type == 10;
 }
 
-TDirectory::TDirectory(TDetectSource& source, bool is_little, bool is_big_tiff,
-                       std::uint64_t place)
+TDirectory::TDirectory(TDetectSource& source, bool is_little, bool is_big_tiff, std::uint64_t place)
     : source_(source),
       is_little_(is_little),
       field_bytes_(is_big_tiff ? 8 : 4),
@@ -86,8 +85,7 @@ TDirectory::TDirectory(TDetectSource& source, bool is_little, bool is_big_tiff,
     first_entry_ = start + count_bytes;
     const std::int64_t fitting = (source.Size() - first_entry_) / entry_bytes_;
     const std::int64_t most = std::min(std::max<std::int64_t>(fitting, 0), kMostEntries);
-    entry_count_ = static_cast<std::int64_t>(
-        std::min(claimed, static_cast<std::uint64_t>(most)));
+    entry_count_ = static_cast<std::int64_t>(std::min(claimed, static_cast<std::uint64_t>(most)));
 }
 
 std::optional<std::uint64_t> TDirectory::Number(std::int64_t place, std::int64_t bytes) const {

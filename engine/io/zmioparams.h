@@ -60,6 +60,11 @@ public:
     /// Depth and channel count as the format has them; grey also selects the grey JPEG.
     void UpdateBPSAndSPP(TZmPixelFormat format);
     void FreeColorMap();
+    /// Makes fEXIF_Bitmap anew from the attached bitmap: zm24RGB in exactly that size. False, and
+    /// the old one kept, without a bitmap, for a side below 1 and without room. Defined in the
+    /// driver's room.
+    bool UpdateEXIFThumbnail(std::int32_t Width, std::int32_t Height,
+                             TResampleFilter ResampleFilter);
 
     /// Writes all persistent fields as a stream of their own format (magic, version, fields);
     /// raises EFCreateError, EWriteError.

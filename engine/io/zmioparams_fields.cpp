@@ -1,27 +1,10 @@
-#include <type_traits>
-#include <utility>
-
-#include "engine/io/zmioparams_fields_p.h"
-#include "engine/io/zmioparams_types_p.h"
+#include "engine/io/zmioparams_rows_p.h"
 
 // The fields that the stream form holds, in its order. The number of a row is the first version
 // that has the field.
 namespace zm {
 
 namespace {
-
-/// The parameters object itself, for rows whose value is no single field.
-void* WholeParams(TIOParams& params) {
-    return &params;
-}
-
-template <auto kMember>
-void* AddressOf(TIOParams& params) {
-    return &(params.*kMember);
-}
-
-template <auto kMember>
-using TTypeOf = std::remove_cvref_t<decltype(std::declval<TIOParams&>().*kMember)>;
 
 void SetterOfDpiX(TIOParams& params) {
     params.SetDpiX(params.GetDpiX());
@@ -41,12 +24,6 @@ constexpr TZmIOField BlockField(const char* name, TZmParamsBlock block, std::int
 
 }  // namespace
 
-// The name of a field is written once: its key and its row in the documentation are made of it.
-#define ZM_FIELD_ROW(field, key, since, use, changed)                                             \
-    {                                                                                             \
-#field, key, &kFieldType < TTypeOf < &TIOParams::field>>, AddressOf < &TIOParams::field>, \
-            since, use, changed                                                                   \
-    }
 #define ZM_FIELD(field, since, use) ZM_FIELD_ROW(field, nullptr, since, use, nullptr)
 #define ZM_FIELD_KEY(field, key, since, use) ZM_FIELD_ROW(field, key, since, use, nullptr)
 #define ZM_FIELD_SETTER(field, since, setter) \
@@ -270,7 +247,6 @@ const TZmIOField TZmIOFieldTable::kStored[] = {
     ZM_CODEC_TEXT(version, "WIC_CODECINFOVERSION", 0),
 };
 
-#undef ZM_FIELD_ROW
 #undef ZM_FIELD
 #undef ZM_FIELD_KEY
 #undef ZM_FIELD_SETTER

@@ -1,29 +1,14 @@
-#include <type_traits>
 #include <utility>
 
 #include "engine/foundation/zmdefs.h"
 #include "engine/foundation/zmstrings.h"
-#include "engine/io/zmioparams_fields_p.h"
-#include "engine/io/zmioparams_types_p.h"
+#include "engine/io/zmioparams_rows_p.h"
 
 // The fields and views that have a text key and are not in the stream form: the EXIF block, which
 // the stream holds as a whole, second names, and values that are computed.
 namespace zm {
 
 namespace {
-
-/// The parameters object itself, for rows whose value is no single field.
-void* WholeParams(TIOParams& params) {
-    return &params;
-}
-
-template <auto kMember>
-void* AddressOf(TIOParams& params) {
-    return &(params.*kMember);
-}
-
-template <auto kMember>
-using TTypeOf = std::remove_cvref_t<decltype(std::declval<TIOParams&>().*kMember)>;
 
 /// Entry `kIndex` of a field that is an array.
 template <auto kMember, std::size_t kIndex>
@@ -76,11 +61,7 @@ void RefreshXmp(TIOParams& params) {
 
 }  // namespace
 
-#define ZM_TEXT_ROW(field, key, use, changed)                                                     \
-    {                                                                                             \
-#field, key, &kFieldType < TTypeOf < &TIOParams::field>>, AddressOf < &TIOParams::field>, \
-            kNotStored, use, changed                                                              \
-    }
+#define ZM_TEXT_ROW(field, key, use, changed) ZM_FIELD_ROW(field, key, kNotStored, use, changed)
 #define ZM_TEXT_FIELD(field, use) ZM_TEXT_ROW(field, nullptr, use, nullptr)
 #define ZM_SECOND_KEY(field, key, use) ZM_TEXT_ROW(field, key, use, nullptr)
 #define ZM_ITEM(field, index, type, key)                                                    \

@@ -16,6 +16,7 @@ std::unique_ptr<TZalmoIO> MakeReader(TZmBitmap& bitmap, const TIOParams* params)
     if (params != nullptr) {
         driver->GetParams()->Assign(*params);
     }
+    driver->SetWicFastLoading(bitmap.GetWicFastLoading());
     driver->SetOnProgress(bitmap.GetOnProgress());
     return driver;
 }

@@ -23,9 +23,6 @@ struct TZmMetadataHooks {
     /// Fills the EXIF fields, the thumbnail included, from a block without its prefix. False when
     /// the block is none.
     bool (*read_exif)(TIOParams& params, std::span<const std::uint8_t> block) = nullptr;
-    /// Brings the marker list up to the fields before a JPEG is saved: IPTC, EXIF and XMP blocks
-    /// replace those that the list holds.
-    void (*prepare_jpeg_markers)(TIOParams& params) = nullptr;
     /// Makes a file's profile the input profile. False when it is not valid.
     bool (*read_input_profile)(TIOParams& params, std::span<const std::uint8_t> profile) = nullptr;
     /// Makes an input profile of the colour space that fEXIF_InteropIndex names. False when it
@@ -37,6 +34,9 @@ struct TZmMetadataHooks {
     /// The profile that a file of this type is to carry; empty for none.
     std::vector<std::uint8_t> (*output_profile)(TIOParams& params,
                                                 std::int32_t file_type) = nullptr;
+    /// Brings the marker list up to the fields before a JPEG is saved: IPTC, EXIF and XMP blocks
+    /// replace those that the list holds.
+    void (*prepare_jpeg_markers)(TIOParams& params) = nullptr;
 };
 
 /// The hooks in force; installed during set-up, before any thread uses a codec.

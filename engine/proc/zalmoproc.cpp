@@ -122,13 +122,11 @@ bool TZalmoProc::GetReSel(std::int32_t& x1, std::int32_t& y1, std::int32_t& x2, 
 // Begin and end.
 
 /// Copies the region, with its alpha; there is no copy without room or pixels.
-void TZalmoProc::CutRegion(std::int32_t& x1, std::int32_t& y1, std::int32_t& x2,
-                           std::int32_t& y2) {
+void TZalmoProc::CutRegion(std::int32_t& x1, std::int32_t& y1, std::int32_t& x2, std::int32_t& y2) {
     fRegionBitmap.reset();
     auto region = std::make_unique<TZmBitmap>();
     TakePlaceSettings(*fZmBitmap, *region);
-    if (x1 >= x2 || y1 >= y2 ||
-        !region->Allocate(x2 - x1, y2 - y1, fZmBitmap->GetPixelFormat())) {
+    if (x1 >= x2 || y1 >= y2 || !region->Allocate(x2 - x1, y2 - y1, fZmBitmap->GetPixelFormat())) {
         return;
     }
     fZmBitmap->CopyPaletteTo(region.get());

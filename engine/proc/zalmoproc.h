@@ -15,6 +15,15 @@
 
 namespace zm {
 
+struct TZmTextRequest;
+
+/// Keywords that stand for a coordinate of TextOut, resolved for each axis by itself. The margin
+/// is 1/20 of the image's side.
+inline constexpr std::int32_t TextPosMargin = -901;     ///< the margin
+inline constexpr std::int32_t TextPosCenter = -902;     ///< centred, truncated toward zero
+inline constexpr std::int32_t TextPosFarMargin = -903;  ///< the margin before the far side
+inline constexpr std::int32_t TextPosEnd = -904;        ///< at the far side
+
 /// What an undo item holds.
 enum TZmUndoSource : std::uint8_t {
     zmuUnknown,
@@ -190,6 +199,26 @@ public:
     /// Colour of what a growing image leaves free; black at first.
     void SetBackground(TColor color) { fBackground = color; }
 
+    // Text, of any format, over pixels and alpha plane. The canvas font keeps what was asked for,
+    // all but its colour. Selections are ignored. Raises EZmException "Cannot create TZmCanvas.
+    // Ensure GDI+ is installed on system." where the platform's drawing library is missing.
+    /// From the top left corner (or keywords) of the text's box on, turned about that corner by
+    /// degrees counter-clockwise. `bAntiAlias`: glyphs have coverage; otherwise whole pixels, and
+    /// the plane stays. `bAutoEnlarge`: an image that is smaller than the turned box grows to its
+    /// size first; new pixels have the processor's colour, and the alpha of the corner pixel.
+    void TextOut(std::int32_t X, std::int32_t Y, const std::u16string& Text, const TFont& AFont,
+                 std::int32_t Angle, bool bAntiAlias, bool bAutoEnlarge);
+    /// The same in the canvas font with another colour and style, and another name and size
+    /// (points) unless the name is empty or the size not above 0.
+    void TextOut(std::int32_t X, std::int32_t Y, const std::u16string& Text,
+                 const std::u16string& sFontName, std::int32_t iFontSize, TColor cFontColor,
+                 TFontStyles Style, std::int32_t Angle, bool bAntiAlias, bool bAutoEnlarge);
+    /// Wrapped in a rectangle, with coverage.
+    void TextOut(const TRect& Rect, const std::u16string& Text, const TFont& AFont,
+                 std::int32_t Angle);
+    void TextOut(const TRect& Rect, const std::u16string& Text, const std::u16string& sFontName,
+                 std::int32_t iFontSize, TColor cFontColor, TFontStyles Style, std::int32_t Angle);
+
     // Colours and formats.
     /// Reduces the image to at most 3 to 1024 colours (other counts do nothing), found by
     /// TZmQuantizer; it becomes zm24RGB. zmThreshold takes the found colour of each pixel,
@@ -206,7 +235,19 @@ public:
     bool ConvertTo(TZmPixelFormat format, TZmPaletteType palette_type, TZmDitherType dither_type,
                    bool check_parameters_only);
 
+    // Clipboard.
+    /// Takes the first picture there, in the order: raw form, PNG, device-independent bitmap,
+    /// enhanced metafile; one that cannot be read is passed over. Without a selection it becomes
+    /// the image. A selection takes it instead, with `stretch` at the selection's size, and with
+    /// `merge_alpha` by the picture's alpha; the image is then zm24RGB and its own plane stays.
+    /// False, and the image as it was, when there is none or the clipboard cannot be opened.
+    bool PasteFromClipboard(bool stretch, bool merge_alpha);
+
 private:
+    void PasteIntoSelection(TZmBitmap& picture, bool stretch, bool merge_alpha);
+    void DrawTextRequest(TZmTextRequest& request);
+    TFont NamedFont(const std::u16string& name, std::int32_t size, TColor color,
+                    TFontStyles style) const;
     void ReduceColors(const std::u16string& caption, std::int32_t operation,
                       const std::function<void(TZmBitmap& image)>& reduce);
     bool MakeConsistent(const TZmPixelFormatSet& allowed, bool check_view);

@@ -103,8 +103,7 @@ void WriteColors(const std::vector<std::uint16_t>& indexes, const std::vector<TR
     }
 }
 
-/// Writes the colours of `source` to a bitmap of the same size, zm8p or zm24RGB; it may be
-/// `source` itself when that is zm24RGB.
+/// Writes the colours of `source` to another bitmap of the same size, zm8p or zm24RGB.
 void MapPixels(TZmBitmap& source, TZmBitmap& target, TColorChoice& choice, TZmDitherType dither,
                const TResampleListener& listener) {
     const std::int32_t height = source.GetHeight();
@@ -231,8 +230,15 @@ void TZalmoProc::ConvertTo(std::int32_t num_colors, TZmDitherMethod dither_metho
         return;
     }
     ReduceColors(ColorCountCaption(num_colors), kOperationConvertColors, [&](TZmBitmap& image) {
+        // Into another bitmap, so that a listener who stops the work leaves the image whole.
+        TZmBitmap mapped;
+        TakePlaceSettings(image, mapped);
+        if (!mapped.Allocate(image.GetWidth(), image.GetHeight(), zm24RGB)) {
+            return;
+        }
         TColorChoice choice(image, num_colors);
-        MapPixels(image, image, choice, DitherTypeOf(dither_method), {this, fOnProgress});
+        MapPixels(image, mapped, choice, DitherTypeOf(dither_method), {this, fOnProgress});
+        ReplacePixels(image, mapped);
     });
 }
 

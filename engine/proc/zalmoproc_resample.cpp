@@ -37,6 +37,7 @@ void TakePlaceSettings(TZmBitmap& owner, TZmBitmap& result) {
 void TZmBitmap::TakeOver(TZmBitmap& source) {
     if (GetLocation() == zmTBitmap) {
         AssignEx(&source, /*with_params=*/false);
+        source.Clear();
         return;
     }
     const bool is_alpha = fIsAlpha;

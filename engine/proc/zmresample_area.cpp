@@ -7,6 +7,7 @@
 //
 // Only four source rows are held, so that huge images need no second plane.
 
+#include <algorithm>
 #include <array>
 #include <cmath>
 #include <cstring>
@@ -73,7 +74,6 @@ private:
     double CubicInRow(const TRow& row, const TColumns& at, std::size_t channel, double fx) const;
     void AddAtAlphaEdge(double* sums, const TColumns& at, double fx, double fy,
                         double weight) const;
-    int StrongestAlpha(const TColumns& at) const;
     void WriteRow(std::int32_t y);
     void ReportRows(std::int32_t rows_done) const;
 
@@ -230,25 +230,6 @@ double TAreaEngine<Sample>::CubicValue(const TColumns& at, std::size_t channel, 
     }
 }
 
-/// Which of the four pixels (current, current right, next, next right: 0 to 3) has the colour to
-/// use: the last whose alpha is above that of some other; -1 when all are equal. Alpha bytes
-/// compare as their fractions of 255 do.
-template <typename Sample>
-int TAreaEngine<Sample>::StrongestAlpha(const TColumns& at) const {
-    const std::size_t here = at.here / channels_;
-    const std::size_t right = at.right / channels_;
-    const std::array<std::uint8_t, 4> alpha{current_->alpha[here], current_->alpha[right],
-                                            next_->alpha[here], next_->alpha[right]};
-    for (int i = 3; i >= 0; --i) {
-        for (const std::uint8_t other : alpha) {
-            if (alpha[static_cast<std::size_t>(i)] > other) {
-                return i;
-            }
-        }
-    }
-    return -1;
-}
-
 /// Linear enlargement of zm24RGB with alpha.
 /// Required: where alpha changes, the piece takes one pixel's colour instead of the blend, so
 /// that the colour of transparent pixels does not bleed into opaque ones. The formula runs all
@@ -256,9 +237,12 @@ int TAreaEngine<Sample>::StrongestAlpha(const TColumns& at) const {
 template <typename Sample>
 void TAreaEngine<Sample>::AddAtAlphaEdge(double* sums, const TColumns& at, double fx, double fy,
                                          double weight) const {
-    const int strongest = StrongestAlpha(at);
+    const std::size_t here = at.here / channels_;
+    const std::size_t right = at.right / channels_;
+    const int strongest = StrongestAlpha(
+        {current_->alpha[here], current_->alpha[right], next_->alpha[here], next_->alpha[right]});
     for (std::size_t channel = 0; channel < channels_; ++channel) {
-        double value;
+        double value = 0;
         if (strongest < 0) {
             value = LinearValue(at, channel, fx, fy);
         } else {
@@ -353,6 +337,16 @@ void TAreaEngine<Sample>::Run() {
 
 }  // namespace
 
+int StrongestAlpha(const std::array<std::uint8_t, 4>& alpha) {
+    const std::uint8_t lowest = *std::min_element(alpha.begin(), alpha.end());
+    for (int i = 3; i >= 0; --i) {
+        if (alpha[static_cast<std::size_t>(i)] > lowest) {
+            return i;
+        }
+    }
+    return -1;
+}
+
 std::array<double, 4> CubicWeights(double t) {
     return {CubicOuter(1 + t), CubicInner(t), CubicInner(t - 1), CubicOuter(t - 2)};
 }
@@ -395,8 +389,8 @@ bool ResampleAreaPlain(TZmBitmap& source, TZmBitmap& target, TZmBitmap* alpha,
 
 bool ResampleArea(TZmBitmap& source, TZmBitmap& target, TZmBitmap* alpha,
                   TAreaInterpolation interpolation, const TResampleListener& listener) {
-    if (HasFastArea(source, target, alpha, interpolation)) {
-        return ResampleAreaFast(source, target, interpolation, listener);
+    if (HasFastArea(source, target, interpolation)) {
+        return ResampleAreaFast(source, target, alpha, interpolation, listener);
     }
     return ResampleAreaPlain(source, target, alpha, interpolation, listener);
 }

@@ -13,6 +13,7 @@
 #include <array>
 #include <cmath>
 #include <limits>
+#include <utility>
 #include <vector>
 
 #include "engine/proc/zmresample_area_p.h"
@@ -28,6 +29,18 @@ struct TEnlargedPixel {
     double end = 0;           ///< length of the last piece
     double fraction = 0;      ///< where the last piece ends in its source pixel
 };
+
+/// One piece of a target pixel along an axis.
+struct TEnlargedPiece {
+    std::int32_t index = 0;
+    double fraction = 0;
+    double length = 0;
+};
+/// The pieces in their order; the first is empty where there is no border.
+std::array<TEnlargedPiece, 2> PiecesOf(const TEnlargedPixel& pixel) {
+    return {{{pixel.index - 1, 1.0, pixel.has_border ? pixel.border : 0},
+             {pixel.index, pixel.fraction, pixel.end}}};
+}
 
 /// All target pixels along an axis, with what bounds their arithmetic.
 class TEnlargedAxis {
@@ -91,17 +104,20 @@ void TEnlargedAxis::Measure(const TEnlargedPixel& pixel) {
 template <typename Sample, std::size_t kChannels>
 class TEnlarger {
 public:
-    TEnlarger(TZmBitmap& source, TZmBitmap& target, TAreaInterpolation interpolation,
-              const TResampleListener& listener)
+    /// `alpha`: a partly transparent plane, for the linear form of three channels; nil otherwise.
+    TEnlarger(TZmBitmap& source, TZmBitmap& target, TZmBitmap* alpha,
+              TAreaInterpolation interpolation, const TResampleListener& listener)
         : source_(source),
           target_(target),
+          alpha_(alpha),
           listener_(listener),
           cubic_(interpolation == TAreaInterpolation::kCubic),
           columns_(source.GetWidth(), target.GetWidth()),
           rows_(source.GetHeight(), target.GetHeight()),
           scale_(1 / (columns_.Step() * rows_.Step())),
           margin_(TieMargin()),
-          row_margin_(cubic_ ? CubicRowMargin() : 0) {}
+          row_margin_(cubic_ ? CubicRowMargin() : 0),
+          sample_count_(static_cast<std::size_t>(target.GetWidth()) * kChannels) {}
 
     bool IsPrecise() const {
         return columns_.IsRegular() && rows_.IsRegular() && margin_ <= kMaxTieMargin &&
@@ -113,10 +129,9 @@ private:
     using Real = TAreaReal<Sample>;
     static constexpr double kLimit = std::numeric_limits<Sample>::max();
     static constexpr int kDigits = std::numeric_limits<Real>::digits;
-    /// Pixels repeated before and behind a row; the last one is for whole vector reads.
+    /// Pixels repeated before and behind a row.
     static constexpr std::size_t kBefore = 1;
-    static constexpr std::size_t kBehind = 3;
-    static constexpr std::size_t kLanes = kChannels == 3 ? 4 : kChannels;
+    static constexpr std::size_t kBehind = 2;
 
     /// A source row and its horizontal values: the weighted sums of both pieces (linear), or the
     /// integers of the last piece (cubic).
@@ -124,28 +139,41 @@ private:
         std::int32_t index = -1;
         std::vector<Real> samples;
         std::vector<Real> filtered;
+        std::vector<std::uint8_t> alpha;
         const Real* Pixels() const { return samples.data() + kBefore * kChannels; }
+    };
+
+    /// Where a source pixel, its right neighbour and the two below differ in alpha.
+    struct TEdges {
+        std::int32_t index = -1;
+        bool any = false;
+        std::vector<std::uint8_t> at;
     };
 
     double TieMargin() const;
     double CubicRowMargin() const;
     void PrepareColumns();
     const TRow& RowAt(std::int32_t index);
+    void PrepareWeights(std::size_t x);
     void LoadSamples(TRow& row);
     void FilterLinear(TRow& row) const;
-    void FilterCubic(TRow& row) const;
-    void FixCubicTies(TRow& row, std::size_t first, std::size_t end) const;
+    void FilterCubic(TRow& row);
     void ChooseRows(std::size_t y);
-    bool BlendBlock(std::size_t first, std::size_t count, Sample* out, Real tie_start) const;
     void MixBorders();
     void WriteRow(std::size_t y);
-    void WritePixels(std::size_t y, std::size_t first, std::size_t end, Sample* out) const;
     void ComputeLinear(std::size_t y, std::size_t x, Sample* out) const;
     void ComputeCubic(std::size_t y, std::size_t x, Sample* out) const;
-    Real TieStart(double margin) const { return static_cast<Real>(0.5 - margin); }
+    const TEdges& EdgesBelow(std::int32_t index);
+    void WriteAlphaEdges(std::size_t y, Sample* out);
+    void ComputeAlphaEdge(std::size_t y, std::size_t x, Sample* out);
+    void AddEdgePiece(const TEnlargedPiece& row, const TEnlargedPiece& column, double* sums);
+    TTieList<Real> NoTies(double margin) {
+        return TTieList<Real>{static_cast<Real>(0.5 - margin), ties_.data()};
+    }
 
     TZmBitmap& source_;
     TZmBitmap& target_;
+    TZmBitmap* alpha_;
     const TResampleListener& listener_;
     bool cubic_;
     TEnlargedAxis columns_;
@@ -153,12 +181,16 @@ private:
     double scale_;
     double margin_;
     double row_margin_;
-    std::vector<std::array<Real, 4>> taps_;  ///< per target column; linear: the first two
-    std::vector<std::size_t> border_columns_;
-    std::vector<Real> end_weights_;  ///< cubic: per target sample
-    std::vector<Real> borders_;      ///< cubic: the border pieces' share, per target sample
-    std::vector<Real> mixed_;        ///< cubic: the source row mixed vertically
-    std::array<TRow, 4> ring_;       ///< row i in place i % 4
+    std::size_t sample_count_;  ///< of a target row
+    TSpreadPlan plan_;
+    std::array<std::vector<Real>, 4> taps_;  ///< per target sample; linear: the first two
+    std::vector<Real> border_weights_;       ///< cubic: of the border piece, per target sample
+    std::vector<Real> end_weights_;          ///< cubic: of the last piece, per target sample
+    std::vector<Real> borders_;              ///< cubic: the border pieces' share
+    std::vector<Real> mixed_;                ///< cubic: the source row mixed vertically
+    std::vector<std::uint32_t> ties_;
+    std::array<TRow, 4> ring_;     ///< row i in place i % 4
+    std::array<TEdges, 2> edges_;  ///< those below row i in place i % 2
     std::array<const TRow*, 4> chosen_{};
     TLinearRows<Real> linear_rows_{};
     TCubicRows<Real> cubic_rows_{};
@@ -198,36 +230,54 @@ double TEnlarger<Sample, kChannels>::CubicRowMargin() const {
 
 template <typename Sample, std::size_t kChannels>
 void TEnlarger<Sample, kChannels>::PrepareColumns() {
-    const auto width = static_cast<std::size_t>(target_.GetWidth());
-    const auto samples = static_cast<std::int64_t>(width * kChannels);
-    taps_ = MakeWorkBuffer<std::array<Real, 4>>(target_.GetWidth());
+    const auto padded = static_cast<std::int64_t>(sample_count_ + kAreaPadding);
+    const std::size_t tap_count = cubic_ ? 4 : 2;
+    for (std::size_t k = 0; k < tap_count; ++k) {
+        taps_[k] = MakeWorkBuffer<Real>(padded);
+    }
     if (cubic_) {
-        end_weights_ = MakeWorkBuffer<Real>(samples);
-        borders_ = MakeWorkBuffer<Real>(samples);
-        mixed_ = MakeWorkBuffer<Real>(source_.GetWidth() * std::int64_t{kChannels});
+        border_weights_ = MakeWorkBuffer<Real>(padded);
+        end_weights_ = MakeWorkBuffer<Real>(padded);
+        borders_ = MakeWorkBuffer<Real>(padded);
+        mixed_ = MakeWorkBuffer<Real>(source_.GetWidth() * std::int64_t{kChannels} +
+                                      std::int64_t{kAreaPadding});
     }
-    for (std::size_t x = 0; x < width; ++x) {
-        const TEnlargedPixel& pixel = columns_[x];
-        if (pixel.has_border) {
-            border_columns_.push_back(x);
-        }
-        if (!cubic_) {
-            taps_[x][0] = static_cast<Real>(pixel.border + pixel.end * (1 - pixel.fraction));
-            taps_[x][1] = static_cast<Real>(pixel.end * pixel.fraction);
-            continue;
-        }
-        const std::array<double, 4> weights = CubicWeights(pixel.fraction);
-        std::transform(weights.begin(), weights.end(), taps_[x].begin(),
-                       [](double weight) { return static_cast<Real>(weight); });
-        std::fill_n(end_weights_.begin() + static_cast<std::ptrdiff_t>(x * kChannels), kChannels,
-                    static_cast<Real>(pixel.end * scale_));
+    ties_ = MakeWorkBuffer<std::uint32_t>(padded);
+    auto sources = MakeWorkBuffer<std::int32_t>(static_cast<std::int64_t>(sample_count_));
+    for (std::size_t i = 0; i < sample_count_; ++i) {
+        sources[i] = static_cast<std::int32_t>(
+            static_cast<std::size_t>(columns_[i / kChannels].index) * kChannels + i % kChannels);
     }
-    const std::int64_t padded =
+    for (std::size_t x = 0; x * kChannels < sample_count_; ++x) {
+        PrepareWeights(x);
+    }
+    plan_ = MakeSpreadPlan<Real>(std::move(sources));
+    const std::int64_t source_samples =
         (source_.GetWidth() + std::int64_t{kBefore + kBehind}) * std::int64_t{kChannels};
     for (TRow& row : ring_) {
-        row.samples = MakeWorkBuffer<Real>(padded + 1);
-        row.filtered = MakeWorkBuffer<Real>(samples + 1);
+        row.samples = MakeWorkBuffer<Real>(source_samples + std::int64_t{kAreaPadding});
+        row.filtered = MakeWorkBuffer<Real>(padded);
     }
+}
+
+template <typename Sample, std::size_t kChannels>
+void TEnlarger<Sample, kChannels>::PrepareWeights(std::size_t x) {
+    const TEnlargedPixel& pixel = columns_[x];
+    const auto set = [x](std::vector<Real>& row, double weight) {
+        std::fill_n(row.begin() + static_cast<std::ptrdiff_t>(x * kChannels), kChannels,
+                    static_cast<Real>(weight));
+    };
+    if (!cubic_) {
+        set(taps_[0], pixel.border + pixel.end * (1 - pixel.fraction));
+        set(taps_[1], pixel.end * pixel.fraction);
+        return;
+    }
+    const std::array<double, 4> weights = CubicWeights(pixel.fraction);
+    for (std::size_t k = 0; k < weights.size(); ++k) {
+        set(taps_[k], weights[k]);
+    }
+    set(border_weights_, pixel.border * scale_);
+    set(end_weights_, pixel.end * scale_);
 }
 
 template <typename Sample, std::size_t kChannels>
@@ -250,70 +300,29 @@ void TEnlarger<Sample, kChannels>::LoadSamples(TRow& row) {
     }
 }
 
-/// Three channels are filtered as four lanes, of which the last is overwritten by the next pixel.
 template <typename Sample, std::size_t kChannels>
 void TEnlarger<Sample, kChannels>::FilterLinear(TRow& row) const {
-    Real* out = row.filtered.data();
-    for (std::size_t x = 0; x < taps_.size(); ++x, out += kChannels) {
-        const Real* pixel = row.Pixels() + static_cast<std::size_t>(columns_[x].index) * kChannels;
-        const Real left = taps_[x][0];
-        const Real right = taps_[x][1];
-        Real lanes[kLanes];
-        for (std::size_t lane = 0; lane < kLanes; ++lane) {
-            lanes[lane] = left * pixel[lane] + right * pixel[kChannels + lane];
-        }
-        std::copy_n(lanes, kLanes, out);
-    }
+    const TSpreadRow<Real, 2> taps{row.Pixels(), kChannels, {taps_[0].data(), taps_[1].data()}};
+    SpreadRow(plan_, taps, row.filtered.data());
 }
 
+/// The integers of the cubic; those near a tie by the stated arithmetic.
 template <typename Sample, std::size_t kChannels>
-void TEnlarger<Sample, kChannels>::FilterCubic(TRow& row) const {
-    constexpr auto kMost = static_cast<Real>(kLimit);
-    Real* out = row.filtered.data();
-    for (std::size_t x = 0; x < taps_.size(); ++x, out += kChannels) {
-        const Real* pixel =
-            row.samples.data() + static_cast<std::size_t>(columns_[x].index) * kChannels;
-        const std::array<Real, 4> taps = taps_[x];
-        Real lanes[kLanes];
-        for (std::size_t lane = 0; lane < kLanes; ++lane) {
-            lanes[lane] = taps[0] * pixel[lane] + taps[1] * pixel[kChannels + lane] +
-                          taps[2] * pixel[2 * kChannels + lane] +
-                          taps[3] * pixel[3 * kChannels + lane];
-        }
-        std::copy_n(lanes, kLanes, out);
-    }
-    const std::size_t count = taps_.size() * kChannels;
-    const Real tie_start = TieStart(row_margin_);
-    Real* values = row.filtered.data();
-    for (std::size_t first = 0; first < count; first += kTieBlock) {
-        const std::size_t end = std::min(first + kTieBlock, count);
-        int near_tie = 0;
-        for (std::size_t i = first; i < end; ++i) {
-            const Real value = std::min(std::max(values[i], Real{0}), kMost);
-            near_tie |= std::fabs(value - RoundToWhole(value)) > tie_start ? 1 : 0;
-            values[i] = value;
-        }
-        if (near_tie != 0) {
-            FixCubicTies(row, first, end);
-        }
-        for (std::size_t i = first; i < end; ++i) {
-            values[i] = RoundToWhole(values[i]);
-        }
-    }
-}
-
-/// Replaces the values near a tie by the stated integers.
-template <typename Sample, std::size_t kChannels>
-void TEnlarger<Sample, kChannels>::FixCubicTies(TRow& row, std::size_t first,
-                                                std::size_t end) const {
-    const Real tie_start = TieStart(row_margin_);
-    for (std::size_t i = first; i < end; ++i) {
-        Real& value = row.filtered[i];
-        if (std::fabs(value - RoundToWhole(value)) > tie_start) {
+void TEnlarger<Sample, kChannels>::FilterCubic(TRow& row) {
+    // The cubic's first tap is the pixel on the left, where the padded row starts.
+    const TSpreadRow<Real, 4> taps{
+        row.samples.data(),
+        kChannels,
+        {taps_[0].data(), taps_[1].data(), taps_[2].data(), taps_[3].data()}};
+    TTieList<Real> ties = NoTies(row_margin_);
+    SpreadCubicRow(plan_, taps, static_cast<Real>(kLimit), row.filtered.data(), ties);
+    for (std::size_t n = 0; n < ties.count; ++n) {
+        const std::size_t i = ties_[n];
+        if (i < sample_count_) {
             const TEnlargedPixel& pixel = columns_[i / kChannels];
             const Real* a = row.samples.data() + static_cast<std::size_t>(pixel.index) * kChannels +
                             i % kChannels;
-            value = static_cast<Real>(RoundHalfEven(LimitedCubic(
+            row.filtered[i] = static_cast<Real>(RoundHalfEven(LimitedCubic(
                 a[0], a[kChannels], a[2 * kChannels], a[3 * kChannels], pixel.fraction, kLimit)));
         }
     }
@@ -326,6 +335,14 @@ const typename TEnlarger<Sample, kChannels>::TRow& TEnlarger<Sample, kChannels>:
     if (row.index != index) {
         row.index = index;
         LoadSamples(row);
+        if (alpha_ != nullptr) {
+            const std::uint8_t* values = alpha_->GetScanLine(index);
+            const auto width = static_cast<std::size_t>(source_.GetWidth());
+            row.alpha.assign(width, 255);
+            if (values != nullptr) {
+                std::copy_n(values, width, row.alpha.begin());
+            }
+        }
         if (cubic_) {
             FilterCubic(row);
         } else {
@@ -367,31 +384,9 @@ void TEnlarger<Sample, kChannels>::MixBorders() {
     for (std::size_t i = 0; i < rows.rows.size(); ++i) {
         rows.rows[i] = chosen_[i]->Pixels();
     }
-    MixCubicRows(rows, mixed_.size(), mixed_.data());
-    for (const std::size_t x : border_columns_) {
-        const auto weight = static_cast<Real>(columns_[x].border * scale_);
-        const Real* from = mixed_.data() + static_cast<std::size_t>(columns_[x].index) * kChannels;
-        for (std::size_t c = 0; c < kChannels; ++c) {
-            borders_[x * kChannels + c] = weight * from[c];
-        }
-    }
-}
-
-template <typename Sample, std::size_t kChannels>
-bool TEnlarger<Sample, kChannels>::BlendBlock(std::size_t first, std::size_t count, Sample* out,
-                                              Real tie_start) const {
-    if (!cubic_) {
-        TLinearRows<Real> rows = linear_rows_;
-        rows.rows[0] += first;
-        rows.rows[1] += first;
-        return BlendLinearRows(rows, count, out, tie_start);
-    }
-    TCubicRows<Real> rows = cubic_rows_;
-    for (const Real*& row : rows.rows) {
-        row += first;
-    }
-    return BlendCubicRows(rows, end_weights_.data() + first, borders_.data() + first, count, out,
-                          tie_start);
+    MixCubicRows(rows, mixed_.size() - kAreaPadding, mixed_.data());
+    const TSpreadRow<Real, 1> taps{mixed_.data(), kChannels, {border_weights_.data()}};
+    SpreadRow(plan_, taps, borders_.data());
 }
 
 /// One pixel as the plain form has it.
@@ -454,32 +449,120 @@ void TEnlarger<Sample, kChannels>::ComputeCubic(std::size_t y, std::size_t x, Sa
     }
 }
 
-/// Writes the pixels from `first` up to `end`. Where one is near a tie the halves are written
-/// again, down to that pixel.
+// Alpha edges. There the plain form takes one pixel's colour for a piece instead of the blend.
+
 template <typename Sample, std::size_t kChannels>
-void TEnlarger<Sample, kChannels>::WritePixels(std::size_t y, std::size_t first, std::size_t end,
-                                               Sample* out) const {
-    Sample* at = out + first * kChannels;
-    if (!BlendBlock(first * kChannels, (end - first) * kChannels, at, TieStart(margin_))) {
+const typename TEnlarger<Sample, kChannels>::TEdges& TEnlarger<Sample, kChannels>::EdgesBelow(
+    std::int32_t index) {
+    TEdges& edges = edges_[static_cast<std::size_t>(index) % edges_.size()];
+    if (edges.index != index) {
+        edges.index = index;
+        const auto& upper = RowAt(index).alpha;
+        const auto& lower = RowAt(std::min(index + 1, source_.GetHeight() - 1)).alpha;
+        edges.at.resize(upper.size());
+        unsigned any = 0;
+        for (std::size_t x = 0; x < upper.size(); ++x) {
+            const std::size_t right = std::min(x + 1, upper.size() - 1);
+            const unsigned differ = static_cast<unsigned>(upper[x] ^ upper[right]) |
+                                    static_cast<unsigned>(upper[x] ^ lower[x]) |
+                                    static_cast<unsigned>(upper[x] ^ lower[right]);
+            edges.at[x] = static_cast<std::uint8_t>(differ);
+            any |= differ;
+        }
+        edges.any = any != 0;
+    }
+    return edges;
+}
+
+/// Writes the pixels of a target row that have a piece at an alpha edge once more.
+template <typename Sample, std::size_t kChannels>
+void TEnlarger<Sample, kChannels>::WriteAlphaEdges(std::size_t y, Sample* out) {
+    const TEnlargedPixel& row = rows_[y];
+    const TEdges& below = EdgesBelow(row.index);
+    const TEdges& above = row.has_border ? EdgesBelow(row.index - 1) : below;
+    if (!below.any && !above.any) {
         return;
     }
-    if (end - first > 1) {
-        const std::size_t middle = first + (end - first) / 2;
-        WritePixels(y, first, middle, out);
-        WritePixels(y, middle, end, out);
-    } else if (cubic_) {
-        ComputeCubic(y, first, at);
-    } else {
-        ComputeLinear(y, first, at);
+    for (std::size_t x = 0; x * kChannels < sample_count_; ++x) {
+        const TEnlargedPixel& column = columns_[x];
+        const auto here = static_cast<std::size_t>(column.index);
+        const std::size_t before = column.has_border ? here - 1 : here;
+        if ((below.at[here] | below.at[before] | above.at[here] | above.at[before]) != 0) {
+            ComputeAlphaEdge(y, x, out + x * kChannels);
+        }
+    }
+}
+
+/// One pixel as the plain form has it.
+template <typename Sample, std::size_t kChannels>
+void TEnlarger<Sample, kChannels>::ComputeAlphaEdge(std::size_t y, std::size_t x, Sample* out) {
+    double sums[kChannels] = {};
+    for (const TEnlargedPiece& row : PiecesOf(rows_[y])) {
+        for (const TEnlargedPiece& column : PiecesOf(columns_[x])) {
+            if (row.length != 0 && column.length != 0) {
+                AddEdgePiece(row, column, sums);
+            }
+        }
+    }
+    for (std::size_t c = 0; c < kChannels; ++c) {
+        out[c] = ClampSample<Sample>(RoundHalfEven(sums[c] * scale_));
     }
 }
 
 template <typename Sample, std::size_t kChannels>
+void TEnlarger<Sample, kChannels>::AddEdgePiece(const TEnlargedPiece& row,
+                                                const TEnlargedPiece& column, double* sums) {
+    const TRow& current = RowAt(row.index);
+    const TRow& next = RowAt(std::min(row.index + 1, source_.GetHeight() - 1));
+    const auto x = static_cast<std::size_t>(column.index);
+    const std::size_t right = std::min(x + 1, current.alpha.size() - 1);
+    const std::array<std::uint8_t, 4> alpha{current.alpha[x], current.alpha[right], next.alpha[x],
+                                            next.alpha[right]};
+    const std::array<const Real*, 4> pixels{
+        current.Pixels() + x * kChannels, current.Pixels() + right * kChannels,
+        next.Pixels() + x * kChannels, next.Pixels() + right * kChannels};
+    const int strongest = StrongestAlpha(alpha);
+    const double fx = column.fraction;
+    const double fy = row.fraction;
+    for (std::size_t c = 0; c < kChannels; ++c) {
+        std::array<double, 4> v{};
+        for (std::size_t i = 0; i < v.size(); ++i) {
+            v[i] = pixels[strongest < 0 ? i : static_cast<std::size_t>(strongest)][c];
+        }
+        const double value =
+            ((1 - fx) * v[0] + fx * v[1]) * (1 - fy) + ((1 - fx) * v[2] + fx * v[3]) * fy;
+        sums[c] += column.length * row.length * value;
+    }
+}
+
+/// Writes a target row, then the pixels near a tie or at an alpha edge once more.
+template <typename Sample, std::size_t kChannels>
 void TEnlarger<Sample, kChannels>::WriteRow(std::size_t y) {
-    constexpr std::size_t kPixels = kTieBlock / kChannels;
     auto* out = reinterpret_cast<Sample*>(target_.GetScanLine(static_cast<std::int32_t>(y)));
-    for (std::size_t first = 0; out != nullptr && first < taps_.size(); first += kPixels) {
-        WritePixels(y, first, std::min(first + kPixels, taps_.size()), out);
+    if (out == nullptr) {
+        return;
+    }
+    TTieList<Real> ties = NoTies(margin_);
+    if (cubic_) {
+        BlendCubicRows(cubic_rows_, end_weights_.data(), borders_.data(), sample_count_, out, ties);
+    } else {
+        BlendLinearRows(linear_rows_, sample_count_, out, ties);
+    }
+    std::size_t next = 0;  // pixels below are done
+    for (std::size_t n = 0; n < ties.count; ++n) {
+        const std::size_t x = ties_[n] / kChannels;
+        if (x < next) {
+            continue;
+        }
+        if (cubic_) {
+            ComputeCubic(y, x, out + x * kChannels);
+        } else {
+            ComputeLinear(y, x, out + x * kChannels);
+        }
+        next = x + 1;
+    }
+    if (alpha_ != nullptr) {
+        WriteAlphaEdges(y, out);
     }
 }
 
@@ -502,9 +585,9 @@ void TEnlarger<Sample, kChannels>::Run() {
 }
 
 template <typename Sample, std::size_t kChannels>
-bool Enlarge(TZmBitmap& source, TZmBitmap& target, TAreaInterpolation interpolation,
-             const TResampleListener& listener) {
-    TEnlarger<Sample, kChannels> engine(source, target, interpolation, listener);
+bool Enlarge(TZmBitmap& source, TZmBitmap& target, TZmBitmap* alpha,
+             TAreaInterpolation interpolation, const TResampleListener& listener) {
+    TEnlarger<Sample, kChannels> engine(source, target, alpha, interpolation, listener);
     if (!engine.IsPrecise()) {
         return false;
     }
@@ -514,14 +597,22 @@ bool Enlarge(TZmBitmap& source, TZmBitmap& target, TAreaInterpolation interpolat
 
 }  // namespace
 
-bool EnlargeAreaFast(TZmBitmap& source, TZmBitmap& target, TAreaInterpolation interpolation,
-                     const TResampleListener& listener) {
+bool EnlargeAreaFast(TZmBitmap& source, TZmBitmap& target, TZmBitmap* alpha,
+                     TAreaInterpolation interpolation, const TResampleListener& listener) {
+    const bool heeds_alpha = interpolation == TAreaInterpolation::kLinear &&
+                             source.GetPixelFormat() == zm24RGB && alpha != nullptr &&
+                             !IsOpaquePlane(*alpha);
+    TZmBitmap* const plane = heeds_alpha ? alpha : nullptr;
     switch (source.GetPixelFormat()) {
-        case zm8g: return Enlarge<std::uint8_t, 1>(source, target, interpolation, listener);
-        case zm24RGB: return Enlarge<std::uint8_t, 3>(source, target, interpolation, listener);
-        case zm32RGB: return Enlarge<std::uint8_t, 4>(source, target, interpolation, listener);
-        case zm16g: return Enlarge<std::uint16_t, 1>(source, target, interpolation, listener);
-        case zm48RGB: return Enlarge<std::uint16_t, 3>(source, target, interpolation, listener);
+        case zm8g: return Enlarge<std::uint8_t, 1>(source, target, plane, interpolation, listener);
+        case zm24RGB:
+            return Enlarge<std::uint8_t, 3>(source, target, plane, interpolation, listener);
+        case zm32RGB:
+            return Enlarge<std::uint8_t, 4>(source, target, plane, interpolation, listener);
+        case zm16g:
+            return Enlarge<std::uint16_t, 1>(source, target, plane, interpolation, listener);
+        case zm48RGB:
+            return Enlarge<std::uint16_t, 3>(source, target, plane, interpolation, listener);
         default: return false;
     }
 }

@@ -12,6 +12,7 @@
 #include <algorithm>
 #include <cmath>
 #include <limits>
+#include <type_traits>
 #include <vector>
 
 #include "engine/proc/zmresample_area_p.h"
@@ -23,13 +24,6 @@ namespace {
 struct TAxisPiece {
     std::int32_t index = 0;
     double length = 0;
-};
-
-/// A source pixel's share in a target pixel along an axis.
-template <typename Real>
-struct TAxisTap {
-    std::int32_t index = 0;
-    Real weight = 0;
 };
 
 /// One direction: pieces and taps of every target pixel.
@@ -49,6 +43,8 @@ public:
     TTapRange Taps(std::size_t target) const {
         return {taps_.data() + tap_starts_[target], taps_.data() + tap_starts_[target + 1]};
     }
+    /// All taps; for bytes.
+    TAxisTaps AllTaps() const { return {taps_.data(), tap_starts_.data(), tap_starts_.size() - 1}; }
     TPieceRange Pieces(std::size_t target) const {
         return {pieces_.data() + piece_starts_[target], pieces_.data() + piece_starts_[target + 1]};
     }
@@ -162,32 +158,6 @@ double TieMargin(const TFastAxis<Real>& columns, const TFastAxis<Real>& rows, do
     return largest * scale * (4 * (taps + stated) + 16) * std::ldexp(1, -kDigits);
 }
 
-/// sums[i] (+)= the rows' samples times their weights.
-template <std::size_t kRows, bool kFresh, typename Sample, typename Real>
-void AddWeightedRows(const Sample* const* rows, const Real* weights, Real* __restrict sums,
-                     std::size_t count) {
-    for (std::size_t i = 0; i < count; ++i) {
-        Real sum = kFresh ? Real{0} : sums[i];
-        for (std::size_t k = 0; k < kRows; ++k) {
-            sum += weights[k] * static_cast<Real>(rows[k][i]);
-        }
-        sums[i] = sum;
-    }
-}
-
-constexpr std::size_t kMaxRowsAtOnce = 4;
-
-template <bool kFresh, typename Sample, typename Real>
-void AddRowBatch(std::size_t row_count, const Sample* const* rows, const Real* weights, Real* sums,
-                 std::size_t count) {
-    switch (row_count) {
-        case 1: AddWeightedRows<1, kFresh>(rows, weights, sums, count); break;
-        case 2: AddWeightedRows<2, kFresh>(rows, weights, sums, count); break;
-        case 3: AddWeightedRows<3, kFresh>(rows, weights, sums, count); break;
-        default: AddWeightedRows<4, kFresh>(rows, weights, sums, count); break;
-    }
-}
-
 /// Writes rounded samples; true when one lies within the margin of a tie. No value is far enough
 /// outside the range to round to anything else.
 template <typename Sample, typename Real>
@@ -220,6 +190,10 @@ public:
 
 private:
     using Real = TAreaReal<Sample>;
+    /// Source rows that are read side by side: more would crowd the cache.
+    static constexpr std::size_t kMaxRowsAtOnce = 8;
+    /// Numbers behind a row, for whole vector reads and writes.
+    static constexpr std::size_t kPadding = 4;
 
     const Sample* SourceRow(std::int32_t index) {
         return reinterpret_cast<const Sample*>(source_.GetScanLine(index));
@@ -239,8 +213,10 @@ private:
     double scale_;
     double margin_;
     bool rows_stay_valid_;
-    std::vector<Real> row_sums_;  ///< source width, and some behind for whole vector reads
-    std::vector<Real> values_;    ///< target width, and some behind for whole vector writes
+    std::vector<const Sample*> summed_rows_;
+    std::vector<Real> summed_weights_;
+    std::vector<Real> row_sums_;  ///< padded
+    std::vector<Real> values_;    ///< padded
     std::vector<std::size_t> ties_;
     std::vector<double> tie_sums_;
 };
@@ -249,49 +225,52 @@ private:
 template <typename Sample, std::size_t kChannels>
 void TFastArea<Sample, kChannels>::SumSourceRows(std::size_t y) {
     const typename TFastAxis<Real>::TTapRange taps = rows_.Taps(y);
-    const std::size_t count = row_sums_.size() - kMaxRowsAtOnce;
-    const std::size_t at_once = rows_stay_valid_ ? kMaxRowsAtOnce : 1;
-    bool fresh = true;
-    for (const TAxisTap<Real>* tap = taps.begin; tap != taps.end;) {
-        const Sample* rows[kMaxRowsAtOnce];
-        Real weights[kMaxRowsAtOnce];
-        std::size_t n = 0;
-        for (; n < at_once && tap != taps.end; ++tap) {
-            rows[n] = SourceRow(tap->index);
-            weights[n] = tap->weight;
-            n += rows[n] != nullptr ? 1 : 0;
+    const std::size_t count = row_sums_.size() - kPadding;
+    TSumStart start = TSumStart::kFresh;
+    const auto add = [&] {
+        SumWeightedRows({summed_rows_.data(), summed_weights_.data(), summed_rows_.size()}, count,
+                        start, row_sums_.data());
+        summed_rows_.clear();
+        summed_weights_.clear();
+        start = TSumStart::kGoOn;
+    };
+    for (const TAxisTap<Real>* tap = taps.begin; tap != taps.end; ++tap) {
+        const Sample* row = SourceRow(tap->index);
+        if (row == nullptr) {
+            continue;
         }
-        if (n > 0 && fresh) {
-            AddRowBatch<true>(n, rows, weights, row_sums_.data(), count);
-            fresh = false;
-        } else if (n > 0) {
-            AddRowBatch<false>(n, rows, weights, row_sums_.data(), count);
+        summed_rows_.push_back(row);
+        summed_weights_.push_back(tap->weight);
+        if (!rows_stay_valid_ || summed_rows_.size() == kMaxRowsAtOnce) {
+            add();
         }
     }
-    if (fresh) {
-        std::fill(row_sums_.begin(), row_sums_.end(), Real{0});
+    if (!summed_rows_.empty() || start == TSumStart::kFresh) {
+        add();
     }
 }
 
-/// Target samples from the row sums. Three channels are filtered as four lanes, of which the
-/// last is overwritten by the next pixel.
+/// Target samples from the row sums.
 template <typename Sample, std::size_t kChannels>
 void TFastArea<Sample, kChannels>::SumColumns() {
-    constexpr std::size_t kLanes = kChannels == 3 ? 4 : kChannels;
     const auto scale = static_cast<Real>(scale_);
+    if constexpr (kChannels == 3 && std::is_same_v<Real, float>) {
+        SumPixels3(columns_.AllTaps(), row_sums_.data(), scale, values_.data());
+        return;
+    }
     const Real* sums = row_sums_.data();
     Real* out = values_.data();
     const auto width = static_cast<std::size_t>(target_.GetWidth());
     for (std::size_t x = 0; x < width; ++x) {
         const typename TFastAxis<Real>::TTapRange taps = columns_.Taps(x);
-        Real lanes[kLanes] = {};
+        Real lanes[kChannels] = {};
         for (const TAxisTap<Real>* tap = taps.begin; tap != taps.end; ++tap) {
             const Real* pixel = sums + static_cast<std::size_t>(tap->index) * kChannels;
-            for (std::size_t lane = 0; lane < kLanes; ++lane) {
+            for (std::size_t lane = 0; lane < kChannels; ++lane) {
                 lanes[lane] += tap->weight * pixel[lane];
             }
         }
-        for (std::size_t lane = 0; lane < kLanes; ++lane) {
+        for (std::size_t lane = 0; lane < kChannels; ++lane) {
             out[lane] = lanes[lane] * scale;
         }
         out += kChannels;
@@ -372,8 +351,8 @@ void TFastArea<Sample, kChannels>::FinishRow(std::size_t y) {
 template <typename Sample, std::size_t kChannels>
 void TFastArea<Sample, kChannels>::Run() {
     const auto channels = static_cast<std::int64_t>(kChannels);
-    row_sums_ = MakeWorkBuffer<Real>(source_.GetWidth() * channels + kMaxRowsAtOnce);
-    values_ = MakeWorkBuffer<Real>(target_.GetWidth() * channels + kMaxRowsAtOnce);
+    row_sums_ = MakeWorkBuffer<Real>(source_.GetWidth() * channels + std::int64_t{kPadding});
+    values_ = MakeWorkBuffer<Real>(target_.GetWidth() * channels + std::int64_t{kPadding});
     const std::int32_t height = target_.GetHeight();
     for (std::int32_t y = 0; y < height; ++y) {
         const auto row = static_cast<std::size_t>(y);
@@ -397,7 +376,9 @@ bool Shrink(TZmBitmap& source, TZmBitmap& target, const TResampleListener& liste
     return true;
 }
 
-bool IsOpaque(TZmBitmap& alpha) {
+}  // namespace
+
+bool IsOpaquePlane(TZmBitmap& alpha) {
     if (alpha.GetFull()) {
         return true;
     }
@@ -410,8 +391,6 @@ bool IsOpaque(TZmBitmap& alpha) {
     }
     return true;
 }
-
-}  // namespace
 
 int BitsBehindPoint(double value) {
     for (int bits = 0; bits <= kMaxExactBits; ++bits) {
@@ -434,8 +413,7 @@ bool ShrinkAreaFast(TZmBitmap& source, TZmBitmap& target, const TResampleListene
     }
 }
 
-bool HasFastArea(TZmBitmap& source, TZmBitmap& target, TZmBitmap* alpha,
-                 TAreaInterpolation interpolation) {
+bool HasFastArea(TZmBitmap& source, TZmBitmap& target, TAreaInterpolation interpolation) {
     const TZmPixelFormat format = source.GetPixelFormat();
     const bool known = format == zm8g || format == zm24RGB || format == zm32RGB ||
                        format == zm16g || format == zm48RGB;
@@ -447,21 +425,18 @@ bool HasFastArea(TZmBitmap& source, TZmBitmap& target, TZmBitmap* alpha,
     if (wider != higher) {
         return false;
     }
-    if (!wider || interpolation == TAreaInterpolation::kCubic) {
-        return true;
-    }
-    return format != zm32RGB && (format != zm24RGB || alpha == nullptr || IsOpaque(*alpha));
+    return !wider || interpolation == TAreaInterpolation::kCubic || format != zm32RGB;
 }
 
-bool ResampleAreaFast(TZmBitmap& source, TZmBitmap& target, TAreaInterpolation interpolation,
-                      const TResampleListener& listener) {
+bool ResampleAreaFast(TZmBitmap& source, TZmBitmap& target, TZmBitmap* alpha,
+                      TAreaInterpolation interpolation, const TResampleListener& listener) {
     if (!FitTargetFormat(target, source.GetPixelFormat())) {
         return false;
     }
     const bool done = target.GetWidth() > source.GetWidth()
-                          ? EnlargeAreaFast(source, target, interpolation, listener)
+                          ? EnlargeAreaFast(source, target, alpha, interpolation, listener)
                           : ShrinkAreaFast(source, target, listener);
-    return done || ResampleAreaPlain(source, target, nullptr, interpolation, listener);
+    return done || ResampleAreaPlain(source, target, alpha, interpolation, listener);
 }
 
 }  // namespace zm

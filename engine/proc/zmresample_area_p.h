@@ -79,27 +79,109 @@ struct TCubicRows {
     Real border;
 };
 
-/// out = rounded mixture of the rows; true when a sample lies further than `tie_start` from its
-/// integer. Writes `count` samples exactly.
-bool BlendLinearRows(const TLinearRows<float>& rows, std::size_t count, std::uint8_t* out,
-                     float tie_start);
-bool BlendLinearRows(const TLinearRows<double>& rows, std::size_t count, std::uint16_t* out,
-                     double tie_start);
+/// Numbers behind the end that the vector loops below may read or write.
+inline constexpr std::size_t kAreaPadding = 64;
+
+/// Where each sample of a filtered row comes from: for whole vectors of samples a place in the
+/// source row, and for each sample its distance from there. Enlarging moves by one sample or
+/// back to the start of a pixel, so that a vector of four samples or more comes from one vector of
+/// the source.
+struct TSpreadPlan {
+    std::vector<std::int32_t> bases;
+    std::vector<std::int32_t> offsets;  ///< padded to whole vectors
+};
+/// Plans rows whose sample i comes from sample `sources`[i], for the arithmetic of `Real`.
+template <typename Real>
+TSpreadPlan MakeSpreadPlan(std::vector<std::int32_t> sources);
+
+/// A source row, the distance of neighbouring pixels in it, and for each tap (pixels side by
+/// side, from the planned one on) the weights of all samples. Padded, all of them.
+template <typename Real, std::size_t kTaps>
+struct TSpreadRow {
+    const Real* samples;
+    std::size_t step;
+    std::array<const Real*, kTaps> weights;
+};
+/// out = sums of the taps.
+void SpreadRow(const TSpreadPlan& plan, const TSpreadRow<float, 1>& row, float* out);
+void SpreadRow(const TSpreadPlan& plan, const TSpreadRow<double, 1>& row, double* out);
+void SpreadRow(const TSpreadPlan& plan, const TSpreadRow<float, 2>& row, float* out);
+void SpreadRow(const TSpreadPlan& plan, const TSpreadRow<double, 2>& row, double* out);
+
+/// Where results near a tie are noted. Those further than `start` from their integer are; the
+/// list has room for all samples of a call.
+template <typename Real>
+struct TTieList {
+    Real start;
+    std::uint32_t* samples;
+    std::size_t count = 0;
+};
+/// out = sums of the taps, limited to 0 .. `limit` and rounded. Notes samples, also some of the
+/// padding.
+void SpreadCubicRow(const TSpreadPlan& plan, const TSpreadRow<float, 4>& row, float limit,
+                    float* out, TTieList<float>& ties);
+void SpreadCubicRow(const TSpreadPlan& plan, const TSpreadRow<double, 4>& row, double limit,
+                    double* out, TTieList<double>& ties);
+
+/// out = rounded mixture of the rows. Writes `count` samples exactly; notes samples.
+void BlendLinearRows(const TLinearRows<float>& rows, std::size_t count, std::uint8_t* out,
+                     TTieList<float>& ties);
+void BlendLinearRows(const TLinearRows<double>& rows, std::size_t count, std::uint16_t* out,
+                     TTieList<double>& ties);
 /// out = mixture of the rows.
 void MixCubicRows(const TCubicRows<float>& rows, std::size_t count, float* out);
 void MixCubicRows(const TCubicRows<double>& rows, std::size_t count, double* out);
-/// out = rounded mixture of the rows times `weights`, plus `borders`; true as above.
-bool BlendCubicRows(const TCubicRows<float>& rows, const float* weights, const float* borders,
-                    std::size_t count, std::uint8_t* out, float tie_start);
-bool BlendCubicRows(const TCubicRows<double>& rows, const double* weights, const double* borders,
-                    std::size_t count, std::uint16_t* out, double tie_start);
+/// out = rounded mixture of the rows times `weights`, plus `borders`; as BlendLinearRows.
+void BlendCubicRows(const TCubicRows<float>& rows, const float* weights, const float* borders,
+                    std::size_t count, std::uint8_t* out, TTieList<float>& ties);
+void BlendCubicRows(const TCubicRows<double>& rows, const double* weights, const double* borders,
+                    std::size_t count, std::uint16_t* out, TTieList<double>& ties);
+
+/// A source pixel's share in a target pixel along an axis.
+template <typename Real>
+struct TAxisTap {
+    std::int32_t index = 0;
+    Real weight = 0;
+};
+
+/// Whether sums start at 0 or are added to.
+enum class TSumStart : std::uint8_t { kFresh, kGoOn };
+/// Rows of samples with their weights.
+template <typename Sample>
+struct TSummedRows {
+    const Sample* const* rows;
+    const TAreaReal<Sample>* weights;
+    std::size_t row_count;
+};
+/// sums[i] = (or +=) the rows' samples times their weights.
+void SumWeightedRows(const TSummedRows<std::uint8_t>& rows, std::size_t count, TSumStart start,
+                     float* sums);
+void SumWeightedRows(const TSummedRows<std::uint16_t>& rows, std::size_t count, TSumStart start,
+                     double* sums);
+
+/// The taps of target pixels: those of pixel x from starts[x] up to starts[x + 1].
+struct TAxisTaps {
+    const TAxisTap<float>* taps;
+    const std::size_t* starts;
+    std::size_t count;
+};
+/// Sums of three-channel pixels, times `scale`. Reads one number behind the last pixel of `in`
+/// and writes one behind the last of `out`.
+void SumPixels3(const TAxisTaps& taps, const float* in, float scale, float* out);
 
 /// The fast forms by direction. False when they are not precise enough here, and then nothing
 /// has been written.
 [[nodiscard]] bool ShrinkAreaFast(TZmBitmap& source, TZmBitmap& target,
                                   const TResampleListener& listener);
-[[nodiscard]] bool EnlargeAreaFast(TZmBitmap& source, TZmBitmap& target,
+[[nodiscard]] bool EnlargeAreaFast(TZmBitmap& source, TZmBitmap& target, TZmBitmap* alpha,
                                    TAreaInterpolation interpolation,
                                    const TResampleListener& listener);
+
+/// Whether all values of a plane are 255.
+bool IsOpaquePlane(TZmBitmap& alpha);
+/// Which of four pixels (here, right, below, below right: 0 to 3) has the colour to use where
+/// their alpha differs: the last whose alpha is above that of some other; -1 when all are equal.
+/// Alpha bytes compare as their fractions of 255 do.
+int StrongestAlpha(const std::array<std::uint8_t, 4>& alpha);
 
 }  // namespace zm

@@ -11,6 +11,7 @@
 #include <cstring>
 #include <memory>
 #include <numbers>
+#include <optional>
 #include <vector>
 
 #include "engine/foundation/zmutils_threadpool.h"
@@ -110,10 +111,7 @@ public:
     std::int32_t Count() const { return static_cast<std::int32_t>(divisors_.size()); }
     /// Sums of bytes are whole numbers that single precision holds, and TQuotient divides them.
     bool FitsFloat() const { return fits_float_; }
-    TTapRow Row() const {
-        return TTapRow{taps_.data(), weights_.data(), starts_.data(), quotients_.data(),
-                       quotients_.size()};
-    }
+    const std::vector<TQuotient>& Quotients() const { return quotients_; }
     TCList operator[](std::int32_t index) const {
         const auto i = static_cast<std::size_t>(index);
         return TCList{taps_.data() + starts_[i],
@@ -207,57 +205,115 @@ void FilterRow(const Sample* in, Sample* out, const TTapTable& contrib) {
     }
 }
 
-/// A source row as numbers and a filtered row, each with one element more: three channels are
-/// filtered as four.
-struct TFloatRow {
-    std::vector<float> samples;
-    std::vector<std::uint8_t> bytes;
+/// The tap lists as pairs of neighbouring pixels. Taps that reflection has put on one pixel are
+/// joined, and gaps get weights of 0: integer sums do not change by that.
+class TPairTable {
+public:
+    explicit TPairTable(const TTapTable& contrib);
+    TPairRow Row() const {
+        return TPairRow{pairs_.data(), firsts_.data(), starts_.data(), quotients_.data(),
+                        starts_.size()};
+    }
+
+private:
+    void AddPairs(const TCList& list);
+
+    std::vector<std::int32_t> pairs_;
+    std::vector<std::size_t> firsts_;
+    std::vector<std::size_t> starts_;
+    std::vector<TQuotient> quotients_;
+    std::vector<std::int32_t> weights_;  ///< those of the list at hand
 };
 
-/// FilterRow for bytes in single precision, the same bytes. `room` serves one row at a time.
-template <std::size_t kChannels>
-void FilterRowFast(const std::uint8_t* in, std::int32_t width, std::uint8_t* out,
-                   const TTapTable& contrib, TFloatRow& room) {
-    const std::size_t count = static_cast<std::size_t>(width) * kChannels;
-    for (std::size_t i = 0; i < count; ++i) {
-        room.samples[i] = in[i];
+TPairTable::TPairTable(const TTapTable& contrib) : quotients_(contrib.Quotients()) {
+    firsts_.reserve(quotients_.size() + 1);
+    starts_.reserve(quotients_.size());
+    firsts_.push_back(0);
+    for (std::int32_t i = 0; i < contrib.Count(); ++i) {
+        AddPairs(contrib[i]);
     }
-    if constexpr (kChannels == 3) {
-        FilterPixels24(contrib.Row(), room.samples.data(), room.bytes.data());
-        std::memcpy(out, room.bytes.data(), room.bytes.size() - 1);
-    } else {
-        for (std::int32_t x = 0; x < contrib.Count(); ++x) {
-            const TCList list = contrib[x];
-            float sum = 0;
-            for (std::int32_t i = 0; i < list.n; ++i) {
-                sum += list.weights[i] * room.samples[static_cast<std::size_t>(list.p[i].pixel)];
-            }
-            out[x] = TQuotient(list.divisor)(sum);
+}
+
+void TPairTable::AddPairs(const TCList& list) {
+    std::int32_t first = 0;
+    std::int32_t last = -1;
+    if (list.n > 0) {
+        const auto [low, high] = std::minmax_element(
+            list.p, list.p + list.n,
+            [](const TContributor& a, const TContributor& b) { return a.pixel < b.pixel; });
+        first = low->pixel & ~1;
+        last = high->pixel | 1;
+    }
+    weights_.assign(static_cast<std::size_t>(last + 1 - first), 0);
+    for (std::int32_t i = 0; i < list.n; ++i) {
+        weights_[static_cast<std::size_t>(list.p[i].pixel - first)] += list.p[i].weight;
+    }
+    for (std::size_t i = 0; i < weights_.size(); i += 2) {
+        const auto left = static_cast<std::uint16_t>(weights_[i]);
+        const auto right = static_cast<std::uint32_t>(weights_[i + 1]) << 16;
+        pairs_.push_back(static_cast<std::int32_t>(right | left));
+    }
+    starts_.push_back(static_cast<std::size_t>(first) / 2);
+    firsts_.push_back(pairs_.size());
+}
+
+/// Filters rows of zm24RGB, several at a time: FilterRow's bytes, by pairs.
+class TPairFilter {
+public:
+    TPairFilter(const TPairTable& table, std::int32_t width)
+        : table_(table),
+          row_bytes_(static_cast<std::size_t>(width) * 3),
+          pairs_((static_cast<std::size_t>(width) + 1) / 2),
+          area_(MakeWorkBuffer<std::int16_t>(static_cast<std::int64_t>(
+              pairs_ * PairRowsAtOnce() * kPairNumbers + kAlign / sizeof(std::int16_t)))),
+          out_step_(table.Row().count * 3 + 1),
+          out_(MakeWorkBuffer<std::uint8_t>(
+              static_cast<std::int64_t>(out_step_ * PairRowsAtOnce() + 1))) {
+        const auto address = reinterpret_cast<std::uintptr_t>(area_.data());
+        aligned_ = area_.data() + (kAlign - address % kAlign) % kAlign / sizeof(std::int16_t);
+    }
+    /// Takes a source row into place `slot`.
+    void Load(const std::uint8_t* in, std::size_t slot);
+    void Filter() { FilterPairs24(table_.Row(), aligned_, out_.data(), out_step_); }
+    /// Gives the filtered row of place `slot`.
+    void Store(std::size_t slot, std::uint8_t* out) const {
+        std::memcpy(out, out_.data() + slot * out_step_, out_step_ - 1);
+    }
+
+private:
+    static constexpr std::size_t kAlign = 64;
+    const TPairTable& table_;
+    std::size_t row_bytes_;
+    std::size_t pairs_;
+    std::vector<std::int16_t> area_;
+    std::int16_t* aligned_;
+    std::size_t out_step_;
+    std::vector<std::uint8_t> out_;
+};
+
+void TPairFilter::Load(const std::uint8_t* in, std::size_t slot) {
+    // The last pairs are taken from a copy: a pair's reading goes two bytes beyond it.
+    constexpr std::size_t kTailPairs = 2;
+    const std::size_t body = pairs_ > kTailPairs ? pairs_ - kTailPairs : 0;
+    SpreadPairs24(in, body, slot, aligned_);
+    std::array<std::uint8_t, kTailPairs * 6 + 2> tail{};
+    std::memcpy(tail.data(), in + body * 6, row_bytes_ - body * 6);
+    SpreadPairs24(tail.data(), pairs_ - body, slot,
+                  aligned_ + body * PairRowsAtOnce() * kPairNumbers);
+}
+
+/// A row of bytes in single precision, one channel: FilterRow's bytes.
+void FilterGrayRowFast(const std::uint8_t* in, std::uint8_t* out, const TTapTable& contrib,
+                       std::vector<float>& samples) {
+    std::copy_n(in, samples.size(), samples.begin());
+    for (std::int32_t x = 0; x < contrib.Count(); ++x) {
+        const TCList list = contrib[x];
+        float sum = 0;
+        for (std::int32_t i = 0; i < list.n; ++i) {
+            sum += list.weights[i] * samples[static_cast<std::size_t>(list.p[i].pixel)];
         }
+        out[x] = TQuotient(list.divisor)(sum);
     }
-}
-
-/// A row of bytes by the faster form, where it applies.
-template <std::size_t kChannels>
-void FilterByteRow(const std::uint8_t* in, std::int32_t width, std::uint8_t* out,
-                   const TTapTable& contrib, TFloatRow& room) {
-    if (room.samples.empty()) {
-        FilterRow<std::uint8_t, kChannels>(in, out, contrib);
-    } else {
-        FilterRowFast<kChannels>(in, width, out, contrib, room);
-    }
-}
-
-/// Room for FilterByteRow; empty where the plain form is to run.
-TFloatRow MakeFloatRow(const TTapTable& contrib, std::int32_t width, std::int32_t channels,
-                       TResampleForm form) {
-    TFloatRow room;
-    if (form == TResampleForm::kFast && contrib.FitsFloat()) {
-        room.samples = MakeWorkBuffer<float>(static_cast<std::int64_t>(width) * channels + 1);
-        room.bytes =
-            MakeWorkBuffer<std::uint8_t>(static_cast<std::int64_t>(contrib.Count()) * channels + 1);
-    }
-    return room;
 }
 
 /// The sums of one target row over the rows of the work plane.
@@ -277,67 +333,34 @@ void SumRows(TZmBitmap& work, const TCList& list, std::vector<std::int32_t>& sum
     }
 }
 
-/// sums[i] += the rows' samples times their weights.
-template <std::size_t kRows>
-void AddFloatRows(const std::uint8_t* const* rows, const float* weights, float* __restrict sums,
-                  std::size_t count) {
-    for (std::size_t i = 0; i < count; ++i) {
-        float sum = sums[i];
-        for (std::size_t k = 0; k < kRows; ++k) {
-            sum += weights[k] * static_cast<float>(rows[k][i]);
-        }
-        sums[i] = sum;
-    }
-}
-
-/// SumRows for bytes in single precision, the same numbers. Four rows are taken at a time where
-/// the plane's rows stay valid.
-void SumRowsFast(TZmBitmap& work, const TCList& list, std::vector<float>& sums) {
-    constexpr std::int32_t kAtOnce = 4;
-    std::fill(sums.begin(), sums.end(), 0.0f);
-    const bool rows_stay_valid = work.GetLocation() != zmFile;
-    std::int32_t i = 0;
-    while (rows_stay_valid && i + kAtOnce <= list.n) {
-        std::array<const std::uint8_t*, kAtOnce> rows{};
-        for (std::size_t k = 0; k < rows.size(); ++k) {
-            rows[k] = work.GetScanLine(list.p[i + static_cast<std::int32_t>(k)].pixel);
-        }
-        if (std::find(rows.begin(), rows.end(), nullptr) != rows.end()) {
-            break;
-        }
-        AddFloatRows<kAtOnce>(rows.data(), list.weights + i, sums.data(), sums.size());
-        i += kAtOnce;
-    }
-    for (; i < list.n; ++i) {
-        const std::uint8_t* row = work.GetScanLine(list.p[i].pixel);
-        if (row != nullptr) {
-            AddFloatRows<1>(&row, list.weights + i, sums.data(), sums.size());
-        }
-    }
-}
-
-/// FilterColumns for bytes, the same bytes.
+/// FilterColumns for bytes, the same bytes. The rows of a list are read side by side, so the
+/// plane must not be file-backed.
 template <bool kGrayToColor>
 void FilterColumnsFast(TZmBitmap& work, TZmBitmap& target, const TTapTable& contrib,
                        TPercentReporter& reporter) {
-    std::vector<float> sums =
-        MakeWorkBuffer<float>(static_cast<std::int64_t>(work.GetWidth()) * work.GetChannelCount());
+    const std::int64_t count = std::int64_t{work.GetWidth()} * work.GetChannelCount();
+    std::vector<std::uint8_t> gray = MakeWorkBuffer<std::uint8_t>(kGrayToColor ? count : 0);
+    std::vector<const std::uint8_t*> rows;
+    std::vector<float> weights;
     for (std::int32_t y = 0; y < target.GetHeight(); ++y) {
         const TCList list = contrib[y];
-        SumRowsFast(work, list, sums);
+        rows.clear();
+        weights.clear();
+        for (std::int32_t i = 0; i < list.n; ++i) {
+            if (const std::uint8_t* row = work.GetScanLine(list.p[i].pixel); row != nullptr) {
+                rows.push_back(row);
+                weights.push_back(list.weights[i]);
+            }
+        }
         std::uint8_t* out = target.GetScanLine(y);
         if (out == nullptr) {
             continue;
         }
-        const TQuotient quotient(list.divisor);
-        if constexpr (kGrayToColor) {
-            for (const float sum : sums) {
-                out = std::fill_n(out, 3, quotient(sum));
-            }
-        } else {
-            for (std::size_t i = 0; i < sums.size(); ++i) {
-                out[i] = quotient(sums[i]);
-            }
+        const TWeightedRows mixed{rows.data(), weights.data(), rows.size(),
+                                  TQuotient(list.divisor)};
+        MixByteRows(mixed, static_cast<std::size_t>(count), kGrayToColor ? gray.data() : out);
+        for (const std::uint8_t value : gray) {
+            out = std::fill_n(out, 3, value);
         }
         reporter.Report(static_cast<std::int64_t>(y) + work.GetHeight() + 1);
     }
@@ -370,8 +393,8 @@ void FilterColumns(TZmBitmap& work, TZmBitmap& target, const TTapTable& contrib,
 /// What all horizontal workers share.
 struct TResampleHorizSharedFields {
     std::int32_t ThreadsCount = 1;
-    TResampleForm form = TResampleForm::kPlain;
     const TTapTable* contrib = nullptr;
+    const TPairTable* pairs = nullptr;  ///< nil where the plain form is to run
     TZmBitmap* Src = nullptr;
     TZmBitmap* Work = nullptr;
     TPercentReporter* reporter = nullptr;
@@ -394,25 +417,55 @@ public:
           thread_index_(thread_index) {}
 
     void Execute() override {
-        const std::int32_t width = shared_.Src->GetWidth();
-        TFloatRow room = MakeFloatRow(*shared_.contrib, width, 3, shared_.form);
+        if (shared_.pairs != nullptr) {
+            FilterByPairs(*shared_.pairs);
+            return;
+        }
         for (std::int32_t y = start_y_; y < start_y_ + row_count_; ++y) {
-            const auto row = static_cast<std::size_t>(y);
-            const bool collected = !shared_.src_rows.empty();
-            const std::uint8_t* in =
-                collected ? shared_.src_rows[row] : shared_.Src->GetScanLine(y);
-            std::uint8_t* out = collected ? shared_.work_rows[row] : shared_.Work->GetScanLine(y);
+            const std::uint8_t* in = SourceRow(y);
+            std::uint8_t* out = WorkRow(y);
             if (in != nullptr && out != nullptr) {
-                FilterByteRow<3>(in, width, out, *shared_.contrib, room);
+                FilterRow<std::uint8_t, 3>(in, out, *shared_.contrib);
             }
-            if (thread_index_ == 0) {
-                const std::int64_t rows = static_cast<std::int64_t>(shared_.ThreadsCount) * y;
-                shared_.reporter->Report(rows + 1);
-            }
+            Report(y);
         }
     }
 
 private:
+    void FilterByPairs(const TPairTable& pairs) {
+        TPairFilter filter(pairs, shared_.Src->GetWidth());
+        const auto at_once = static_cast<std::int32_t>(PairRowsAtOnce());
+        const std::int32_t end = start_y_ + row_count_;
+        for (std::int32_t first = start_y_; first < end; first += at_once) {
+            const std::int32_t stop = std::min(first + at_once, end);
+            for (std::int32_t y = first; y < stop; ++y) {
+                if (const std::uint8_t* in = SourceRow(y); in != nullptr) {
+                    filter.Load(in, static_cast<std::size_t>(y - first));
+                }
+            }
+            filter.Filter();
+            for (std::int32_t y = first; y < stop; ++y) {
+                if (std::uint8_t* out = WorkRow(y); out != nullptr) {
+                    filter.Store(static_cast<std::size_t>(y - first), out);
+                }
+                Report(y);
+            }
+        }
+    }
+    const std::uint8_t* SourceRow(std::int32_t y) const {
+        return shared_.src_rows.empty() ? shared_.Src->GetScanLine(y)
+                                        : shared_.src_rows[static_cast<std::size_t>(y)];
+    }
+    std::uint8_t* WorkRow(std::int32_t y) const {
+        return shared_.work_rows.empty() ? shared_.Work->GetScanLine(y)
+                                         : shared_.work_rows[static_cast<std::size_t>(y)];
+    }
+    void Report(std::int32_t y) const {
+        if (thread_index_ == 0) {
+            shared_.reporter->Report(static_cast<std::int64_t>(shared_.ThreadsCount) * y + 1);
+        }
+    }
+
     const TResampleHorizSharedFields& shared_;
     std::int32_t start_y_;
     std::int32_t row_count_;
@@ -438,8 +491,12 @@ void FilterRowsOfColor(TZmBitmap& source, TZmBitmap& work, const TTapTable& cont
                        TResampleForm form, TPercentReporter& reporter) {
     TResampleHorizSharedFields shared;
     shared.ThreadsCount = CountThreads(source, work);
-    shared.form = form;
     shared.contrib = &contrib;
+    std::optional<TPairTable> pairs;
+    if (form == TResampleForm::kFast && contrib.FitsFloat()) {
+        pairs.emplace(contrib);
+        shared.pairs = &*pairs;
+    }
     shared.Src = &source;
     shared.Work = &work;
     shared.reporter = &reporter;
@@ -463,7 +520,8 @@ template <typename Sample>
 void FilterRowsOfGray(TZmBitmap& source, TZmBitmap& work, const TTapTable& contrib,
                       TResampleForm form, TPercentReporter& reporter) {
     const bool bits = source.GetPixelFormat() == zm1g;
-    TFloatRow room = MakeFloatRow(contrib, source.GetWidth(), 1, form);
+    const bool is_fast = form == TResampleForm::kFast && contrib.FitsFloat();
+    std::vector<float> numbers = MakeWorkBuffer<float>(is_fast ? source.GetWidth() : 0);
     std::vector<Sample> unpacked(bits ? static_cast<std::size_t>(source.GetWidth()) : 0);
     for (std::int32_t y = 0; y < source.GetHeight(); ++y) {
         const std::uint8_t* in = source.GetScanLine(y);
@@ -476,10 +534,13 @@ void FilterRowsOfGray(TZmBitmap& source, TZmBitmap& work, const TTapTable& contr
         }
         const auto* samples = bits ? unpacked.data() : reinterpret_cast<const Sample*>(in);
         if constexpr (sizeof(Sample) == 1) {
-            FilterByteRow<1>(samples, source.GetWidth(), out, contrib, room);
-        } else {
-            FilterRow<Sample, 1>(samples, reinterpret_cast<Sample*>(out), contrib);
+            if (is_fast) {
+                FilterGrayRowFast(samples, out, contrib, numbers);
+                reporter.Report(static_cast<std::int64_t>(y) + 1);
+                continue;
+            }
         }
+        FilterRow<Sample, 1>(samples, reinterpret_cast<Sample*>(out), contrib);
         reporter.Report(static_cast<std::int64_t>(y) + 1);
     }
 }
@@ -500,7 +561,8 @@ void FilterAllRows(TZmBitmap& source, TZmBitmap& work, const TTapTable& columns,
 
 void FilterAllColumns(TZmPixelFormat format, TZmBitmap& work, TZmBitmap& target,
                       const TTapTable& rows, TResampleForm form, TPercentReporter& reporter) {
-    const bool fast = form == TResampleForm::kFast && rows.FitsFloat();
+    const bool fast =
+        form == TResampleForm::kFast && rows.FitsFloat() && work.GetLocation() != zmFile;
     if (format == zm16g) {
         FilterColumns<std::uint16_t, false>(work, target, rows, reporter);
     } else if (format == zm1g && fast) {

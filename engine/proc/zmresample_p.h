@@ -155,11 +155,10 @@ enum class TAreaInterpolation : std::uint8_t { kLinear, kCubic };
                                      const TResampleListener& listener);
 
 /// Whether a fast form stands for the plain one here: both sides shrinking, or both enlarging
-/// (linearly without partial alpha, and not zm32RGB).
-bool HasFastArea(TZmBitmap& source, TZmBitmap& target, TZmBitmap* alpha,
-                 TAreaInterpolation interpolation);
+/// (not zm32RGB linearly).
+bool HasFastArea(TZmBitmap& source, TZmBitmap& target, TAreaInterpolation interpolation);
 /// The fast form; gives the same bytes. Only where HasFastArea says so.
-[[nodiscard]] bool ResampleAreaFast(TZmBitmap& source, TZmBitmap& target,
+[[nodiscard]] bool ResampleAreaFast(TZmBitmap& source, TZmBitmap& target, TZmBitmap* alpha,
                                     TAreaInterpolation interpolation,
                                     const TResampleListener& listener);
 
@@ -186,18 +185,38 @@ struct TContributor {
     std::int32_t weight = 0;  ///< 256 is 1.0
 };
 
-/// The taps of a row of target pixels: those of pixel x, with their weights once more as floats,
-/// from starts[x] up to starts[x + 1].
-struct TTapRow {
-    const TContributor* taps = nullptr;
-    const float* weights = nullptr;
+/// The taps of a row of target pixels as pairs of neighbouring source pixels: those of pixel x
+/// are `pairs` firsts[x] up to firsts[x + 1], the first of them starts[x] pairs from the left.
+/// A pair holds two weights of 16 bits, that of the left pixel low.
+struct TPairRow {
+    const std::int32_t* pairs = nullptr;
+    const std::size_t* firsts = nullptr;
     const std::size_t* starts = nullptr;
     const TQuotient* quotients = nullptr;
     std::size_t count = 0;
 };
-/// Filters three-byte pixels given as floats. Reads one number behind the last pixel and writes
-/// one byte behind the last one. The sums are exact within kMaxFloatSum.
-void FilterPixels24(const TTapRow& row, const float* samples, std::uint8_t* out);
+/// Rows that FilterPairs24 filters together, 1 to kMaxPairRows: the more, the wider the vectors.
+inline constexpr std::size_t kMaxPairRows = 4;
+std::size_t PairRowsAtOnce();
+/// Numbers that a pair of pixels takes in the work area: three pairs of samples and two zeros.
+inline constexpr std::size_t kPairNumbers = 8;
+/// Lays out row `slot` of the rows that are filtered together: `pairs` pairs of three-byte
+/// pixels. Reads two bytes behind the last pair.
+void SpreadPairs24(const std::uint8_t* in, std::size_t pairs, std::size_t slot, std::int16_t* area);
+/// Filters the rows laid out in `area`, which starts at a multiple of 64 bytes; row i goes to
+/// `out` + i * `out_step`, with one byte written behind the last pixel. Exact within kMaxFloatSum.
+void FilterPairs24(const TPairRow& row, const std::int16_t* area, std::uint8_t* out,
+                   std::size_t out_step);
+
+/// Rows of bytes with their weights, and the divisor of the weighted sum.
+struct TWeightedRows {
+    const std::uint8_t* const* rows = nullptr;
+    const float* weights = nullptr;
+    std::size_t row_count = 0;
+    TQuotient quotient;
+};
+/// out = the rows' weighted sum, divided and limited. Exact within kMaxFloatSum.
+void MixByteRows(const TWeightedRows& rows, std::size_t count, std::uint8_t* out);
 
 /// A span of source columns, with the reciprocal of its length.
 struct TMeanSpan {

@@ -1,6 +1,7 @@
 // Vector loops of the kernel and the Fast linear engines.
 
 #include <cstddef>
+#include <cstring>
 
 #include "engine/proc/zmresample_p.h"
 
@@ -30,54 +31,7 @@ void MeanSpans(const std::uint8_t* in, const TMeanSpan* spans, std::size_t count
     }
 }
 
-void FilterPixels(const TTapRow& row, const float* samples, std::uint8_t* out) {
-    for (std::size_t x = 0; x < row.count; ++x) {
-        float sums[3] = {};
-        for (std::size_t i = row.starts[x]; i < row.starts[x + 1]; ++i) {
-            const float* pixel = samples + static_cast<std::size_t>(row.taps[i].pixel) * 3;
-            for (std::size_t c = 0; c < 3; ++c) {
-                sums[c] += row.weights[i] * pixel[c];
-            }
-        }
-        for (const float sum : sums) {
-            *out++ = row.quotients[x](sum);
-        }
-    }
-}
-
 #else
-
-/// One tap's share of the channels of a pixel. Whole numbers: contracted or not, it is exact.
-template <class D>
-HWY_INLINE hn::Vec<D> AddTap(D tag, const TTapRow& row, std::size_t i, const float* samples,
-                             hn::Vec<D> sum) {
-    const float* pixel = samples + static_cast<std::size_t>(row.taps[i].pixel) * 3;
-    return hn::MulAdd(hn::Set(tag, row.weights[i]), hn::LoadU(tag, pixel), sum);
-}
-
-void FilterPixels(const TTapRow& row, const float* samples, std::uint8_t* out) {
-    const hn::FixedTag<float, 4> tag;
-    const hn::FixedTag<std::int32_t, 4> int_tag;
-    const hn::FixedTag<std::uint8_t, 4> byte_tag;
-    for (std::size_t x = 0; x < row.count; ++x, out += 3) {
-        auto even = hn::Zero(tag);
-        auto odd = hn::Zero(tag);
-        std::size_t i = row.starts[x];
-        const std::size_t end = row.starts[x + 1];
-        for (; i + 2 <= end; i += 2) {
-            even = AddTap(tag, row, i, samples, even);
-            odd = AddTap(tag, row, i + 1, samples, odd);
-        }
-        if (i < end) {
-            even = AddTap(tag, row, i, samples, even);
-        }
-        const TQuotient quotient = row.quotients[x];
-        auto value = hn::Add(hn::Add(even, odd), hn::Set(tag, quotient.Half()));
-        value = hn::Mul(value, hn::Set(tag, quotient.Reciprocal()));
-        value = hn::Min(hn::Max(value, hn::Zero(tag)), hn::Set(tag, 255.0f));
-        hn::StoreU(hn::DemoteTo(byte_tag, hn::ConvertTo(int_tag, value)), byte_tag, out);
-    }
-}
 
 /// The channels of a pixel side by side; the fourth lane belongs to the next pixel.
 void MeanSpans(const std::uint8_t* in, const TMeanSpan* spans, std::size_t count,
@@ -100,6 +54,154 @@ void MeanSpans(const std::uint8_t* in, const TMeanSpan* spans, std::size_t count
 }
 
 #endif
+
+// Pairs: the product of two 16-bit numbers with two others, summed to 32 bits, is one instruction
+// where bytes can be shuffled too.
+
+#if HWY_ARCH_X86 && HWY_TARGET <= HWY_SSSE3
+
+using TPairSums = hn::CappedTag<std::int32_t, kMaxPairRows * 4>;
+
+std::size_t RowsAtOnce() {
+    return hn::Lanes(TPairSums()) / 4;
+}
+
+void SpreadPairs(const std::uint8_t* in, std::size_t pairs, std::size_t slot, std::int16_t* area) {
+    const hn::Full128<std::uint8_t> tag;
+    alignas(16) static constexpr std::uint8_t kPlaces[16] = {0, 128, 3, 128, 1,   128, 4,   128,
+                                                             2, 128, 5, 128, 128, 128, 128, 128};
+    const auto places = hn::Load(tag, kPlaces);
+    const std::size_t step = RowsAtOnce() * kPairNumbers;
+    std::int16_t* out = area + slot * kPairNumbers;
+    const hn::CappedTag<std::uint8_t, 8> half_tag;
+    for (std::size_t i = 0; i < pairs; ++i, in += 6, out += step) {
+        const auto bytes = hn::ZeroExtendVector(tag, hn::LoadU(half_tag, in));
+        hn::Store(hn::TableLookupBytesOr0(bytes, places), tag,
+                  reinterpret_cast<std::uint8_t*>(out));
+    }
+}
+
+/// Limited quotients of the sums of one target pixel; a row's fourth byte belongs to the next.
+template <class D>
+HWY_INLINE void StoreQuotients(D tag, hn::Vec<D> sums, const TQuotient& quotient, std::uint8_t* out,
+                               std::size_t out_step) {
+    const hn::RebindToFloat<D> float_tag;
+    const hn::Rebind<std::uint8_t, D> byte_tag;
+    auto value = hn::Add(hn::ConvertTo(float_tag, sums), hn::Set(float_tag, quotient.Half()));
+    value = hn::Mul(value, hn::Set(float_tag, quotient.Reciprocal()));
+    value = hn::Min(hn::Max(value, hn::Zero(float_tag)), hn::Set(float_tag, 255.0f));
+    alignas(16) std::uint8_t bytes[kMaxPairRows * 4];
+    hn::Store(hn::DemoteTo(byte_tag, hn::ConvertTo(tag, value)), byte_tag, bytes);
+    for (std::size_t slot = 0; slot < hn::Lanes(tag) / 4; ++slot) {
+        std::memcpy(out + slot * out_step, bytes + slot * 4, 4);
+    }
+}
+
+void FilterPairs(const TPairRow& row, const std::int16_t* area, std::uint8_t* out,
+                 std::size_t out_step) {
+    const TPairSums tag;
+    const hn::Repartition<std::int16_t, TPairSums> pair_tag;
+    const std::size_t step = hn::Lanes(pair_tag);
+    auto unused = hn::Zero(tag);
+    const auto add_pair = [&](std::size_t i, const std::int16_t* at, auto sum) HWY_ATTR {
+        const auto weights = hn::BitCast(pair_tag, hn::Set(tag, row.pairs[i]));
+        return hn::ReorderWidenMulAccumulate(tag, hn::Load(pair_tag, at), weights, sum, unused);
+    };
+    for (std::size_t x = 0; x < row.count; ++x, out += 3) {
+        const std::int16_t* at = area + row.starts[x] * step;
+        auto even = hn::Zero(tag);
+        auto odd = hn::Zero(tag);
+        std::size_t i = row.firsts[x];
+        const std::size_t end = row.firsts[x + 1];
+        for (; i + 2 <= end; i += 2, at += 2 * step) {
+            even = add_pair(i, at, even);
+            odd = add_pair(i + 1, at + step, odd);
+        }
+        if (i < end) {
+            even = add_pair(i, at, even);
+        }
+        StoreQuotients(tag, hn::Add(even, odd), row.quotients[x], out, out_step);
+    }
+}
+
+#else
+
+std::size_t RowsAtOnce() {
+    return 1;
+}
+
+void SpreadPairs(const std::uint8_t* in, std::size_t pairs, std::size_t /*slot*/,
+                 std::int16_t* area) {
+    for (std::size_t i = 0; i < pairs; ++i, in += 6, area += kPairNumbers) {
+        for (std::size_t c = 0; c < 3; ++c) {
+            area[2 * c] = in[c];
+            area[2 * c + 1] = in[c + 3];
+        }
+    }
+}
+
+void FilterPairs(const TPairRow& row, const std::int16_t* area, std::uint8_t* out,
+                 std::size_t /*out_step*/) {
+    for (std::size_t x = 0; x < row.count; ++x) {
+        const std::int16_t* at = area + row.starts[x] * kPairNumbers;
+        std::int32_t sums[3] = {};
+        for (std::size_t i = row.firsts[x]; i < row.firsts[x + 1]; ++i, at += kPairNumbers) {
+            const auto left = static_cast<std::int16_t>(row.pairs[i] & 0xFFFF);
+            const std::int32_t right = row.pairs[i] >> 16;
+            for (std::size_t c = 0; c < 3; ++c) {
+                sums[c] += left * at[2 * c] + right * at[2 * c + 1];
+            }
+        }
+        for (const std::int32_t sum : sums) {
+            *out++ = row.quotients[x](static_cast<float>(sum));
+        }
+    }
+}
+
+#endif
+
+/// `kBlocks` vectors of samples, summed over all rows before they are stored.
+template <std::size_t kBlocks, class D>
+HWY_INLINE void MixBlocks(D tag, const TWeightedRows& rows, std::size_t first, std::uint8_t* out) {
+    const hn::Rebind<std::int32_t, D> int_tag;
+    const hn::Rebind<std::uint8_t, D> byte_tag;
+    const std::size_t lanes = hn::Lanes(tag);
+    hn::Vec<D> sums[kBlocks];
+    for (auto& sum : sums) {
+        sum = hn::Set(tag, rows.quotient.Half());
+    }
+    for (std::size_t row = 0; row < rows.row_count; ++row) {
+        const auto weight = hn::Set(tag, rows.weights[row]);
+        const std::uint8_t* const at = rows.rows[row] + first;
+        for (std::size_t k = 0; k < kBlocks; ++k) {
+            const auto bytes = hn::PromoteTo(int_tag, hn::LoadU(byte_tag, at + k * lanes));
+            sums[k] = hn::MulAdd(hn::ConvertTo(tag, bytes), weight, sums[k]);
+        }
+    }
+    for (std::size_t k = 0; k < kBlocks; ++k) {
+        auto value = hn::Mul(sums[k], hn::Set(tag, rows.quotient.Reciprocal()));
+        value = hn::Min(hn::Max(value, hn::Zero(tag)), hn::Set(tag, 255.0f));
+        hn::StoreU(hn::DemoteTo(byte_tag, hn::ConvertTo(int_tag, value)), byte_tag,
+                   out + first + k * lanes);
+    }
+}
+
+void MixRows(const TWeightedRows& rows, std::size_t count, std::uint8_t* out) {
+    constexpr std::size_t kBlocks = 4;
+    const hn::ScalableTag<float> wide;
+    const hn::CappedTag<float, 1> narrow;
+    const std::size_t lanes = hn::Lanes(wide);
+    std::size_t i = 0;
+    for (; i + kBlocks * lanes <= count; i += kBlocks * lanes) {
+        MixBlocks<kBlocks>(wide, rows, i, out);
+    }
+    for (; i + lanes <= count; i += lanes) {
+        MixBlocks<1>(wide, rows, i, out);
+    }
+    for (; i < count; ++i) {
+        MixBlocks<1>(narrow, rows, i, out);
+    }
+}
 
 template <class D>
 HWY_INLINE bool BlendVector(D tag, const TBlendRows& rows, std::size_t i, std::uint8_t* out) {
@@ -136,11 +238,28 @@ HWY_AFTER_NAMESPACE();
 namespace zm {
 
 HWY_EXPORT(BlendInts);
-HWY_EXPORT(FilterPixels);
+HWY_EXPORT(FilterPairs);
 HWY_EXPORT(MeanSpans);
+HWY_EXPORT(MixRows);
+HWY_EXPORT(RowsAtOnce);
+HWY_EXPORT(SpreadPairs);
 
-void FilterPixels24(const TTapRow& row, const float* samples, std::uint8_t* out) {
-    HWY_DYNAMIC_DISPATCH(FilterPixels)(row, samples, out);
+std::size_t PairRowsAtOnce() {
+    return HWY_DYNAMIC_DISPATCH(RowsAtOnce)();
+}
+
+void SpreadPairs24(const std::uint8_t* in, std::size_t pairs, std::size_t slot,
+                   std::int16_t* area) {
+    HWY_DYNAMIC_DISPATCH(SpreadPairs)(in, pairs, slot, area);
+}
+
+void FilterPairs24(const TPairRow& row, const std::int16_t* area, std::uint8_t* out,
+                   std::size_t out_step) {
+    HWY_DYNAMIC_DISPATCH(FilterPairs)(row, area, out, out_step);
+}
+
+void MixByteRows(const TWeightedRows& rows, std::size_t count, std::uint8_t* out) {
+    HWY_DYNAMIC_DISPATCH(MixRows)(rows, count, out);
 }
 
 void MeanSpans24(const std::uint8_t* in, const TMeanSpan* spans, std::size_t count,

@@ -1,11 +1,11 @@
 #include "engine/bitmap/zmblend.h"
 
 #include <gtest/gtest.h>
-#include <hwy/targets.h>
 
 #include <vector>
 
 #include "engine/bitmap/zmblend_p.h"
+#include "tests/support/instructionsets.h"
 
 namespace zm {
 namespace {
@@ -198,37 +198,23 @@ void MakeAllPairs(std::vector<TRGB>& source, std::vector<TRGB>& dest) {
     }
 }
 
-/// The tests of fast rows, for each set of vector instructions that this processor has.
-class FastBlend : public ::testing::TestWithParam<std::int64_t> {
-protected:
-    FastBlend() { Use(GetParam()); }
-    ~FastBlend() override { Use(0); }
-
-private:
-    static void Use(std::int64_t targets) {
-        hwy::SetSupportedTargetsForTest(targets);
-        hwy::GetChosenTarget().Update(hwy::SupportedTargets());
-    }
-};
-
-INSTANTIATE_TEST_SUITE_P(EveryInstructionSet, FastBlend,
-                         ::testing::ValuesIn(hwy::SupportedAndGeneratedTargets()));
-
-TEST_P(FastBlend, RowsEqualPlainOnesForAllChannelPairs) {
+TEST(FastBlend, RowsEqualPlainOnesForAllChannelPairs) {
     std::vector<TRGB> source;
     std::vector<TRGB> dest;
     MakeAllPairs(source, dest);
     for (int operation = 0; operation < 46; ++operation) {
         std::vector<TRGB> plain = dest;
-        std::vector<TRGB> fast = dest;
         const auto ordinal = static_cast<std::uint8_t>(operation);
         BlendRowPlain(source.data(), plain.data(), 65536, ordinal, 1);
-        BlendRow(source.data(), fast.data(), 65536, ordinal, 1);
-        ASSERT_TRUE(plain == fast) << "operation " << operation;
+        test::ForEachInstructionSet([&] {
+            std::vector<TRGB> fast = dest;
+            BlendRow(source.data(), fast.data(), 65536, ordinal, 1);
+            ASSERT_TRUE(plain == fast) << "operation " << operation;
+        });
     }
 }
 
-TEST_P(FastBlend, RowsEqualPlainOnesAtEveryWidth) {
+TEST(FastBlend, RowsEqualPlainOnesAtEveryWidth) {
     std::vector<TRGB> source;
     std::vector<TRGB> dest;
     MakeAllPairs(source, dest);
@@ -237,10 +223,12 @@ TEST_P(FastBlend, RowsEqualPlainOnesAtEveryWidth) {
         const TRGB* const to = dest.data() + 900 * width;
         for (std::uint8_t operation = 0; operation < kRenderOperationCount; ++operation) {
             TGuardedRow plain(to, width);
-            TGuardedRow fast(to, width);
             BlendRowPlain(from, plain.Get(), width, operation, 2);
-            BlendRow(from, fast.Get(), width, operation, 2);
-            ASSERT_TRUE(plain == fast) << "operation " << int{operation} << ", width " << width;
+            test::ForEachInstructionSet([&] {
+                TGuardedRow fast(to, width);
+                BlendRow(from, fast.Get(), width, operation, 2);
+                ASSERT_TRUE(plain == fast) << "operation " << int{operation} << ", width " << width;
+            });
         }
     }
 }
@@ -252,34 +240,42 @@ TEST(Blend, MixingWeighsByA256th) {
     EXPECT_EQ(77, MixChannel(200, 77, 0));
 }
 
-TEST_P(FastBlend, MixingEqualsThePlainOne) {
+/// Every rule on one row, and the even mix by its first weight.
+void ExpectSameMixes(const TRGB* from, const TRGB* to, std::vector<std::uint8_t> weights,
+                     std::int32_t width) {
+    for (const TMixRule& rule : {TMixRule{}, TMixRule{255, 40000}, TMixRule{99, 65535},
+                                 TMixRule{0, 65536}, TMixRule{180, 0}}) {
+        TGuardedRow plain(to, width);
+        TGuardedRow fast(to, width);
+        MixRowPlain(from, weights.data(), rule, plain.Get(), width);
+        MixRow(from, weights.data(), rule, fast.Get(), width);
+        ASSERT_TRUE(plain == fast) << "width " << width << ", limit " << int{rule.limit};
+    }
+    weights.assign(weights.size(), weights[0]);
+    TGuardedRow plain(to, width);
+    TGuardedRow fast(to, width);
+    MixRowPlain(from, weights.data(), TMixRule{}, plain.Get(), width);
+    MixRowEvenly(from, weights[0], fast.Get(), width);
+    ASSERT_TRUE(plain == fast) << "width " << width << ", weight " << int{weights[0]};
+}
+
+TEST(FastBlend, MixingEqualsThePlainOne) {
     std::vector<TRGB> source;
     std::vector<TRGB> dest;
     MakeAllPairs(source, dest);
-    for (std::int32_t width = 0; width <= 70; ++width) {
-        for (int seed = 0; seed < 64; ++seed) {
-            std::vector<std::uint8_t> weights(70);
-            for (std::size_t x = 0; x < weights.size(); ++x) {
-                weights[x] = static_cast<std::uint8_t>(x * 37 + static_cast<unsigned>(seed) * 4);
+    test::ForEachInstructionSet([&] {
+        for (std::int32_t width = 0; width <= 70; ++width) {
+            for (int seed = 0; seed < 64; ++seed) {
+                std::vector<std::uint8_t> weights(70);
+                for (std::size_t x = 0; x < weights.size(); ++x) {
+                    weights[x] =
+                        static_cast<std::uint8_t>(x * 37 + static_cast<unsigned>(seed) * 4);
+                }
+                ASSERT_NO_FATAL_FAILURE(ExpectSameMixes(source.data() + 900 * seed + width,
+                                                        dest.data() + 700 * seed, weights, width));
             }
-            const TRGB* const from = source.data() + 900 * seed + width;
-            const TRGB* const to = dest.data() + 700 * seed;
-            for (const TMixRule& rule : {TMixRule{}, TMixRule{255, 40000}, TMixRule{99, 65535},
-                                         TMixRule{0, 65536}, TMixRule{180, 0}}) {
-                TGuardedRow plain(to, width);
-                TGuardedRow fast(to, width);
-                MixRowPlain(from, weights.data(), rule, plain.Get(), width);
-                MixRow(from, weights.data(), rule, fast.Get(), width);
-                ASSERT_TRUE(plain == fast) << "width " << width << ", limit " << int{rule.limit};
-            }
-            weights.assign(70, weights[0]);
-            TGuardedRow plain_even(to, width);
-            TGuardedRow fast_even(to, width);
-            MixRowPlain(from, weights.data(), TMixRule{}, plain_even.Get(), width);
-            MixRowEvenly(from, weights[0], fast_even.Get(), width);
-            ASSERT_TRUE(plain_even == fast_even) << "width " << width;
         }
-    }
+    });
 }
 
 }  // namespace

@@ -12,41 +12,13 @@
 #include "engine/bitmap/zmpixelformats.h"
 #include "engine/bitmap/zmrowconvert.h"
 #include "engine/bitmap/zmrowconvert_fast_p.h"
+#include "tests/support/instructionsets.h"
 
 namespace zm::test {
 namespace {
 
 constexpr std::uint8_t kGuard = 0xA5;
 constexpr std::size_t kGuardBytes = 80;  // more than a vector
-
-/// All of the library's sets that this processor has, one after the other; the best one again
-/// when the object goes.
-class TEachTarget {
-public:
-    TEachTarget() : all_(hwy::SupportedTargets()) {}
-    ~TEachTarget() { Use(0); }
-    TEachTarget(const TEachTarget&) = delete;
-    TEachTarget& operator=(const TEachTarget&) = delete;
-
-    template <typename Body>
-    void Run(Body&& body) {
-        for (std::int64_t left = all_; left != 0; left &= left - 1) {
-            Use(left & -left);
-            SCOPED_TRACE(::testing::Message() << "instruction set " << (left & -left));
-            body();
-            if (::testing::Test::HasFatalFailure()) {
-                return;
-            }
-        }
-    }
-
-private:
-    static void Use(std::int64_t targets) {
-        hwy::SetSupportedTargetsForTest(targets);
-        hwy::GetChosenTarget().Update(hwy::SupportedTargets());
-    }
-    std::int64_t all_;
-};
 
 std::vector<std::uint8_t> Noise(std::size_t count, std::uint32_t seed) {
     std::vector<std::uint8_t> bytes(count);
@@ -104,7 +76,7 @@ TEST(FastRows, GiveTheBytesOfThePlainOnes) {
     const std::vector<TRGB> palette = NoisePalette();
     TZmRowContext context;
     context.palette = palette.data();
-    TEachTarget().Run([&] {
+    ForEachInstructionSet([&] {
         for (const TPair& pair : kFastPairs) {
             for (std::int32_t width = 0; width <= 70; ++width) {
                 for (std::size_t shift = 0; shift < 4; ++shift) {
@@ -128,6 +100,9 @@ TEST(FastRows, AreChosenByWhatTheProcessorHas) {
     EXPECT_EQ((targets & HWY_SSSE3) != 0, __builtin_cpu_supports("ssse3") != 0);
     EXPECT_EQ((targets & HWY_AVX2) != 0, has_avx2);
     EXPECT_EQ((targets & HWY_AVX3) != 0, has_avx512);
+    if (__builtin_cpu_supports("avx512vbmi") == 0) {
+        EXPECT_EQ(targets & HWY_AVX3_DL, 0);
+    }
 }
 
 TEST(FastRows, AreThereWhereTheProcessorHasByteShuffles) {
@@ -147,7 +122,7 @@ TEST(FastGray, FollowsEveryWeight) {
         {21, 71, 8},  {100, 0, 0}, {0, 0, 100},  {0, 257, 0}, {257, 0, 0},  {85, 86, 86},
         {86, 86, 86}, {0, 0, 0},   {30, 59, 11}, {258, 0, 0}, {-1, 101, 0}, {70000, 3, 3},
     };
-    TEachTarget().Run([&] {
+    ForEachInstructionSet([&] {
         for (const auto& weights : kWeights) {
             TZmRowContext context;
             context.red_coef = weights[0];
@@ -166,7 +141,7 @@ TEST(FastGray, OfAllReds_AllGreensAndEveryThirdBlue) {
     std::vector<std::uint8_t> actual(expected.size());
     const auto width = static_cast<std::int32_t>(expected.size());
     const TZmRowContext context;
-    TEachTarget().Run([&] {
+    ForEachInstructionSet([&] {
         for (int red = 0; red < 256; ++red) {
             row.clear();
             for (int green = 0; green < 256; ++green) {
@@ -192,7 +167,7 @@ TEST(FastGray, OfPureColoursIsTheirWeight) {
         row.insert(row.end(), colors.begin(), colors.end());
     }
     std::vector<std::uint8_t> gray(256);
-    TEachTarget().Run([&] {
+    ForEachInstructionSet([&] {
         FindRowFunction(zm24RGB, zm8g)(row.data(), gray.data(), 256, TZmRowContext{});
         for (std::size_t i = 0; i < gray.size(); i += 4) {
             ASSERT_EQ(gray[i], 53);
@@ -219,7 +194,7 @@ void ExpectSameBits(TBitRow plain, TBitRow fast, std::int32_t width, std::size_t
 }
 
 TEST(FastBits, GiveTheBitsOfThePlainOnes) {
-    TEachTarget().Run([&] {
+    ForEachInstructionSet([&] {
         for (const std::int32_t width :
              {0, 1, 7, 8, 9, 15, 16, 17, 31, 32, 33, 63, 64, 65, 70, 127, 128, 200, 1003}) {
             for (std::int32_t y = 0; y < 9; ++y) {

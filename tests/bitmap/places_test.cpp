@@ -71,6 +71,7 @@ void LoadRaw(TZmBitmap& bitmap, const TBytes& bytes) {
 }
 
 void CopyThroughMask(TScene& scene) {
+    const TBlockLimit all_blocks(-1);  // a mask has no fragments
     TZmMask mask;
     scene.subject.CopyToTZmMask(mask);
     mask.CopyZmBitmap(&scene.other, &scene.subject, 2, 3);

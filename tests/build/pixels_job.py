@@ -1,5 +1,5 @@
 #!/usr/bin/env python3
-"""Crop and border jobs on 1-bit, palette and alpha pictures, checked pixel by pixel against what
+"""Crop, quarter turn and border jobs on 1-bit, palette and alpha pictures, checked pixel by pixel against what
 ImageMagick reads from the source and from the result.
 
     pixels_job.py QVRUN WORK-DIR
@@ -22,6 +22,8 @@ l={CROP[0]}
 t={CROP[1]}
 r={CROP[2]}
 b={CROP[3]}
+[Rotate Image]
+angle=90
 [Add Border to Image]
 l={BORDER[0]}
 t={BORDER[1]}
@@ -80,9 +82,10 @@ def read_pixels(path, size):
 
 
 def expected(source, border_colour):
-    """The crop and the border, worked out on the source's pixels."""
+    """The crop, the turn and the border, worked out on the source's pixels."""
     left, top, right, bottom = CROP
     inner = [row[left:SIZE[0] + right] for row in source[top:SIZE[1] + bottom]]
+    inner = [list(column) for column in zip(*reversed(inner))]  # clockwise
     width = len(inner[0]) + BORDER[0] + BORDER[2]
     rows = [[border_colour] * width for _ in range(BORDER[1])]
     rows += [[border_colour] * BORDER[0] + row + [border_colour] * BORDER[2] for row in inner]

@@ -24,4 +24,9 @@ public:
     std::int64_t PeakBytes() const;
 };
 
+// What the stand-in of the allocator tells: whether the present allocation is to fail, and bytes
+// that came into use or, negative, went out of it.
+bool AllocationFails();
+void CountAllocated(std::int64_t bytes);
+
 }  // namespace zm::test

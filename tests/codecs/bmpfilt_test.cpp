@@ -33,15 +33,6 @@ TBytes Dword(std::uint32_t value) {
             static_cast<std::uint8_t>(value >> 16), static_cast<std::uint8_t>(value >> 24)};
 }
 
-// A stream that gives at most three bytes a call.
-class TShortReadStream : public TMemoryStream {
-public:
-    using TMemoryStream::TMemoryStream;
-    std::int32_t Read(void* buffer, std::int32_t count) override {
-        return TMemoryStream::Read(buffer, std::min(count, 3));
-    }
-};
-
 struct TReadOptions {
     bool native = false;
     bool ignore_alpha = false;
@@ -74,7 +65,6 @@ void Read(const TBytes& bytes, TReadResult& result, const TReadOptions& options 
 }
 
 const TRGB kBlack{0, 0, 0};
-const TRGB kWhite{255, 255, 255};
 
 // 2 x 2 pixels of 24 bits, bottom row first.
 const TBytes kFile24 = {
@@ -626,18 +616,6 @@ TEST(BmpReader, OffsetCountsFromTheStreamsPositionAndPixelsAreConsumed) {
     EXPECT_EQ(stream.GetPosition(), 73);
 }
 
-TEST(BmpReader, ShortReadsDoNotMatter) {
-    for (const TBytes& bytes : {kFile24, kFileRle8}) {
-        TReadResult whole;
-        Read(bytes, whole);
-        TShortReadStream stream(bytes);
-        TReadResult pieces;
-        ReadFrom(stream, pieces);
-        ASSERT_FALSE(pieces.failed);
-        test::ExpectSamePixels(whole.bitmap, pieces.bitmap);
-    }
-}
-
 // Rows long enough to be read without the buffer, with padding at their end.
 TEST(BmpReader, LongRows) {
     constexpr std::int32_t kWidth = 1501;
@@ -679,19 +657,6 @@ TEST(BmpReader, StopsWhenToldAndReportsEachPercentOnce) {
             EXPECT_EQ(seen, (std::vector<std::int32_t>{25, 50, 75}));
         }
     }
-}
-
-TEST(BmpReader, SecondReadEqualsTheFirst) {
-    TReadResult first;
-    Read(kFileRle8, first);
-    TReadResult second;
-    Read(kFile24, second);
-    Read(kFileRle8, second);
-    ASSERT_FALSE(second.failed);
-    test::ExpectSamePixels(first.bitmap, second.bitmap);
-    EXPECT_EQ(second.At(0, 0), (TRGB{40, 50, 60}));
-    EXPECT_EQ(second.At(1, 0), (TRGB{10, 20, 30}));
-    EXPECT_NE(second.At(1, 0), kWhite);
 }
 
 }  // namespace

@@ -349,27 +349,6 @@ TEST(JpegReader, HostileFiles) {
     EXPECT_TRUE(empty.progress.aborting);
 }
 
-TEST(JpegReader, AbortAtEveryStepAndRaisingStreams) {
-    TRawSettings settings;
-    settings.height = 10;
-    const TBytes file = EncodeRawJpeg(settings);
-    for (int step = 1; step <= 10; ++step) {
-        TTestProgress progress(step);
-        TLoaded loaded;
-        TBorrowedMemoryStream stream(file.data(), static_cast<std::int64_t>(file.size()));
-        ReadJPEGStream(stream, loaded.bitmap, {}, progress.record, loaded.params);
-        EXPECT_TRUE(progress.aborting);
-        EXPECT_EQ(progress.percents.size(), static_cast<std::size_t>(step));
-    }
-    for (const std::int64_t good : {std::int64_t{0}, static_cast<std::int64_t>(file.size()) - 1}) {
-        TRaisingStream stream(file, good);
-        TLoaded loaded;
-        EXPECT_NO_THROW(
-            ReadJPEGStream(stream, loaded.bitmap, {}, loaded.progress.record, loaded.params));
-        EXPECT_TRUE(loaded.progress.aborting);
-    }
-}
-
 TEST(JpegMessages, NumbersAndTexts) {
     EXPECT_EQ(JpegMessageText(0), "Bogus message code ?");
     EXPECT_EQ(JpegMessageText(6), "Invalid crop request");

@@ -1,5 +1,6 @@
 #include <gtest/gtest.h>
 
+#include <algorithm>
 #include <array>
 #include <string>
 
@@ -197,6 +198,58 @@ TEST(JpegMetadata, IptcAndXmpAreReadAndNotWhenUnwanted) {
         EXPECT_TRUE(without.params.fXMP_Info.empty());
         EXPECT_EQ(without.params.fJPEG_MarkerList.Count(), 3);
     }
+}
+
+TBytes Exchanged(const TBytes& file, TJpegBlock block, const TBytes& data) {
+    TMemoryStream input(file);
+    TMemoryStream output;
+    EXPECT_TRUE(ExchangeJpegBlock(input, output, block, data));
+    return output.Bytes();
+}
+
+TEST(JpegExchange, ABlockTakesThePlaceOfTheOldOnesAndAllElseStays) {
+    const TBytes old_iptc = BytesOfText("Photoshop 3.0 old");
+    const TBytes new_iptc = BytesOfText("Photoshop 3.0 new");
+    const TBytes other = BytesOfText("Adobe_CM");
+    const TBytes comment = BytesOfText("comment");
+    const TBytes xmp = BytesOfText(std::string("http://ns.adobe.com/xap/1.0/\0<x/>", 33));
+    const TBytes file =
+        FileWith({{0xFE, comment}, {0xED, old_iptc}, {0xED, other}, {0xE1, xmp}, {0xED, old_iptc}});
+    const TBytes without = FileWith({{0xFE, comment}, {0xED, other}, {0xE1, xmp}});
+    const TBytes with = FileWith({{0xED, new_iptc}, {0xFE, comment}, {0xED, other}, {0xE1, xmp}});
+    EXPECT_EQ(Exchanged(file, kJpegBlockIptc, new_iptc), with);
+    EXPECT_EQ(Exchanged(without, kJpegBlockIptc, new_iptc), with);
+    EXPECT_EQ(Exchanged(file, kJpegBlockIptc, {}), without);
+
+    const TBytes exif = ExifMarker(6);
+    const TBytes with_exif = FileWith({{0xE1, exif}, {0xFE, comment}, {0xED, other}, {0xE1, xmp}});
+    EXPECT_EQ(Exchanged(without, kJpegBlockExif, exif), with_exif);
+    TBytes junk_in_front{1, 2, 3};
+    junk_in_front.insert(junk_in_front.end(), with_exif.begin(), with_exif.end());
+    EXPECT_EQ(Exchanged(junk_in_front, kJpegBlockExif, {}), without);
+}
+
+TEST(JpegExchange, WhatIsCutOrFullFails) {
+    const TBytes file = FileWith({{0xFE, BytesOfText("comment")}});
+    const TBytes scan_mark{0xFF, 0xDA};
+    const auto scan = std::search(file.begin(), file.end(), scan_mark.begin(), scan_mark.end());
+    const TBytes iptc = BytesOfText("Photoshop 3.0");
+    for (std::size_t length = 0; length < static_cast<std::size_t>(scan - file.begin()); ++length) {
+        TMemoryStream input(FirstBytes(file, length));
+        TMemoryStream output;
+        ASSERT_FALSE(ExchangeJpegBlock(input, output, kJpegBlockIptc, iptc)) << length;
+        TMemoryStream whole(file);
+        TFullStream full(static_cast<std::int64_t>(length), /*raises=*/false);
+        ASSERT_FALSE(ExchangeJpegBlock(whole, full, kJpegBlockIptc, iptc)) << length;
+    }
+    TBytes short_length = file;
+    short_length[4] = short_length[5] = 0;  // of the first segment
+    TMemoryStream output;
+    TMemoryStream damaged(short_length);
+    EXPECT_FALSE(ExchangeJpegBlock(damaged, output, kJpegBlockIptc, iptc));
+    TMemoryStream input(file);
+    EXPECT_FALSE(ExchangeJpegBlock(input, output, kJpegBlockIptc, TBytes(65534)));
+    EXPECT_EQ(Exchanged(file, kJpegBlockIptc, TBytes(65533)).size(), file.size() + 65537);
 }
 
 TEST(JpegProfile, PiecesAreJoinedByNumberAndCutAgain) {

@@ -396,21 +396,12 @@ TEST(PngReader, HugeCompressedTextsAreLeftOut) {
     ExpectColors(picture, loaded.bitmap);
 }
 
-TEST(PngReader, AbortAtEveryStepAndProgressInOrder) {
+TEST(PngReader, ProgressTellsEachPercentOnce) {
     const TBytes file = TPngPicture{3, 10, 8, 2, false, {}, {}}.Build();
     TLoaded whole;
     Load(whole, file);
     EXPECT_EQ(whole.progress.percents,
               (std::vector<std::int32_t>{10, 20, 30, 40, 50, 60, 70, 80, 90, 100}));
-    for (int step = 1; step <= 10; ++step) {
-        TTestProgress progress(step);
-        TZmBitmap bitmap;
-        TIOParams params;
-        TBorrowedMemoryStream stream(file.data(), static_cast<std::int64_t>(file.size()));
-        ReadPNGStream(stream, bitmap, params, /*params_only=*/false, progress.record);
-        EXPECT_TRUE(progress.aborting);
-        EXPECT_EQ(progress.percents.size(), static_cast<std::size_t>(step));
-    }
 }
 
 TEST(PngReader, StreamStandsBehindTheImageAndASecondLoadIsEqual) {
@@ -435,17 +426,6 @@ TEST(PngReader, AnOldAlphaPlaneDoesNotStay) {
     ASSERT_TRUE(loaded.bitmap.HasAlphaChannel());
     Load(loaded, TPngPicture{4, 4, 8, 2, false, {}, {}}.Build());
     EXPECT_FALSE(loaded.bitmap.HasAlphaChannel());
-}
-
-TEST(PngReader, RaisingStreamsEndAsFailure) {
-    const TBytes file = TPngPicture{40, 40, 8, 2, false, {}, {}}.Build();
-    for (const std::int64_t good : {std::int64_t{0}, static_cast<std::int64_t>(file.size()) - 1}) {
-        TRaisingStream stream(file, good);
-        TLoaded loaded;
-        EXPECT_NO_THROW(
-            ReadPNGStream(stream, loaded.bitmap, loaded.params, false, loaded.progress.record));
-        EXPECT_TRUE(loaded.progress.aborting);
-    }
 }
 
 }  // namespace

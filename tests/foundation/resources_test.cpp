@@ -218,8 +218,8 @@ TEST_F(Resources, FilesThatAreNoModulesHaveNone) {
 std::size_t ReadAll(const TBytes& bytes) {
     TBorrowedMemoryStream module(bytes.data(), static_cast<std::int64_t>(bytes.size()));
     std::size_t total = 0;
-    for (const TPeResourceType& type : ReadPeResources(module)) {
-        for (const TPeResource& resource : type.resources) {
+    for (const platform::TResourceType& type : ReadPeResources(module)) {
+        for (const platform::TResource& resource : type.resources) {
             total += ReadPeResourceData(module, resource).size() + resource.name.text.size();
         }
     }
@@ -237,6 +237,18 @@ TEST_F(Resources, CutAndSpoiltModulesGiveAtMostWhatIsThere) {
             TBytes spoilt = whole;
             spoilt[at] = static_cast<std::uint8_t>(value);
             EXPECT_LE(ReadAll(spoilt), 4 * whole.size()) << at;
+        }
+    }
+}
+
+TEST_F(Resources, SpoiltHeadersDoNoHarmThroughTheSystem) {
+    const TBytes whole = ModuleWith(ResourceTree(), false);
+    for (std::size_t at = 0x58; at < kTreeStart + 0x28; ++at) {  // to the end of the types
+        TBytes spoilt = whole;
+        spoilt[at] = 0xFF;
+        const TZmResourceExtractor extractor(Written(spoilt));
+        for (std::int32_t type = 0; type < extractor.GetTypesCount(); ++type) {
+            EXPECT_LE(extractor.GetBuffer(type, 0).size(), whole.size()) << at;
         }
     }
 }

@@ -51,8 +51,10 @@ TEST_F(QvRun, RunsTheJobOncePerFile) {
     SavePicture("a.png", 40, 20);
     SavePicture("b.png", 20, 40);
     const std::string job = WriteText("small.qvjob", kSmallJob);
-    const TProcessResult result = Run("run " + job + " " + Path("a.png") + " " + Path("b.png") +
-                                      " --jobs 2 --set side=10 --output " + Path("made/here"));
+    // Settings take one word each, also in front of files.
+    const TProcessResult result =
+        Run("run " + job + " --jobs 2 --output " + Path("made/here") +
+            " --set side=10 --set more=1 " + Path("a.png") + " " + Path("b.png"));
     ASSERT_EQ(result.exit_status, 0) << result.standard_error;
     EXPECT_NE(result.standard_error.find("2 done, 0 failed"), std::string::npos);
     TZmBitmap small;

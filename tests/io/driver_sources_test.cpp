@@ -9,6 +9,7 @@
 #include "engine/foundation/zmstreams.h"
 #include "engine/io/zalmoio.h"
 #include "engine/io/zmfileformats.h"
+#include "engine/metadata/zmmetahooks.h"
 #include "tests/support/testfiles.h"
 #include "tests/support/testimages.h"
 
@@ -232,6 +233,67 @@ TEST_F(DriverSources, TextForms) {
     ASSERT_TRUE(io_->SaveToText(folder_.Name("a.txt"), ioWBMP, zmtfBase64));
     EXPECT_EQ(8u, test::ReadFileBytes(folder_.File("a.txt")).size());
     EXPECT_THROW(io_->SaveToText(hex, ioWBMP, static_cast<TZmTextFormat>(9)), EZmException);
+}
+
+TEST_F(DriverSources, MetadataIsPutIntoAFileThatStaysAsItIs) {
+    const std::u16string name = folder_.Name("a.jpg");
+    ASSERT_TRUE(io_->SaveToFileJpeg(name));
+    const TBytes plain = test::ReadFileBytes(folder_.File("a.jpg"));
+    TIOParams& params = *io_->GetParams();
+    params.WriteIPTCField(2, 120, "Sea");
+    ASSERT_TRUE(io_->InjectJpegIPTC(name));
+    TBytes exif{'E', 'x', 'i', 'f', 0, 0, 'I', 'I'};
+    params.fJPEG_MarkerList.AddMarker(kMarkerApp1, exif);
+    ASSERT_TRUE(io_->InjectJpegEXIF(name));
+    TIOParams told;
+    ASSERT_TRUE(told.Read(name, std::int32_t{ioJPEG}));
+    EXPECT_EQ("Sea", told.ReadIPTCField(2, 120));
+    EXPECT_EQ(1, told.fJPEG_MarkerList.GetMarkerType(0) == kMarkerApp1 ? 1 : 0);
+    params.ResetInfo();
+    ASSERT_TRUE(io_->InjectJpegEXIF(name));
+    ASSERT_TRUE(io_->InjectJpegIPTC(name));
+    EXPECT_EQ(plain, test::ReadFileBytes(folder_.File("a.jpg")));
+
+    EXPECT_THROW(io_->InjectJpegIPTC(folder_.Name("none.jpg")), EFOpenError);
+    EXPECT_TRUE(io_->GetAborting());
+    test::WriteFileBytes(folder_.File("a.jpg"), {1, 2, 3});
+    EXPECT_FALSE(io_->InjectJpegEXIF(name));
+    EXPECT_EQ((TBytes{1, 2, 3}), test::ReadFileBytes(folder_.File("a.jpg")));
+    EXPECT_EQ((std::vector<std::string>{"a.jpg"}), test::ListFolder(folder_.Path()));
+}
+
+int g_prepared = 0;
+
+TEST_F(DriverSources, MarkersArePreparedOnceBeforeAJpegOnly) {
+    MetadataHooks().prepare_jpeg_markers = [](TIOParams& params) {
+        ++g_prepared;
+        params.fJPEG_MarkerList.SetMarker(kMarkerComment, TBytes{'h', 'i'});
+    };
+    g_prepared = 0;
+    SavedAs(ioPNG);
+    EXPECT_EQ(0, g_prepared);
+    const TBytes bytes = SavedAs(ioJPEG);
+    MetadataHooks() = {};
+    EXPECT_EQ(1, g_prepared);
+    TIOParams told;
+    ASSERT_TRUE(told.Read(bytes.data(), static_cast<std::int64_t>(bytes.size()), ioJPEG));
+    EXPECT_EQ(2,
+              told.fJPEG_MarkerList.GetMarkerLength(told.fJPEG_MarkerList.IndexOf(kMarkerComment)));
+}
+
+TEST_F(DriverSources, ThumbnailsAreMadeOfTheAttachedBitmap) {
+    TIOParams& params = *io_->GetParams();
+    ASSERT_TRUE(image_->SetPixelFormat(zm8g));
+    image_->Fill(99.0);
+    ASSERT_TRUE(params.UpdateEXIFThumbnail(5, 4, rfTriangle));
+    EXPECT_EQ(zm24RGB, params.fEXIF_Bitmap->GetPixelFormat());
+    EXPECT_EQ(5, params.fEXIF_Bitmap->GetWidth());
+    EXPECT_EQ(4, params.fEXIF_Bitmap->GetHeight());
+    EXPECT_EQ((TRGB{99, 99, 99}), params.fEXIF_Bitmap->GetPixels_zm24RGB(4, 3));
+    EXPECT_FALSE(params.UpdateEXIFThumbnail(0, 4, rfTriangle));
+    EXPECT_FALSE(params.UpdateEXIFThumbnail(2147483647, 2147483647, rfNone));
+    EXPECT_EQ(5, params.fEXIF_Bitmap->GetWidth());
+    EXPECT_FALSE(TIOParams().UpdateEXIFThumbnail(5, 4, rfTriangle));
 }
 
 TEST_F(DriverSources, WhatNeedsAViewOrAScreenFails) {

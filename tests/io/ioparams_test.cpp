@@ -133,6 +133,33 @@ TEST_F(IOParams, ResetInfoWithASetForgetsThatOnly) {
     EXPECT_EQ(TZmMetaInfoItems(zmrEXIF), params.ContainsInfo());
 }
 
+TEST_F(IOParams, ResetInfoForgetsTheKeptPngChunksOfItsKinds) {
+    struct {
+        TZmMetaInfoItem item;
+        std::string left;
+    } const cases[] = {{zmrEXIF, "pxt"},
+                       {zmrICC, "ext"},
+                       {zmrXMP, "ept"},
+                       {zmrOtherTextMeta, "epx"},
+                       {zmrIPTC, "epxt"}};
+    for (const auto& one : cases) {
+        TIOParams params;
+        params.fPNG_Chunks.Add({kPngChunkExif, "e", "", "", {}});
+        params.fPNG_Chunks.Add({kPngChunkProfile, "p", "", "", {}});
+        params.fPNG_Chunks.Add({kPngChunkText, "XML:com.adobe.xmp", "", "x", {}});
+        params.fPNG_Chunks.Add({kPngChunkText, "t", "", "", {}});
+        params.ResetInfo(TZmMetaInfoItems(one.item));
+        std::string left;
+        for (std::int32_t i = 0; i < params.fPNG_Chunks.Count(); ++i) {
+            const TZmPngChunk& chunk = params.fPNG_Chunks[i];
+            left += chunk.translated_key.empty() ? chunk.key : chunk.translated_key;
+        }
+        EXPECT_EQ(one.left, left) << one.item;
+        params.ResetInfo();
+        EXPECT_EQ(0, params.fPNG_Chunks.Count());
+    }
+}
+
 TEST_F(IOParams, ResetExifTakesOutTheFirstExifMarkerOnly) {
     TIOParams params;
     FillInfo(params);

@@ -123,7 +123,6 @@ TEST_F(Threads, AWorkIsStoppedFromOutside) {
     EXPECT_TRUE(io_->GetAborting());
 
     EXPECT_TRUE(StartSlow());
-    EXPECT_TRUE(StartSlow());
     io_->WaitThreads(/*abort_all=*/true);
     EXPECT_EQ(0, io_->GetThreadsCount());
     EXPECT_TRUE(io_->GetAborting());

@@ -12,6 +12,8 @@
 #include "engine/foundation/zmstrings.h"
 #include "engine/io/zmfiletypes.h"
 #include "engine/io/zmioparams.h"
+#include "engine/platform/clipboard.h"
+#include "engine/platform/files.h"
 #include "plugin/AFPlugin_p.h"
 #include "tests/plugin/testhost.h"
 #include "tests/support/testfiles.h"
@@ -91,9 +93,19 @@ TEST_F(ActionsTest, OpenReportsWhatFailedAndKeepsTheEarlierImage) {
         EXPECT_FALSE(Exec(gaOpenImage, u"image_file=" + broken));
         ExpectReported(4, u"Cannot read image file \"" + broken + u"\"");
     }
+    ASSERT_TRUE(platform::TClipboard::Open()->Empty());
     EXPECT_FALSE(Exec(gaOpenImage, u"source=1\r\nimage_file=" + folder.Name("open1.bmp")));
     ExpectReported(4, u"Clipboard does not contain image data");
     ExpectSamePixels(*picture, *Image());
+}
+
+TEST_F(ActionsTest, TheClipboardCarriesAnImageFromJobToJob) {
+    auto picture = Open(zm24RGB, 7, 5, /*task=*/1);
+    EXPECT_TRUE(Exec(gaSaveImage, u"dest=1", 1));
+    Open(zm24RGB, 3, 4, 2);
+    EXPECT_TRUE(Exec(gaOpenImage, u"source=-1", 2));
+    ExpectSamePixels(*picture, *Image(2));
+    plugin.caller->JobStop(gaOpenImage, 2);
 }
 
 TEST_F(ActionsTest, ASecondOpenReplacesTheImage) {
@@ -106,8 +118,10 @@ TEST_F(ActionsTest, SaveReportsWhatFailed) {
     Open(zm24RGB, 7, 5);
     EXPECT_FALSE(Exec(gaSaveImage, u"format=1"));
     ExpectReported(2, u"File name is empty");
+    Open(zm24RGB, 1, 5);
     EXPECT_FALSE(Exec(gaSaveImage, u"dest=1\r\nimage_file=" + folder.Name("x.bmp")));
     ExpectReported(5, u"Cannot copy image to clipboard");
+    EXPECT_FALSE(platform::FileExists(folder.Name("x.bmp")));
     for (const char16_t* format : {u"7", u"-1", u"2147483647"}) {
         const std::u16string name = folder.Name("x.bmp");
         EXPECT_FALSE(
@@ -360,14 +374,6 @@ TEST_F(ActionsTest, RotateByNothingFailsSilently) {
     ExpectSamePixels(*picture, *Image());
 }
 
-TEST_F(ActionsTest, DrawingReportsNothing) {
-    auto picture = Open(zm24RGB, 5, 4);
-    EXPECT_FALSE(Exec(gaTextOnImage, u"text=x"));
-    EXPECT_FALSE(Exec(gaImageOnImage, u"image_file=" + folder.Name("open1.bmp")));
-    ExpectNothingReported();
-    ExpectSamePixels(*picture, *Image());
-}
-
 TEST_F(ActionsTest, ExpansionAsksTheHostOnlyForBraces) {
     EXPECT_EQ(ExpandVariables(u"plain } text"), u"plain } text");
     EXPECT_TRUE(plugin.host.expand_sizes.empty());
@@ -425,32 +431,6 @@ TEST(HostWithoutSetLastError, GetsTheLogLinesOnly) {
     EXPECT_EQ(host.Lines().size(), 1u);
     data_module.reset();
     AllowAnotherInitializeForTests();
-}
-
-bool ConfirmForm(TQVPluginParams& params) {
-    params.Clear();
-    params.SetString(u"image_file", u"chosen.png");
-    return true;
-}
-
-bool CancelForm(TQVPluginParams& params) {
-    params.Clear();
-    return false;
-}
-
-TEST_F(ActionsTest, AFormsResultGoesBackIntoTheBlock) {
-    plugin.data_module->SetActionForm(gaOpenImage, &ConfirmForm);
-    plugin.data_module->SetActionForm(gaSaveImage, &CancelForm);
-    const std::int64_t before = plugin.host.OutstandingBytes();
-    {
-        TTestStep step(plugin.host, u"image_file=old\r\nsource=1");
-        EXPECT_EQ(plugin.caller->Actions().ConfigAction(gaSaveImage, &step.params), 0);
-        EXPECT_EQ(step.Text(), u"image_file=old\r\nsource=1");
-        EXPECT_EQ(plugin.caller->Actions().ConfigAction(gaOpenImage, &step.params), -1);
-        EXPECT_EQ(step.Text(), u"image_file=chosen.png\r\n");
-        EXPECT_EQ(plugin.host.OutstandingBytes(), before + step.params.Size);
-    }
-    EXPECT_EQ(plugin.host.HeapFaults(), 0);
 }
 
 }  // namespace

@@ -226,6 +226,24 @@ TEST(ConvertToColors, ActsFrom3To1024AndSavesUndo) {
     EXPECT_TRUE(empty.IsEmpty());
 }
 
+TEST(ConvertToColors, StoppingAtAnyRowLeavesTheImage) {
+    const auto before = MakeNoise(zm24RGB, 9, 6, 4);
+    for (std::int32_t stop = 1; stop <= 6; ++stop) {
+        const auto image = MakeNoise(zm24RGB, 9, 6, 4);
+        TZalmoProc proc(image.get());
+        std::int32_t calls = 0;
+        proc.SetOnProgress([&](void*, std::int32_t) {
+            if (++calls == stop) {
+                throw EZmException("stop");
+            }
+        });
+        EXPECT_THROW(proc.ConvertTo(4, zmDithering), EZmException) << stop;
+        calls = 0;
+        EXPECT_THROW(proc.ConvertToPalette({{1, 2, 3}, {200, 100, 50}}, zmThreshold), EZmException);
+        ExpectSamePixels(*before, *image);
+    }
+}
+
 TEST(ConvertToPalette, TakesTheNearestEntries) {
     const auto image = ColorPicture({{0, 60, 130, 255}});
     AddNoiseAlpha(*image, 1);

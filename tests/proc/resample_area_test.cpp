@@ -368,7 +368,8 @@ TEST(ResampleAreaTest, EqualsAnIndependentReference) {
 constexpr TZmPixelFormat kAreaFormats[] = {zm8g, zm24RGB, zm32RGB, zm16g, zm48RGB};
 
 void CompareFastWithPlain(TZmPixelFormat format, TZmImageSize from, TZmImageSize to,
-                          TContent content, TAreaInterpolation interpolation) {
+                          TContent content, TAreaInterpolation interpolation,
+                          TZmBitmap* alpha = nullptr) {
     SCOPED_TRACE(testing::Message()
                  << PixelFormatInfo(format).name << ' ' << from.width << 'x' << from.height
                  << " to " << to.width << 'x' << to.height << " content " << int{content}
@@ -377,15 +378,18 @@ void CompareFastWithPlain(TZmPixelFormat format, TZmImageSize from, TZmImageSize
     const std::size_t mask = format == zm16g || format == zm48RGB ? 6 : 7;
     const auto offset = static_cast<std::size_t>(from.width + to.height) % 7;
     TGuardedPicture source(format, from.width, from.height, offset & mask);
-    TGuardedPicture fast(format, to.width, to.height, (offset * 3 + 1) % 7 & mask);
     FillContent(source.Bitmap(), content, static_cast<std::uint32_t>(from.width * 7 + to.width));
     TZmBitmap plain(to.width, to.height, format);
-    ASSERT_TRUE(HasFastArea(source.Bitmap(), fast.Bitmap(), nullptr, interpolation));
-    ASSERT_TRUE(ResampleAreaFast(source.Bitmap(), fast.Bitmap(), interpolation, kNobody));
-    ASSERT_TRUE(ResampleAreaPlain(source.Bitmap(), plain, nullptr, interpolation, kNobody));
-    ExpectSamePixels(plain, fast.Bitmap());
+    ASSERT_TRUE(ResampleAreaPlain(source.Bitmap(), plain, alpha, interpolation, kNobody));
+    ForSomeInstructionSets(from.width, [&] {
+        TGuardedPicture fast(format, to.width, to.height, (offset * 3 + 1) % 7 & mask);
+        ASSERT_TRUE(HasFastArea(source.Bitmap(), fast.Bitmap(), interpolation));
+        ASSERT_TRUE(
+            ResampleAreaFast(source.Bitmap(), fast.Bitmap(), alpha, interpolation, kNobody));
+        ExpectSamePixels(plain, fast.Bitmap());
+        fast.ExpectGuardsIntact();
+    });
     source.ExpectGuardsIntact();
-    fast.ExpectGuardsIntact();
 }
 
 /// All formats and both filters, but for the one combination that has no fast form.
@@ -442,16 +446,23 @@ TEST(ResampleAreaFastTest, EqualsThePlainFormOnWholeAndTiedRatios) {
     }
 }
 
-TEST(ResampleAreaFastTest, StandsAsideForPartialAlpha) {
-    const auto source = MakeNoise(zm24RGB, 6, 5, 1);
-    TZmBitmap larger(12, 10, zm24RGB);
-    TZmBitmap smaller(3, 2, zm24RGB);
-    TZmBitmap* alpha = source->GetAlphaChannel();
-    EXPECT_TRUE(HasFastArea(*source, larger, alpha, kLinear)) << "an opaque plane";
-    source->SetAlpha(5, 4, 254);
-    EXPECT_FALSE(HasFastArea(*source, larger, alpha, kLinear));
-    EXPECT_TRUE(HasFastArea(*source, smaller, alpha, kLinear));
-    EXPECT_TRUE(HasFastArea(*source, larger, alpha, kCubic)) << "which asks for no alpha";
+/// Planes with large areas and with steps everywhere.
+TEST(ResampleAreaFastTest, EqualsThePlainFormAtAlphaEdges) {
+    for (std::int32_t width = 1; width <= 33; ++width) {
+        const std::int32_t height = 1 + width * 7 % 13;
+        for (const std::int32_t levels : {2, 200}) {
+            const auto alpha = TZmBitmap::CreateAsAlphaChannel(width, height, zmMemory);
+            for (std::int32_t i = 0; i < width * height; i += 1 + i % 5) {
+                alpha->SetPixels_zm8(i % width, i / width,
+                                     static_cast<std::uint8_t>(255 - i * 37 % levels));
+            }
+            const TZmImageSize to{width * 2 + width % 3 + 1, height * 3 + width % 2 + 1};
+            CompareFastWithPlain(zm24RGB, {width, height}, to, kNoiseContent, kLinear, alpha.get());
+            CompareFastWithPlain(zm24RGB, {width, height}, {width * 4, height * 4}, kTwoLevels,
+                                 kLinear, alpha.get());
+            ASSERT_FALSE(testing::Test::HasFailure());
+        }
+    }
 }
 
 TEST(ResampleAreaTest, ProgressCountsEveryRow) {

@@ -23,14 +23,16 @@ void CompareForms(TZmPixelFormat format, TZmImageSize from, TZmImageSize to, TCo
                  << " to " << to.width << 'x' << to.height << " content " << int{content});
     const std::size_t offset = format == zm16g ? 2 : static_cast<std::size_t>(from.width) % 5;
     TGuardedPicture source(format, from.width, from.height, offset);
-    TGuardedPicture fast(format, to.width, to.height, offset);
     FillContent(source.Bitmap(), content, static_cast<std::uint32_t>(from.width * 7 + to.width));
     TZmBitmap plain(to.width, to.height, format);
-    ASSERT_TRUE(engine(source.Bitmap(), fast.Bitmap(), TResampleForm::kFast));
     ASSERT_TRUE(engine(source.Bitmap(), plain, TResampleForm::kPlain));
-    ExpectSamePixels(plain, fast.Bitmap());
+    ForSomeInstructionSets(from.width, [&] {
+        TGuardedPicture fast(format, to.width, to.height, offset);
+        ASSERT_TRUE(engine(source.Bitmap(), fast.Bitmap(), TResampleForm::kFast));
+        ExpectSamePixels(plain, fast.Bitmap());
+        fast.ExpectGuardsIntact();
+    });
     source.ExpectGuardsIntact();
-    fast.ExpectGuardsIntact();
 }
 
 /// Sizes in both directions, apart for columns and rows, for widths of 1 to 70 and extremes.

@@ -338,8 +338,7 @@ TEST_F(MaskSelectionTest, AlphaGoesBackOnlyWhereItIsNotFull) {
     EXPECT_EQ(image_.GetAlpha(0, 0), 255);
     image_.SetAlpha(2, 1, 7);
     TZmMask* mask = nullptr;
-    ASSERT_TRUE(
-        proc_.BeginImageAnalysis(TZmPixelFormatSet(), x1_, y1_, x2_, y2_, region_, mask));
+    ASSERT_TRUE(proc_.BeginImageAnalysis(TZmPixelFormatSet(), x1_, y1_, x2_, y2_, region_, mask));
     EXPECT_EQ(region_->GetAlpha(1, 0), 7) << "the copy has the alpha of its place";
     region_->Fill(1);
     proc_.EndImageAnalysis(region_);
@@ -373,8 +372,8 @@ TEST_F(MaskSelectionTest, MasksBesideTheImageAndEmptyOnes) {
 
 TEST_F(MaskSelectionTest, OperationsWithoutSelectionsWorkOnTheImage) {
     proc_.SelectMask(mask_);
-    ASSERT_TRUE(proc_.BeginImageProcessing(TZmPixelFormatSet(), x1_, y1_, x2_, y2_, u"text",
-                                           region_, 5));
+    ASSERT_TRUE(
+        proc_.BeginImageProcessing(TZmPixelFormatSet(), x1_, y1_, x2_, y2_, u"text", region_, 5));
     EXPECT_EQ(region_, &image_);
     proc_.EndImageProcessing(region_);
     proc_.Resample(2, 2, rfNone, false);

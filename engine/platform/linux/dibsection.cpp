@@ -1,21 +1,27 @@
 #include "engine/platform/dibsection.h"
 
+#include <cstdlib>
 #include <new>
-#include <vector>
+#include <utility>
 
 namespace zm::platform {
 namespace {
 
-/// There is no drawing system to share with: the pixels are the process's own.
+/// There is no drawing system to share with: the pixels are the process's own. Memory that the
+/// system hands out zeroed is not written here, so that a large picture of which little is drawn
+/// costs little.
 class TMemorySection : public TDibSection {
 public:
-    explicit TMemorySection(std::size_t pixel_bytes) : pixels_(pixel_bytes) {}
-    std::uint8_t* Bits() override { return pixels_.data(); }
+    explicit TMemorySection(std::size_t pixel_bytes)
+        : pixels_(static_cast<std::uint8_t*>(std::calloc(pixel_bytes, 1))) {}
+    ~TMemorySection() override { std::free(pixels_); }
+    bool IsValid() const { return pixels_ != nullptr; }
+    std::uint8_t* Bits() override { return pixels_; }
     void* DeviceContext() const override { return nullptr; }
     void* Handle() const override { return nullptr; }
 
 private:
-    std::vector<std::uint8_t> pixels_;
+    std::uint8_t* const pixels_;
 };
 
 }  // namespace
@@ -24,11 +30,8 @@ std::unique_ptr<TDibSection> TDibSection::Create(const void* bitmap_info, std::s
     if (bitmap_info == nullptr || pixel_bytes == 0) {
         return nullptr;
     }
-    try {
-        return std::make_unique<TMemorySection>(pixel_bytes);
-    } catch (const std::bad_alloc&) {
-        return nullptr;
-    }
+    std::unique_ptr<TMemorySection> section(new (std::nothrow) TMemorySection(pixel_bytes));
+    return section != nullptr && section->IsValid() ? std::move(section) : nullptr;
 }
 
 }  // namespace zm::platform

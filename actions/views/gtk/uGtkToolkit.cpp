@@ -1,0 +1,47 @@
+#include <gtk/gtk.h>
+
+#include <algorithm>
+
+#include "actions/views/gtk/uGtkFormView_p.h"
+#include "actions/views/gtk/uGtkModule.h"
+#include "engine/platform/callconv.h"
+
+/// The module's entry and the toolkit behind it.
+namespace zm {
+namespace {
+
+constexpr std::int32_t kMinScalePercent = 100;
+constexpr std::int32_t kMaxScalePercent = 250;
+
+class TGtkToolkit : public IActionFormToolkit {
+public:
+    bool ShowModal(IActionForm& form, const TFormShowOptions& options,
+                   std::u16string& reason) override;
+};
+
+bool TGtkToolkit::ShowModal(IActionForm& form, const TFormShowOptions& options,
+                            std::u16string& reason) {
+    if (gdk_display_get_default() == nullptr) {
+        reason = u"the display has gone.";
+        return false;
+    }
+    TFormShowOptions bounded = options;
+    bounded.scale_percent = std::clamp(options.scale_percent, kMinScalePercent, kMaxScalePercent);
+    TGtkFormView view(form, bounded);
+    view.Run();
+    return true;
+}
+
+}  // namespace
+}  // namespace zm
+
+ZM_EXPORT zm::IActionFormToolkit* ZmGtkFormToolkit(std::u16string& reason) {
+    static zm::TGtkToolkit toolkit;
+    // The locale belongs to the host: its numbers must not change because a dialog was shown.
+    gtk_disable_setlocale();
+    if (gtk_init_check(nullptr, nullptr) == FALSE) {
+        reason = u"there is no display to show it on.";
+        return nullptr;
+    }
+    return &toolkit;
+}

@@ -1,0 +1,9 @@
+#include "actions/views/uFormToolkit.h"
+
+namespace zm {
+
+TFormToolkitProvider FormToolkitProvider() {
+    return nullptr;
+}
+
+}  // namespace zm

@@ -1,0 +1,161 @@
+// Pasting: what is on the clipboard comes from anywhere. Each form is read into a bitmap of its
+// own, so that a damaged block changes nothing.
+
+#include <algorithm>
+#include <cmath>
+#include <cstdint>
+#include <memory>
+#include <new>
+#include <span>
+
+#include "engine/bitmap/zmplatformbitmap.h"
+#include "engine/canvas/zmgdiplus.h"
+#include "engine/foundation/zmnumbers.h"
+#include "engine/foundation/zmsettings.h"
+#include "engine/foundation/zmstreams.h"
+#include "engine/io/zalmoio.h"
+#include "engine/io/zmfiletypes.h"
+#include "engine/io/zmimagelimits.h"
+#include "engine/proc/zalmoproc.h"
+#include "engine/proc/zmclipboard_p.h"
+#include "engine/proc/zmresample_p.h"
+
+namespace zm {
+namespace {
+
+constexpr TColor kWhite = 0xFFFFFF;
+
+using TBlock = std::span<const std::uint8_t>;
+
+std::int64_t SizeOf(TBlock block) {
+    return static_cast<std::int64_t>(block.size());
+}
+
+bool LoadRaw(TBlock block, TZmBitmap& picture) {
+    return picture.LoadRAWFromBufferOrStream(block.data(), SizeOf(block), nullptr);
+}
+
+bool LoadPng(TBlock block, TZmBitmap& picture) {
+    return TZalmoIO::CreateFromBitmap(&picture)->LoadFromBuffer(block.data(), SizeOf(block),
+                                                                ioPNG) &&
+           !picture.IsEmpty();
+}
+
+bool LoadDib(TBlock block, TZmBitmap& picture) {
+    return picture.CopyFromDIB(block.data(), SizeOf(block));
+}
+
+/// A size in pixels within the limits that the settings put on metafiles, its proportions kept.
+TPoint LimitMetafileSize(std::int32_t width, std::int32_t height) {
+    const TZmZalmoGlobalSettings& settings = ZmGlobalSettings();
+    const double side = std::max(settings.fMaxImageEMFSize, 1);
+    const double area = std::max(settings.fMaxImageEMFMatrixSize, 1);
+    const double scale = std::min({1.0, side / width, side / height,
+                                   std::sqrt(area / (static_cast<double>(width) * height))});
+    return {std::max(TruncToInt(width * scale), 1), std::max(TruncToInt(height * scale), 1)};
+}
+
+/// Draws a metafile at its own size on white, where the system can.
+bool LoadMetafile(TBlock block, TZmBitmap& picture) {
+    TBorrowedMemoryStream stream(block.data(), SizeOf(block));
+    const TZmMetafile metafile(stream);
+    const TZmMetafileHeader& header = metafile.GetHeader();
+    if (header.type == 0 || header.width < 1 || header.height < 1) {
+        return false;
+    }
+    const TPoint size = LimitMetafileSize(header.width, header.height);
+    TZmBitmap paper;
+    if (!paper.Allocate(size.x, size.y, kWhite, /*alpha=*/255)) {
+        return false;
+    }
+    paper.RemoveAlphaChannel(/*merge=*/false, kWhite);
+    TBitmap sheet;
+    paper.CopyToTBitmap(&sheet);
+    if (sheet.GetWidth() != size.x) {
+        return false;
+    }
+    try {
+        TCanvas canvas(sheet);
+        TZmCanvas drawing(canvas, /*AntiAlias=*/true, /*UseGDIPlus=*/true, &sheet);
+        drawing.Draw(metafile, 0, 0, size.x, size.y);
+        drawing.Flush();
+    } catch (const EZmException&) {
+        return false;  // no drawing library
+    }
+    picture.CopyFromTBitmap(&sheet);
+    return !picture.IsEmpty();
+}
+
+struct TPasteForm {
+    platform::TClipboardFormat format;
+    bool (*load)(TBlock block, TZmBitmap& picture);
+};
+
+/// The first picture that can be read, or nil. Its place settings are those of `owner`.
+std::unique_ptr<TZmBitmap> ReadPicture(platform::TClipboard& clipboard, TZmBitmap& owner) {
+    const TPasteForm forms[] = {
+        {ClipboardRawFormat(), LoadRaw},
+        {ClipboardPngFormat(), LoadPng},
+        {platform::kClipboardDib, LoadDib},
+        {platform::kClipboardEnhMetafile, LoadMetafile},
+    };
+    for (const TPasteForm& form : forms) {
+        if (!clipboard.IsAvailable(form.format)) {
+            continue;
+        }
+        auto picture = std::make_unique<TZmBitmap>();
+        TakePlaceSettings(owner, *picture);
+        const auto load = [&](TBlock block) { return form.load(block, *picture); };
+        if (clipboard.UseBlock(form.format, ZmImageLimits().free_bytes, load)) {
+            return picture;
+        }
+    }
+    return nullptr;
+}
+
+}  // namespace
+
+void TZalmoProc::PasteIntoSelection(TZmBitmap& picture, bool stretch, bool merge_alpha) {
+    std::int32_t x1 = 0;
+    std::int32_t y1 = 0;
+    std::int32_t x2 = 0;
+    std::int32_t y2 = 0;
+    TZmBitmap* target = nullptr;
+    TZmMask* mask = nullptr;
+    if (!BeginImageProcessing(TZmPixelFormatSet(zm24RGB), x1, y1, x2, y2, u"Paste", target, mask,
+                              kOperationNone)) {
+        return;
+    }
+    const std::int32_t width = stretch ? x2 - x1 : std::min(x2 - x1, picture.GetWidth());
+    const std::int32_t height = stretch ? y2 - y1 : std::min(y2 - y1, picture.GetHeight());
+    picture.RenderToTZmBitmapEx(
+        target, x1, y1, width, height, 0, 0, stretch ? picture.GetWidth() : width,
+        stretch ? picture.GetHeight() : height, merge_alpha, 255, rfFastLinear, zmlNormal, 1.0);
+    EndImageProcessing(target, mask);
+}
+
+bool TZalmoProc::PasteFromClipboard(bool stretch, bool merge_alpha) {
+    RequireBitmap();
+    std::unique_ptr<TZmBitmap> picture;
+    {
+        const auto clipboard = OpenClipboardPatiently();
+        if (clipboard != nullptr) {
+            picture = ReadPicture(*clipboard, *fZmBitmap);
+        }
+    }
+    if (picture == nullptr) {
+        return false;
+    }
+    if (!fZmBitmap->IsEmpty() && (fSelected || fSelectionMask != nullptr)) {
+        PasteIntoSelection(*picture, stretch, merge_alpha);
+        return true;
+    }
+    if (fAutoUndo) {
+        SaveUndo(u"Paste", zmuImage, /*clear_redo=*/true, kOperationNone);
+    }
+    fZmBitmap->TakeOver(*picture);
+    Update();
+    return !fZmBitmap->IsEmpty();
+}
+
+}  // namespace zm

@@ -1,0 +1,116 @@
+#pragma once
+
+#include <gtest/gtest.h>
+#include <gtk/gtk.h>
+
+#include <deque>
+#include <functional>
+#include <string>
+#include <utility>
+
+/// A user of real windows: does one act after the other, each in the window that it waits for.
+namespace zm::test {
+
+inline GtkWidget* FindWidget(GtkWidget* root, const std::string& name) {
+    if (name == gtk_widget_get_name(root)) {
+        return root;
+    }
+    std::pair<const std::string*, GtkWidget*> search{&name, nullptr};
+    if (GTK_IS_CONTAINER(root)) {
+        gtk_container_forall(
+            GTK_CONTAINER(root),
+            [](GtkWidget* child, gpointer data) {
+                auto& [wanted, found] = *static_cast<decltype(search)*>(data);
+                found = found == nullptr ? FindWidget(child, *wanted) : found;
+            },
+            &search);
+    }
+    return search.second;
+}
+
+/// The shown window of this name; a window of the toolkit's own goes by its class.
+inline GtkWidget* FindWindow(const std::string& name) {
+    GList* const windows = gtk_window_list_toplevels();
+    GtkWidget* found = nullptr;
+    for (GList* node = windows; node != nullptr; node = node->next) {
+        GtkWidget* const window = GTK_WIDGET(node->data);
+        const bool is_it =
+            name == gtk_widget_get_name(window) || name == G_OBJECT_TYPE_NAME(window);
+        found = is_it && gtk_widget_get_mapped(window) != FALSE ? window : found;
+    }
+    g_list_free(windows);
+    return found;
+}
+
+inline GtkWidget* Widget(const std::string& window, const std::string& name) {
+    GtkWidget* const root = FindWindow(window);
+    GtkWidget* const found = root == nullptr ? nullptr : FindWidget(root, name);
+    EXPECT_NE(found, nullptr) << window << " has no " << name;
+    return found;
+}
+
+class TGtkUser {
+public:
+    /// True when the act is done, False to be asked again.
+    using TAct = std::function<bool(GtkWidget* window)>;
+
+    TGtkUser() : source_(g_timeout_add(5, &Step, this)) {}
+    ~TGtkUser() {
+        g_source_remove(source_);
+        EXPECT_TRUE(acts_.empty()) << "window " << acts_.front().first << " never came";
+    }
+    TGtkUser(const TGtkUser&) = delete;
+    TGtkUser& operator=(const TGtkUser&) = delete;
+
+    void WhenReady(const std::string& window, TAct act) {
+        acts_.emplace_back(window, std::move(act));
+    }
+    void In(const std::string& window, std::function<void()> act) {
+        WhenReady(window, [act = std::move(act)](GtkWidget*) {
+            act();
+            return true;
+        });
+    }
+    void Press(const std::string& window, const std::string& button) {
+        In(window, [=] { gtk_button_clicked(GTK_BUTTON(Widget(window, button))); });
+    }
+    void Respond(const std::string& window, int response) {
+        WhenReady(window, [response](GtkWidget* dialog) {
+            gtk_dialog_response(GTK_DIALOG(dialog), response);
+            return true;
+        });
+    }
+    void PressKey(const std::string& window, guint key) {
+        WhenReady(window, [key](GtkWidget* widget) {
+            GdkEvent* const event = gdk_event_new(GDK_KEY_PRESS);
+            event->key.window = GDK_WINDOW(g_object_ref(gtk_widget_get_window(widget)));
+            event->key.keyval = key;
+            gdk_event_set_device(event, gdk_seat_get_keyboard(gdk_display_get_default_seat(
+                                            gtk_widget_get_display(widget))));
+            gtk_widget_event(widget, event);
+            gdk_event_free(event);
+            return true;
+        });
+    }
+
+private:
+    /// An act may open a dialog and with it another main loop, in which the next acts come.
+    static gboolean Step(gpointer data) {
+        auto& user = *static_cast<TGtkUser*>(data);
+        GtkWidget* const window =
+            user.acts_.empty() ? nullptr : FindWindow(user.acts_.front().first);
+        if (window != nullptr) {
+            const auto act = std::move(user.acts_.front());
+            user.acts_.pop_front();
+            if (!act.second(window)) {
+                user.acts_.push_front(act);
+            }
+        }
+        return G_SOURCE_CONTINUE;
+    }
+
+    guint source_;
+    std::deque<std::pair<std::string, TAct>> acts_;
+};
+
+}  // namespace zm::test
