@@ -24,7 +24,7 @@ configure = cmake --preset $(1) $(launcher) $(2) >build/$(1).configure.log || \
 # $(call compile,PRESET,TARGETS)
 compile = cmake --build --preset $(1) -j $(JOBS) $(if $(2),--target $(2))
 
-.PHONY: help build debug demo gallery test bench windows test-windows sanitize tsan fuzz check format \
+.PHONY: help build debug demo gallery gallery-dialogs test bench windows test-windows sanitize tsan fuzz check format \
 	clean clean-cache
 
 help: ## Show this list
@@ -51,6 +51,13 @@ demo: build ## Run an example job on IMAGE=my.jpg, or on a sample picture drawn 
 gallery: build ## Make the pictures of docs/gallery anew
 	$(call say,Making the pictures of docs/gallery)
 	@scripts/make_gallery.py build/release/bin
+
+gallery-dialogs: | build/.folder ## Make the pictures of the dialogs anew
+	$(call say,Making the pictures of docs/gallery/dialogs)
+	@$(setup) test
+	@$(call configure,release,-DZM_BUILD_TESTS=ON)
+	@$(call compile,release,gtk_gallery)
+	@scripts/dialog_gallery.sh build/release/bin
 
 test: | build/.folder ## Build and run all tests
 	$(call say,Testing: all test programs, optimized)

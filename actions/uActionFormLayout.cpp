@@ -13,7 +13,7 @@ constexpr std::int32_t kGroupTitleHeight = 20;
 constexpr std::int32_t kGroupSideMargin = 10;
 constexpr std::int32_t kGroupBottomMargin = 8;
 /// Room that a radio button's mark and gap take, in characters of its text.
-constexpr std::int32_t kRadioMarkCharacters = 4;
+constexpr std::int32_t kRadioMarkCharacters = 6;
 
 constexpr std::size_t kMaxFaceNameLength = 31;  // a platform font record has 32 with the zero
 constexpr std::int32_t kMaxFontPoints = 400;

@@ -1,5 +1,6 @@
 // Conversions of the processor to few colours and to other pixel formats.
 
+#include <algorithm>
 #include <memory>
 #include <string>
 #include <utility>
@@ -118,7 +119,14 @@ void MapPixels(TZmBitmap& source, TZmBitmap& target, TColorChoice& choice, TZmDi
         if (row == nullptr) {
             continue;
         }
-        ditherer.MapRow(row, indexes.data());
+        if (dither == zmdtSolid) {
+            // In one loop the look-ups of many pixels wait for memory at the same time.
+            std::transform(row, row + indexes.size(), indexes.begin(), [&](TRGB color) {
+                return static_cast<std::uint16_t>(choice.Find(color));
+            });
+        } else {
+            ditherer.MapRow(row, indexes.data());
+        }
         std::uint8_t* const out = target.GetScanLine(y);
         if (has_palette) {
             WriteIndexes(indexes, out);

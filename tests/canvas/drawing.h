@@ -30,6 +30,10 @@ public:
     std::unique_ptr<TZmCanvas> zm_canvas;
 };
 
+/// Whether the system's library draws the edges of shapes with partial coverage. Where it does
+/// not, areas are those of whole pixels.
+bool ShapesHaveCoverage();
+
 inline constexpr TColor kRed = 0x0000FF;
 inline constexpr TColor kBlue = 0xFF0000;
 

@@ -4,6 +4,7 @@
 
 #include <cmath>
 #include <set>
+#include <vector>
 
 #include "engine/bitmap/zmplatformbitmap.h"
 #include "engine/platform/drawing.h"
@@ -113,6 +114,40 @@ TEST_F(TDrawingTest, TextFarAwayIsNothingAndNoFailure) {
     unknown.family = std::u16string(10000, u'q');
     unknown.height = 0x7FFFFFFF;
     EXPECT_TRUE(graphics_->MeasureString(u"x", unknown, {}, {}));
+}
+
+/// A metafile of 1000 by 500 hundredths of a millimetre that is black all over.
+std::vector<std::uint8_t> BlackMetafile() {
+    const RECT frame{0, 0, 1000, 500};
+    const HDC record = ::CreateEnhMetaFileW(nullptr, nullptr, &frame, nullptr);
+    ::SelectObject(record, ::GetStockObject(BLACK_BRUSH));
+    ::Rectangle(record, 0, 0, 2000, 2000);
+    const HENHMETAFILE metafile = ::CloseEnhMetaFile(record);
+    std::vector<std::uint8_t> bytes(::GetEnhMetaFileBits(metafile, 0, nullptr));
+    ::GetEnhMetaFileBits(metafile, static_cast<UINT>(bytes.size()), bytes.data());
+    ::DeleteEnhMetaFile(metafile);
+    return bytes;
+}
+
+TEST_F(TDrawingTest, MetafilesFillTheirRectangle) {
+    graphics_->FillRectangle(*brush_, {0, 0, 40, 30});
+    const auto metafile = CreateMetafile(BlackMetafile());
+    ASSERT_NE(metafile, nullptr);
+    EXPECT_EQ(metafile->Header().type, 3);
+    EXPECT_EQ(metafile->Header().frame.right, 1000);
+    EXPECT_EQ(metafile->Header().frame.bottom, 500);
+    EXPECT_TRUE(graphics_->DrawMetafile(*metafile, {10, 10, 20, 10}));
+    EXPECT_EQ(PixelAt(20, 15), 0xFF000000U);
+    EXPECT_EQ(PixelAt(8, 15), kOpaqueWhite);
+    EXPECT_EQ(PixelAt(20, 22), kOpaqueWhite);
+    EXPECT_FALSE(graphics_->DrawMetafile(*metafile, {0, 0, kFarEnd, kFarEnd}));
+}
+
+TEST_F(TDrawingTest, CutMetafilesAreRefused) {
+    const std::vector<std::uint8_t> bytes = BlackMetafile();
+    for (std::size_t size = 0; size < bytes.size(); ++size) {
+        EXPECT_EQ(CreateMetafile({bytes.data(), size}), nullptr) << size;
+    }
 }
 
 /// The system gives a process no more than 16384 objects: one that is left behind each time ends

@@ -56,6 +56,22 @@ protected:
     TGtkUser user;
 };
 
+/// The first of all: later ones have started the toolkit.
+TEST(GtkStart, WithoutADisplayTheLogTellsWhy) {
+    const std::string display = getenv("DISPLAY");
+    unsetenv("DISPLAY");
+    TLoadedModule& module = LoadedModule();
+    TTestStep step(module.host, u"l=4");
+    EXPECT_EQ(module.caller->Actions().ConfigAction(gaCropImage, &step.params), 0);
+    EXPECT_EQ(step.Text(), u"l=4");
+    EXPECT_EQ(module.host.Lines(),
+              (std::vector<THostLine>{{2,
+                                       u"The settings dialog cannot be shown: there is no "
+                                       u"display to show it on."}}));
+    module.host.ForgetReports();
+    setenv("DISPLAY", display.c_str(), 1);
+}
+
 TEST_F(GtkForms, TypedAndToggledValuesAreStored) {
     user.In(kResize, [] {
         EXPECT_STREQ(gtk_entry_get_text(Entry(kResize, "edtImageW")), "300");
@@ -136,8 +152,17 @@ TEST_F(GtkForms, PickersGiveColorsAndFonts) {
         return true;
     });
     user.Respond("GtkColorChooserDialog", GTK_RESPONSE_OK);
+    // "Custom..." once more: a cancelled picker leaves the colour.
+    user.In(kBorder, [] { Choose(kBorder, "cbColor", 0); });
+    user.Respond("GtkColorChooserDialog", GTK_RESPONSE_CANCEL);
     user.Press(kBorder, "btnOk");
     EXPECT_TRUE(Configure(gaAddBorder, u"", -1).ends_with(u"color=33023\r\n"));  // 0080FF
+    user.In(kBorder, [] {
+        EXPECT_EQ(gtk_combo_box_get_active(GTK_COMBO_BOX(Widget(kBorder, "cbColor"))), 21);
+        Choose(kBorder, "cbColor", 10);
+    });
+    user.Press(kBorder, "btnOk");
+    EXPECT_TRUE(Configure(gaAddBorder, u"color=33023", -1).ends_with(u"color=255\r\n"));
 
     user.Press(kText, "btnSelectFont");
     user.WhenReady("GtkFontChooserDialog", [](GtkWidget* dialog) {
@@ -157,8 +182,11 @@ TEST_F(GtkForms, AFileIsPickedFromTheFolderOfThePresentOne) {
     user.WhenReady("GtkFileChooserDialog", [&picture](GtkWidget* dialog) {
         GtkFileChooser* const chooser = GTK_FILE_CHOOSER(dialog);
         char* const folder = gtk_file_chooser_get_current_folder(chooser);
-        EXPECT_STREQ(folder, ZM_SOURCE_DIR "/docs");
+        const bool is_there = folder != nullptr && std::string(folder) == ZM_SOURCE_DIR "/docs";
         g_free(folder);
+        if (!is_there) {
+            return false;  // folders are read aside
+        }
         GSList* const filters = gtk_file_chooser_list_filters(chooser);
         EXPECT_EQ(g_slist_length(filters), 2u);
         gtk_file_chooser_set_filter(chooser, GTK_FILE_FILTER(g_slist_nth_data(filters, 1)));
@@ -206,8 +234,13 @@ TEST(GtkTexts, CaptionsAndCarets) {
     EXPECT_EQ(UnitsBefore(u"ab", 9), 2);
 }
 
+struct TLook {
+    int percent;
+    const char* font;
+};
+
 /// Every form, shown directly so that the scale is ours.
-class GtkLayout : public testing::TestWithParam<int> {
+class GtkLayout : public testing::TestWithParam<TLook> {
 protected:
     static IActionFormToolkit* Toolkit() {
         std::string error_text;
@@ -277,11 +310,17 @@ std::vector<std::string> ExpectedFocus(const TActionForm& form) {
 TEST_P(GtkLayout, NothingIsClippedAndTheFocusGoesInOrder) {
     IActionFormToolkit* const toolkit = Toolkit();
     ASSERT_NE(toolkit, nullptr);
+    g_object_set(gtk_settings_get_default(), "gtk-font-name", GetParam().font, nullptr);
     for (const TActionFormDesign* design : AllForms()) {
         TActionForm form(*design);
         TGtkUser user;
         const std::string name = ViewText(design->class_name);
         SCOPED_TRACE(name);
+        // No window manager gives the window the keyboard here.
+        user.WhenReady(name, [](GtkWidget* window) {
+            gdk_window_focus(gtk_widget_get_window(window), GDK_CURRENT_TIME);
+            return gtk_window_has_toplevel_focus(GTK_WINDOW(window)) != FALSE;
+        });
         user.WhenReady(name, [&](GtkWidget* window) {
             for (const TFormControl& control : design->controls) {
                 ExpectUnclipped(window, control);
@@ -291,12 +330,42 @@ TEST_P(GtkLayout, NothingIsClippedAndTheFocusGoesInOrder) {
         });
         user.Press(name, "btnCancel");
         std::u16string reason;
-        EXPECT_TRUE(toolkit->ShowModal(form, {GetParam(), nullptr}, reason));
+        EXPECT_TRUE(toolkit->ShowModal(form, {GetParam().percent, nullptr}, reason));
         EXPECT_EQ(form.Result(), frCancel);
     }
 }
 
-INSTANTIATE_TEST_SUITE_P(Scales, GtkLayout, testing::Values(100, 150, 250));
+/// Waits for a size, which comes in its own time.
+void ResizeTo(TGtkUser& user, int width, int height, int wanted_width, int wanted_height) {
+    user.WhenReady(kText, [=](GtkWidget* window) {
+        gtk_window_resize(GTK_WINDOW(window), width, height);
+        return true;
+    });
+    user.WhenReady(kText, [=](GtkWidget* window) {
+        return gtk_widget_get_allocated_width(window) == wanted_width &&
+               gtk_widget_get_allocated_height(window) == wanted_height;
+    });
+}
+
+TEST_F(GtkForms, TheTextFormStretches) {
+    const auto expect_panel = [](int width, int height) {
+        GtkWidget* const panel = Widget(kText, "panSample");
+        EXPECT_EQ(gtk_widget_get_allocated_width(panel), width);
+        EXPECT_EQ(gtk_widget_get_allocated_height(panel), height);
+    };
+    g_object_set(gtk_settings_get_default(), "gtk-font-name", "DejaVu Sans 10", nullptr);
+    ResizeTo(user, 662, 449, 662, 449);
+    user.In(kText, [=] { expect_panel(550, 182); });
+    ResizeTo(user, 1, 1, 388, 399);
+    user.In(kText, [=] { expect_panel(276, 132); });
+    user.Press(kText, "btnCancel");
+    Configure(gaTextOnImage, u"", 0);
+}
+
+INSTANTIATE_TEST_SUITE_P(Scales, GtkLayout,
+                         testing::Values(TLook{100, "DejaVu Sans 10"}, TLook{150, "DejaVu Sans 10"},
+                                         TLook{250, "DejaVu Sans 10"},
+                                         TLook{100, "DejaVu Sans Bold 15"}));
 
 }  // namespace
 }  // namespace zm::test

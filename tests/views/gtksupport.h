@@ -49,14 +49,30 @@ inline GtkWidget* Widget(const std::string& window, const std::string& name) {
     return found;
 }
 
+/// Bindings of the toolkit go by the keyboard's own number of a key.
+inline guint16 HardwareCode(guint key) {
+    GdkKeymapKey* keys = nullptr;
+    gint count = 0;
+    gdk_keymap_get_entries_for_keyval(gdk_keymap_get_for_display(gdk_display_get_default()), key,
+                                      &keys, &count);
+    const auto code = static_cast<guint16>(count > 0 ? keys[0].keycode : 0);
+    g_free(keys);
+    return code;
+}
+
 class TGtkUser {
 public:
     /// True when the act is done, False to be asked again.
     using TAct = std::function<bool(GtkWidget* window)>;
 
-    TGtkUser() : source_(g_timeout_add(5, &Step, this)) {}
+    TGtkUser() : source_(g_timeout_source_new(5)) {
+        g_source_set_callback(source_, &Step, this, nullptr);
+        g_source_set_can_recurse(source_, TRUE);
+        g_source_attach(source_, nullptr);
+    }
     ~TGtkUser() {
-        g_source_remove(source_);
+        g_source_destroy(source_);
+        g_source_unref(source_);
         EXPECT_TRUE(acts_.empty()) << "window " << acts_.front().first << " never came";
     }
     TGtkUser(const TGtkUser&) = delete;
@@ -85,6 +101,7 @@ public:
             GdkEvent* const event = gdk_event_new(GDK_KEY_PRESS);
             event->key.window = GDK_WINDOW(g_object_ref(gtk_widget_get_window(widget)));
             event->key.keyval = key;
+            event->key.hardware_keycode = HardwareCode(key);
             gdk_event_set_device(event, gdk_seat_get_keyboard(gdk_display_get_default_seat(
                                             gtk_widget_get_display(widget))));
             gtk_widget_event(widget, event);
@@ -109,7 +126,7 @@ private:
         return G_SOURCE_CONTINUE;
     }
 
-    guint source_;
+    GSource* source_;
     std::deque<std::pair<std::string, TAct>> acts_;
 };
 

@@ -23,7 +23,7 @@ constexpr char kFormStyle[] =
     ".zalmo-form combobox cellview { min-height: 0; }"
     ".zalmo-form radiobutton, .zalmo-form checkbutton { padding: 0; }"
     ".zalmo-form radio, .zalmo-form check { min-width: 1.05em; min-height: 1.05em; }"
-    ".zalmo-form radio + label, .zalmo-form check + label { margin-left: 0.35em; }";
+    ".zalmo-form radio + label, .zalmo-form check + label { margin-left: 0.1em; }";
 
 constexpr int kSwatchSize = 14;
 constexpr std::int32_t kSampleMargin = 4;
@@ -82,7 +82,10 @@ GtkWidget* NewColorBox(const TFormControl& control) {
     GtkCellRenderer* const name = gtk_cell_renderer_text_new();
     gtk_cell_layout_pack_start(cells, name, TRUE);
     gtk_cell_layout_add_attribute(cells, name, "text", ccName);
-    FillColorBox(box, control, nullptr);
+    for (std::size_t item = 0; item < control.items.size(); ++item) {
+        const TColor color = ColorBoxColor(static_cast<std::int32_t>(item));
+        AddColorRow(rows, item == 0 ? nullptr : &color, control.items[item]);
+    }
     return box;
 }
 
@@ -187,15 +190,16 @@ void InstallFormStyle() {
     }
 }
 
-void FillColorBox(GtkWidget* box, const TFormControl& control, const TColor* custom) {
-    GtkListStore* const rows = GTK_LIST_STORE(gtk_combo_box_get_model(GTK_COMBO_BOX(box)));
-    gtk_list_store_clear(rows);
-    for (std::size_t item = 0; item < control.items.size(); ++item) {
-        const TColor color = ColorBoxColor(static_cast<std::int32_t>(item));
-        AddColorRow(rows, item == 0 ? nullptr : &color, control.items[item]);
+void ShowCustomRow(GtkWidget* box, const TFormControl& control, const TColor* custom) {
+    GtkTreeModel* const model = gtk_combo_box_get_model(GTK_COMBO_BOX(box));
+    GtkTreeIter row{};
+    const auto place = static_cast<int>(control.items.size());
+    // The other rows stay: the user may be choosing one of them at this moment.
+    if (gtk_tree_model_iter_nth_child(model, &row, nullptr, place) != FALSE) {
+        gtk_list_store_remove(GTK_LIST_STORE(model), &row);
     }
     if (custom != nullptr) {
-        AddColorRow(rows, custom, u"Custom");
+        AddColorRow(GTK_LIST_STORE(model), custom, u"Custom");
     }
 }
 

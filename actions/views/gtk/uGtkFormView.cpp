@@ -152,7 +152,8 @@ void TGtkFormView::BuildWindow() {
     ConnectMnemonics();
     gtk_widget_show_all(area_);
     g_signal_connect(area_, "size-allocate", G_CALLBACK(&OnPlace), this);
-    g_signal_connect(window_, "key-press-event", G_CALLBACK(&OnKeyPress), this);
+    // Behind the controls, for which a key may mean something: an input method, say.
+    g_signal_connect_after(window_, "key-press-event", G_CALLBACK(&OnKeyPress), this);
     g_signal_connect(window_, "delete-event", G_CALLBACK(&OnDelete), this);
     g_signal_connect(window_, "destroy", G_CALLBACK(&OnDestroy), this);
 }
@@ -259,9 +260,10 @@ void TGtkFormView::SizeWindow() {
     for (std::size_t index = 0; index < design.controls.size(); ++index) {
         const TRect& bounds = design.controls[index].bounds;
         if (design.controls[index].kind == fcWrappedLabel) {
-            gtk_widget_set_size_request(widgets_[index].main,
-                                        ScaleLength(bounds.right - bounds.left, scale_.x),
-                                        ScaleLength(bounds.bottom - bounds.top, scale_.y));
+            gtk_widget_set_size_request(
+                widgets_[index].main,
+                ScaleLength(bounds.right, scale_.x) - ScaleLength(bounds.left, scale_.x),
+                ScaleLength(bounds.bottom, scale_.y) - ScaleLength(bounds.top, scale_.y));
         }
     }
     if (design.border != fbsSizeable) {
@@ -387,7 +389,7 @@ void TGtkFormView::ShowColorBox(std::int32_t control) {
     GtkWidget* const box = Widgets(control).main;
     const TFormControlState& state = form_.State(control);
     const bool custom = state.index == 0;
-    FillColorBox(box, Control(control), custom ? &state.color : nullptr);
+    ShowCustomRow(box, Control(control), custom ? &state.color : nullptr);
     gtk_combo_box_set_active(
         GTK_COMBO_BOX(box), custom ? static_cast<int>(Control(control).items.size()) : state.index);
 }

@@ -98,8 +98,8 @@ private:
 TControlWidgets NewControlWidgets(const TFormControl& control);
 /// The common look of all forms; made once for the process.
 void InstallFormStyle();
-/// A colour box's model holds its items; with `custom` set one more row shows that colour.
-void FillColorBox(GtkWidget* box, const TFormControl& control, const TColor* custom);
+/// Gives a colour box, or takes from it, a row below its items for a colour without a name.
+void ShowCustomRow(GtkWidget* box, const TFormControl& control, const TColor* custom);
 /// Draws the text in the panel's font, centred and cut at the panel's edges.
 void DrawSampleText(GtkWidget* panel, cairo_t* context, const TFormControlState& state);
 

@@ -4,6 +4,7 @@
 
 #include "actions/views/gtk/uGtkFormView_p.h"
 #include "actions/views/gtk/uGtkModule.h"
+#include "actions/views/gtk/uGtkStart.h"
 #include "engine/platform/callconv.h"
 
 /// The module's entry and the toolkit behind it.
@@ -37,9 +38,7 @@ bool TGtkToolkit::ShowModal(IActionForm& form, const TFormShowOptions& options,
 
 ZM_EXPORT zm::IActionFormToolkit* ZmGtkFormToolkit(std::u16string& reason) {
     static zm::TGtkToolkit toolkit;
-    // The locale belongs to the host: its numbers must not change because a dialog was shown.
-    gtk_disable_setlocale();
-    if (gtk_init_check(nullptr, nullptr) == FALSE) {
+    if (!zm::StartGtk()) {
         reason = u"there is no display to show it on.";
         return nullptr;
     }

@@ -1,9 +1,60 @@
+#include <commctrl.h>
+
+#include <algorithm>
+#include <exception>
+
 #include "actions/views/uFormToolkit.h"
+#include "actions/views/win32/uWin32FormView_p.h"
+#include "engine/foundation/zmstrings.h"
 
 namespace zm {
+namespace {
+
+constexpr std::int32_t kMinScalePercent = 100;
+constexpr std::int32_t kMaxScalePercent = 250;
+
+class TWin32Toolkit : public IActionFormToolkit {
+public:
+    bool ShowModal(IActionForm& form, const TFormShowOptions& options,
+                   std::u16string& reason) override;
+};
+
+/// Brings the windows of the present common controls, tool tips among them.
+void LoadCommonControls() {
+    const TThemedScope themed;
+    INITCOMMONCONTROLSEX classes{sizeof(INITCOMMONCONTROLSEX),
+                                 ICC_STANDARD_CLASSES | ICC_WIN95_CLASSES};
+    SystemFunction<decltype(&InitCommonControlsEx)>(L"comctl32.dll",
+                                                    "InitCommonControlsEx")(&classes);
+}
+
+bool TWin32Toolkit::ShowModal(IActionForm& form, const TFormShowOptions& options,
+                              std::u16string& reason) {
+    if (!HasVisibleDesktop()) {
+        reason = u"this program runs without a desktop.";
+        return false;
+    }
+    try {
+        LoadCommonControls();
+    } catch (const std::exception& error) {
+        reason = Utf16FromUtf8(error.what());
+        return false;
+    }
+    TFormShowOptions bounded = options;
+    bounded.scale_percent = std::clamp(options.scale_percent, kMinScalePercent, kMaxScalePercent);
+    TWin32FormView view(form, bounded);
+    return view.Run(reason);
+}
+
+IActionFormToolkit* FindToolkit(std::u16string&) {
+    static TWin32Toolkit toolkit;
+    return &toolkit;
+}
+
+}  // namespace
 
 TFormToolkitProvider FormToolkitProvider() {
-    return nullptr;
+    return &FindToolkit;
 }
 
 }  // namespace zm

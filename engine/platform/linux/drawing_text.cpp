@@ -194,6 +194,7 @@ const TTextEngine::TFontSetup& TTextEngine::SetUpFont(const TDrawFont& font) {
         setup_.description = library_.pango_font_description_new();
     }
     setup_.font = font;
+    ++setups_;
     const std::string family =
         DisplayText(std::u16string_view(font.family).substr(0, kMostFamilyLength));
     library_.pango_font_description_set_family(setup_.description, family.c_str());
@@ -470,7 +471,7 @@ void TReturnTextEngine::operator()(TTextEngine* engine) const {
     std::unique_ptr<TTextEngine> owner(engine);
     TEnginePool& pool = EnginePool();
     const std::scoped_lock guard(pool.lock);
-    if (pool.engines.size() < kMostIdleEngines) {
+    if (pool.engines.size() < kMostIdleEngines && !owner->IsWorn()) {
         pool.engines.push_back(std::move(owner));
     }
 }

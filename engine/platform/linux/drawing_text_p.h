@@ -47,6 +47,8 @@ public:
     TTextEngine& operator=(const TTextEngine&) = delete;
     /// False when the machine has no font at all.
     bool HasFonts();
+    /// Whether it has seen so many fonts that what it keeps of them should go.
+    bool IsWorn() const { return setups_ >= kMostSetups; }
 
     /// Size of the laid out text, from 0, 0 on. `visit` is called for each piece, in order. With
     /// `visible` pieces outside it may be left out, and the layout ends when nothing more can be
@@ -58,6 +60,7 @@ public:
     void DrawPiece(cairo_t* cairo, const TTextPiece& piece, const TDeviceMatrix& to_surface);
 
 private:
+    static constexpr int kMostSetups = 500;
     class TLayouter;
 
     /// A font as the library describes it. Large ones are laid out smaller and drawn enlarged:
@@ -77,6 +80,7 @@ private:
     PangoFontMap* map_;
     PangoContext* context_;
     TFontSetup setup_;  // of the last font
+    int setups_ = 0;
 };
 
 /// Engines are expensive to make: they are handed out to one canvas at a time and kept.

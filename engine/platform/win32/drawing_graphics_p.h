@@ -53,6 +53,19 @@ bool SucceedsInMemory(const TWork& work) {
     }
 }
 
+/// Where a font has its baseline below the top of a line, and its underline and strike-out above
+/// the baseline, with their thickness, in pixels.
+struct TFontLines {
+    double ascent = 0;
+    double underline = 0;
+    double underline_size = 0;
+    double strike_out = 0;
+    double strike_out_size = 0;
+};
+
+/// Whether the library draws the lines of a font on pictures; it must be bound.
+bool LibraryDrawsTextLines();
+
 /// For a call that draws: the plain drawing is complete before, and its origin, which the library
 /// would follow in a context, is out of the way.
 class TContextScope {
@@ -210,6 +223,8 @@ private:
                 const Gdiplus::GpStringFormat* format, TArgb color);
     bool DrawSingleBit(const TTextPiece& piece, const Gdiplus::GpStringFormat* format, TArgb color,
                        const TPlaneBox& seen);
+    bool DrawTextLines(const TTextPiece& piece, const Gdiplus::GpStringFormat* format, TArgb color);
+    bool DrawBar(Gdiplus::GpBrush* brush, float left, float width, double top, double thickness);
     bool PlacePicture(Gdiplus::GpImage* picture, const TPlaneBox& place);
 
     TDrawTarget target_;
@@ -223,6 +238,7 @@ private:
     /// The font of the last text; measuring and drawing come in pairs.
     TGdiPlusFont font_;
     TDrawFont font_traits_;
+    TFontLines font_lines_;
 };
 
 }  // namespace zm::platform

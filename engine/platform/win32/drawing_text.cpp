@@ -65,8 +65,17 @@ bool SameTraits(const TDrawFont& a, const TDrawFont& b) {
 
 /// The font that the system has selected for the description, as the library sees it.
 bool TakeFontOfContext(const TGdiPlusEntries& entries, HDC context, const TDrawFont& traits,
-                       TGdiPlusFont& font) {
+                       TGdiPlusFont& font, TFontLines& lines) {
     const TSelectedObject selected(context, MakeSystemFont(traits, TFontUse::kVector));
+    OUTLINETEXTMETRICW metrics{};
+    metrics.otmSize = sizeof(metrics);
+    if (::GetOutlineTextMetricsW(context, sizeof(metrics), &metrics) != 0) {
+        lines = {static_cast<double>(metrics.otmTextMetrics.tmAscent),
+                 static_cast<double>(metrics.otmsUnderscorePosition),
+                 static_cast<double>(metrics.otmsUnderscoreSize),
+                 static_cast<double>(metrics.otmsStrikeoutPosition),
+                 static_cast<double>(metrics.otmsStrikeoutSize)};
+    }
     return selected.IsSelected() && IsDone(entries.GdipCreateFontFromDC(context, font.Receive()));
 }
 
@@ -136,7 +145,7 @@ bool TGdiPlusDrawing::PrepareFont(const TDrawFont& font) {
     }
     const TGdiPlusEntries* entries = GdiPlus();
     const auto context = static_cast<HDC>(target_.section->DeviceContext());
-    if (entries == nullptr || (!TakeFontOfContext(*entries, context, font, font_) &&
+    if (entries == nullptr || (!TakeFontOfContext(*entries, context, font, font_, font_lines_) &&
                                !TakeGenericFont(*entries, font, font_))) {
         font_.Reset();
         return false;
@@ -164,9 +173,10 @@ bool TGdiPlusDrawing::MeasurePiece(std::u16string_view text, const Gdiplus::Rect
 bool TGdiPlusDrawing::KeepWholeLines(const Gdiplus::GpStringFormat* format, TTextPiece& piece) {
     const auto lines = static_cast<float>(piece.lines);
     Gdiplus::RectF rect = piece.rect;
-    rect.Height = piece.size.height / lines * (lines - 0.5F);
+    // Short of a line by half: formats differ in whether they show one that is cut off.
+    rect.Height = piece.size.height / lines * (lines - 1.5F);
     TTextPiece kept;
-    if (piece.lines < 3 || !MeasurePiece(piece.text, rect, format, kept) || kept.fitted <= 0 ||
+    if (piece.lines < 4 || !MeasurePiece(piece.text, rect, format, kept) || kept.fitted <= 0 ||
         static_cast<std::size_t>(kept.fitted) >= piece.text.size()) {
         return false;
     }
@@ -325,10 +335,12 @@ bool TGdiPlusDrawing::DrawPiece(const TTextPiece& piece, const Gdiplus::GpString
     }
     const bool is_single_bit = hint_ == Gdiplus::TextRenderingHintSingleBitPerPixelGridFit ||
                                hint_ == Gdiplus::TextRenderingHintSingleBitPerPixel;
-    if (is_single_bit && picture_.IsSet() && !copies_) {
-        return DrawSingleBit(piece, format, color, seen);
-    }
-    return DrawOn(graphics_, piece, format, color);
+    const bool is_drawn = is_single_bit && picture_.IsSet() && !copies_
+                              ? DrawSingleBit(piece, format, color, seen)
+                              : DrawOn(graphics_, piece, format, color);
+    const bool has_lines = font_traits_.underline || font_traits_.strike_out;
+    return is_drawn && (!has_lines || !picture_.IsSet() || LibraryDrawsTextLines() ||
+                        DrawTextLines(piece, format, color));
 }
 
 bool TGdiPlusDrawing::DrawOn(const TGdiPlusGraphics& graphics, const TTextPiece& piece,

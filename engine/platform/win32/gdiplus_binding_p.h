@@ -125,8 +125,7 @@ private:
     T* object_ = nullptr;
 };
 
-using TGdiPlusGraphics =
-    TGdiPlusHandle<Gdiplus::GpGraphics, &TGdiPlusEntries::GdipDeleteGraphics>;
+using TGdiPlusGraphics = TGdiPlusHandle<Gdiplus::GpGraphics, &TGdiPlusEntries::GdipDeleteGraphics>;
 using TGdiPlusPath = TGdiPlusHandle<Gdiplus::GpPath, &TGdiPlusEntries::GdipDeletePath>;
 using TGdiPlusMatrix = TGdiPlusHandle<Gdiplus::GpMatrix, &TGdiPlusEntries::GdipDeleteMatrix>;
 using TGdiPlusPen = TGdiPlusHandle<Gdiplus::GpPen, &TGdiPlusEntries::GdipDeletePen>;

@@ -2,6 +2,7 @@
 
 #include <algorithm>
 
+#include "actions/views/gtk/uGtkStart.h"
 #include "engine/foundation/zmstrings.h"
 #include "engine/platform/callconv.h"
 #include "host/qveditwindow.h"
@@ -12,7 +13,7 @@ namespace {
 
 constexpr int kMargin = 12;
 constexpr int kGap = 6;
-constexpr int kWindowWidth = 640;
+constexpr int kWindowWidth = 740;
 constexpr int kWindowHeight = 400;
 constexpr int kPickerWidth = 460;
 constexpr int kPickerHeight = 320;
@@ -188,10 +189,9 @@ GtkWidget* TEditView::NewStepList() {
     GtkWidget* const overlay = gtk_overlay_new();
     gtk_container_add(GTK_CONTAINER(overlay), NewScrolled(list_));
     placeholder_ = gtk_label_new(kPlaceholder);
-    gtk_label_set_line_wrap(GTK_LABEL(placeholder_), TRUE);
     gtk_label_set_justify(GTK_LABEL(placeholder_), GTK_JUSTIFY_CENTER);
-    gtk_widget_set_margin_start(placeholder_, kMargin);
-    gtk_widget_set_margin_end(placeholder_, kMargin);
+    gtk_widget_set_halign(placeholder_, GTK_ALIGN_CENTER);
+    gtk_widget_set_valign(placeholder_, GTK_ALIGN_CENTER);
     gtk_overlay_add_overlay(GTK_OVERLAY(overlay), placeholder_);
     gtk_overlay_set_overlay_pass_through(GTK_OVERLAY(overlay), placeholder_, TRUE);
     gtk_widget_set_hexpand(overlay, TRUE);
@@ -437,8 +437,7 @@ std::u16string TGtkJobEditorWindow::PickVariable(const std::vector<TVariableInfo
 
 ZM_EXPORT zm::qvrun::IJobEditorWindow* ZmJobEditorWindow(std::u16string& reason) {
     static zm::qvrun::TGtkJobEditorWindow window;
-    gtk_disable_setlocale();
-    if (gtk_init_check(nullptr, nullptr) == FALSE) {
+    if (!zm::StartGtk()) {
         reason = u"there is no display to show it on";
         return nullptr;
     }
