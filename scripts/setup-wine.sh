@@ -8,7 +8,7 @@
 set -euo pipefail
 . "$(dirname "${BASH_SOURCE[0]}")/common.sh"
 
-packages=wine,wine32,fonts-liberation,fonts-wine,xvfb,xauth
+packages=wine,wine32,fonts-dejavu-core,fonts-liberation,fonts-wine,xvfb,xauth
 release=$(DebianRelease)
 [ -n "$release" ] || Fail "this is not Debian; the Windows tests need Debian's debootstrap"
 # The name changes with whatever decides the content; raise the number with the steps below.

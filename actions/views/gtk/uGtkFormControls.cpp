@@ -26,7 +26,6 @@ constexpr char kFormStyle[] =
     ".zalmo-form radio + label, .zalmo-form check + label { margin-left: 0.1em; }";
 
 constexpr int kSwatchSize = 14;
-constexpr std::int32_t kSampleMargin = 4;
 /// More than any panel shows; a layout of a whole long text would cost seconds.
 constexpr std::size_t kMaxSampleLength = 500;
 
@@ -216,8 +215,10 @@ void DrawSampleText(GtkWidget* panel, cairo_t* context, const TFormControlState&
     pango_layout_get_pixel_size(layout, &width, &height);
     const GdkRGBA color = ScreenColor(state.font.color);
     gdk_cairo_set_source_rgba(context, &color);
-    cairo_move_to(context, (gtk_widget_get_allocated_width(panel) - width) / 2,
-                  (gtk_widget_get_allocated_height(panel) - height) / 2);
+    // In whole pixels, so that letters stay sharp.
+    const int left = (gtk_widget_get_allocated_width(panel) - width) / 2;
+    const int top = (gtk_widget_get_allocated_height(panel) - height) / 2;
+    cairo_move_to(context, left, top);
     pango_cairo_show_layout(context, layout);
     pango_attr_list_unref(lines);
     pango_font_description_free(font);

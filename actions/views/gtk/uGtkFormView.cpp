@@ -168,7 +168,7 @@ void TGtkFormView::BuildControl(std::int32_t control) {
         gtk_fixed_put(GTK_FIXED(area_), widget, 0, 0);
     }
     ConnectControl(control);
-    ControlChanged(control, fchText | fchIndex | fchChecked | fchEnabled | fchColor | fchFont);
+    ShowControl(control, fchText | fchIndex | fchChecked | fchEnabled | fchColor | fchFont);
     if (Control(control).button == fbOk) {
         gtk_window_set_default(GTK_WINDOW(window_), widgets.main);
     }
@@ -309,6 +309,10 @@ void TGtkFormView::CloseWindow() {
 }
 
 void TGtkFormView::ControlChanged(std::int32_t control, std::uint8_t changes) {
+    ShowControl(control, changes);
+}
+
+void TGtkFormView::ShowControl(std::int32_t control, std::uint8_t changes) {
     const TSyncGuard guard(syncing_);
     const TFormControlState& state = form_.State(control);
     const TControlWidgets& widgets = Widgets(control);
@@ -463,7 +467,7 @@ void TGtkFormView::OnClearPressed(GtkWidget* entry, gint, GdkEvent*, gpointer us
     TGtkFormView& view = ViewOf(user);
     const std::int32_t control = view.ControlOf(entry);
     view.form_.SetText(control, u"");
-    view.ControlChanged(control, fchText);
+    view.ShowControl(control, fchText);
 }
 
 void TGtkFormView::OnListChanged(GtkWidget* list, gpointer user) {

@@ -58,6 +58,8 @@ private:
     void SizeWindow();
     void PlaceControls(const GtkAllocation& area);
 
+    /// Brings what has changed of a control's state into its widgets.
+    void ShowControl(std::int32_t control, std::uint8_t changes);
     void ShowText(std::int32_t control);
     void ShowEditText(GtkEntry* entry, const std::u16string& text);
     void ShowIndex(std::int32_t control);

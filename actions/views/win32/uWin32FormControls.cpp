@@ -1,3 +1,5 @@
+#include <windows.h>
+
 #include <commctrl.h>
 
 #include <algorithm>
@@ -74,7 +76,8 @@ std::u16string PlainTitle(const std::u16string& title) {
 void AddRadioButtons(HWND dialog, const TFormControl& group, std::int32_t index,
                      TControlWindows& windows) {
     for (std::size_t item = 0; item < group.items.size(); ++item) {
-        const TWindowLook look{WC_BUTTONW, BS_AUTORADIOBUTTON | (item == 0 ? WS_GROUP : 0)};
+        const DWORD begins_group = item == 0 ? WS_GROUP : 0;
+        const TWindowLook look{WC_BUTTONW, begins_group | BS_AUTORADIOBUTTON};
         windows.items.push_back(NewWindow(dialog, look, group.items[item],
                                           RadioItemId(index, static_cast<std::int32_t>(item))));
     }

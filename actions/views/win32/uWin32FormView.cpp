@@ -87,17 +87,18 @@ HWND ValidMainWindow(void* handle) {
 
 }  // namespace
 
+BOOL CALLBACK TOtherWindows::DisableOne(HWND window, LPARAM others) {
+    if (IsWindowVisible(window) != FALSE && IsWindowEnabled(window) != FALSE) {
+        reinterpret_cast<TOtherWindows*>(others)->disabled_.push_back(window);
+        EnableWindow(window, FALSE);
+    }
+    return TRUE;
+}
+
 void TOtherWindows::Disable(HWND main_window) {
-    const auto disable = [](HWND window, LPARAM data) -> BOOL {
-        if (IsWindowVisible(window) != FALSE && IsWindowEnabled(window) != FALSE) {
-            reinterpret_cast<TOtherWindows*>(data)->disabled_.push_back(window);
-            EnableWindow(window, FALSE);
-        }
-        return TRUE;
-    };
-    EnumThreadWindows(GetCurrentThreadId(), disable, reinterpret_cast<LPARAM>(this));
+    EnumThreadWindows(GetCurrentThreadId(), &DisableOne, reinterpret_cast<LPARAM>(this));
     if (main_window != nullptr) {
-        disable(main_window, reinterpret_cast<LPARAM>(this));
+        DisableOne(main_window, reinterpret_cast<LPARAM>(this));
     }
 }
 

@@ -22,11 +22,16 @@ struct TControlWindows {
 /// The thread's other windows, which take no input while a form is open.
 class TOtherWindows {
 public:
+    TOtherWindows() = default;
+    ~TOtherWindows() { Enable(); }
+    TOtherWindows(const TOtherWindows&) = delete;
+    TOtherWindows& operator=(const TOtherWindows&) = delete;
     void Disable(HWND main_window);
     void Enable();
-    ~TOtherWindows() { Enable(); }
 
 private:
+    static BOOL CALLBACK DisableOne(HWND window, LPARAM others);
+
     std::vector<HWND> disabled_;
 };
 

@@ -114,7 +114,7 @@ private:
 
     static TEditView& Of(gpointer user) { return *static_cast<TEditView*>(user); }
     static void OnAdd(GtkWidget* item, gpointer user) {
-        const gpointer action = g_object_get_data(G_OBJECT(item), kActionKey);
+        gpointer action = g_object_get_data(G_OBJECT(item), kActionKey);
         Of(user).Add(static_cast<std::size_t>(GPOINTER_TO_INT(action)));
     }
     static void OnConfigure(GtkWidget*, gpointer user) { Of(user).Configure(); }
@@ -309,10 +309,10 @@ void TEditView::Configure() {
 
 void TEditView::MoveBy(int distance) {
     const int chosen = ChosenRow(list_);
-    if (chosen >= 0 && chosen + distance >= 0) {
-        editor_.MoveStep(static_cast<std::size_t>(chosen),
-                         static_cast<std::size_t>(chosen + distance));
-        Refresh(chosen + distance);
+    const int target = chosen + distance;
+    if (chosen >= 0 && target >= 0) {
+        editor_.MoveStep(static_cast<std::size_t>(chosen), static_cast<std::size_t>(target));
+        Refresh(target);
     }
 }
 
