@@ -24,7 +24,7 @@ configure = cmake --preset $(1) $(launcher) $(2) >build/$(1).configure.log || \
 # $(call compile,PRESET,TARGETS)
 compile = cmake --build --preset $(1) -j $(JOBS) $(if $(2),--target $(2))
 
-.PHONY: help build debug demo gallery gallery-dialogs test bench windows test-windows sanitize tsan fuzz check format \
+.PHONY: help build debug demo gallery gallery-dialogs gallery-dialogs-windows test bench windows test-windows sanitize tsan fuzz check format \
 	clean clean-cache
 
 help: ## Show this list
@@ -58,6 +58,10 @@ gallery-dialogs: | build/.folder ## Make the pictures of the dialogs anew
 	@$(call configure,release,-DZM_BUILD_TESTS=ON)
 	@$(call compile,release,gtk_gallery)
 	@scripts/dialog_gallery.sh build/release/bin
+
+gallery-dialogs-windows: windows ## Make the pictures of the Windows dialogs anew, under Wine
+	@scripts/setup-windows.sh test
+	@scripts/dialog_gallery_windows.sh build/win32/bin
 
 test: | build/.folder ## Build and run all tests
 	$(call say,Testing: all test programs, optimized)

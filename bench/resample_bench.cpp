@@ -118,16 +118,14 @@ void BM_Quantize(benchmark::State& state, std::int32_t method) {
     const auto source = MakePicture(kLargeWidth, kLargeHeight);
     const std::int32_t old_method = ZmGlobalSettings().fColorReductionAlgorithm;
     ZmGlobalSettings().fColorReductionAlgorithm = method;
-    std::vector<std::uint8_t> indices(std::size_t{kLargeWidth} * kLargeHeight);
+    std::vector<std::uint16_t> indices(std::size_t{kLargeWidth} * kLargeHeight);
     for (auto _ : state) {
         std::vector<TRGB> palette;
         TZmQuantizer quantizer(*source, palette, 256);
-        std::uint8_t* out = indices.data();
-        for (std::int32_t y = 0; y < kLargeHeight; ++y) {
+        std::uint16_t* out = indices.data();
+        for (std::int32_t y = 0; y < kLargeHeight; ++y, out += kLargeWidth) {
             const auto* row = reinterpret_cast<const TRGB*>(source->GetScanLine(y));
-            out = std::transform(row, row + kLargeWidth, out, [&](TRGB color) {
-                return static_cast<std::uint8_t>(quantizer.GetRGBIndex(color));
-            });
+            quantizer.GetRGBIndexes(row, kLargeWidth, out);
         }
         benchmark::DoNotOptimize(indices.data());
     }

@@ -47,8 +47,9 @@ private:
     std::vector<std::u16string> log_;
 };
 
-/// The editor's window, from the module in the folder (with trailing separator); nil with a
-/// sentence in `reason`. It lives to the end of the process.
+/// The editor's window, defined by the view of the system that the program was built for; where
+/// that is a module, it lies in the folder (with trailing separator). Nil with a sentence in
+/// `reason`. It lives to the end of the process.
 IJobEditorWindow* FindEditWindow(const std::u16string& folder, std::u16string& reason);
 
 }  // namespace zm::qvrun

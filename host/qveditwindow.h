@@ -6,7 +6,7 @@
 
 #include "host/qvvariables.h"
 
-/// The seam between the job editor and its window, which lies in a module of its own: calls go
+/// The seam between the job editor and its window, which may lie in a module of its own: calls go
 /// through virtual functions only, and all on one thread.
 namespace zm::qvrun {
 
@@ -47,7 +47,7 @@ public:
     virtual std::u16string PickVariable(const std::vector<TVariableInfo>& variables) = 0;
 };
 
-/// File name of the window's module, which lies beside qvrun, and the name it exports. The
+/// Where the window is a module: its file name beside qvrun, and the name that it exports. The
 /// result is nil, with a sentence in `reason`, when there is no display.
 inline constexpr char16_t kEditWindowModuleName[] = u"qvrun-gtk.so";
 inline constexpr char kEditWindowEntryName[] = "ZmJobEditorWindow";

@@ -1,5 +1,6 @@
 #pragma once
 
+#include <cstddef>
 #include <cstdint>
 #include <memory>
 #include <vector>
@@ -32,6 +33,8 @@ public:
     /// Trunc(red * NCol / 256), with a zm8p image the first entry of that very colour or else
     /// the size of its palette, which is no index.
     std::int32_t GetRGBIndex(TRGB color);
+    /// GetRGBIndex of `count` colours in a row, in a fraction of the time.
+    void GetRGBIndexes(const TRGB* colors, std::size_t count, std::uint16_t* indexes);
     /// Entries in use.
     std::int32_t GetFoundColors() const;
     /// The bitmap was grey.

@@ -71,33 +71,6 @@ private:
     std::vector<std::uint8_t> buffer_;
 };
 
-/// Remembers the palette index of colours met before: finding one can mean a search.
-class TIndexCache {
-public:
-    explicit TIndexCache(TZmQuantizer& quantizer) : quantizer_(quantizer) {}
-
-    std::uint8_t Find(TRGB color) {
-        const std::uint32_t key = color.r | color.g << 8 | color.b << 16 | kUsed;
-        TEntry& entry = entries_[(color.r * 5u + color.g * 67u + color.b * 1031u) % kEntries];
-        if (entry.key != key) {
-            entry.key = key;
-            entry.index = static_cast<std::uint8_t>(
-                std::clamp(quantizer_.GetRGBIndex(color), 0, kPaletteEntries - 1));
-        }
-        return entry.index;
-    }
-
-private:
-    static constexpr std::uint32_t kUsed = 0x1000000;
-    static constexpr std::size_t kEntries = 4096;
-    struct TEntry {
-        std::uint32_t key = 0;
-        std::uint8_t index = 0;
-    };
-    TZmQuantizer& quantizer_;
-    std::vector<TEntry> entries_ = std::vector<TEntry>(kEntries);
-};
-
 /// Bytes of the greys `first + 0` to `first + count - 1` stretched from black to white.
 std::vector<std::uint8_t> MakeRangeTable(std::int32_t count, double black, double white) {
     const double range = white - black;
@@ -239,13 +212,18 @@ void TZmBitmap::QuantizeFrom(TZmBitmap& source) {
     TZmQuantizer quantizer(source, palette, std::clamp(fPaletteUsed, 1, kPaletteEntries));
     palette.resize(kPaletteEntries);
     fRGBPalette = palette;
-    TIndexCache cache(quantizer);
+    std::vector<std::uint16_t> indexes(static_cast<std::size_t>(fWidth));
     for (std::int32_t y = 0; y < fHeight; ++y) {
-        const std::uint8_t* from = source.GetScanLine(y);
+        const auto* const from = reinterpret_cast<const TRGB*>(source.GetScanLine(y));
         std::uint8_t* const to = GetScanLine(y);
-        for (std::int32_t x = 0; x < fWidth; ++x, from += 3) {
-            to[x] = cache.Find(TRGB{from[0], from[1], from[2]});
+        if (from == nullptr || to == nullptr) {
+            continue;
         }
+        quantizer.GetRGBIndexes(from, indexes.size(), indexes.data());
+        // A palette of the source's own has no index for other colours.
+        std::transform(indexes.begin(), indexes.end(), to, [](std::uint16_t index) {
+            return static_cast<std::uint8_t>(std::min<std::int32_t>(index, kPaletteEntries - 1));
+        });
     }
 }
 

@@ -245,8 +245,9 @@ public:
 std::unique_ptr<TDrawMetafile> CreateMetafile(std::span<const std::uint8_t> bytes);
 
 /// How text is laid out. Typographic: the font's own metrics, nothing around them; in a limited
-/// height only lines that fit whole are drawn, but always the first; nothing is clipped.
-/// Otherwise: room around the text, glyphs fitted to pixels, and with both limits clipped.
+/// height there are only the lines that fit whole, none where the first does not; nothing is
+/// clipped. Otherwise: room around the text, glyphs fitted to pixels, and, where both sides are
+/// limited and no clipping is set, clipped to them with the last line cut through.
 struct TTextFormat {
     bool is_typographic = true;
 };

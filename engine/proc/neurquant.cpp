@@ -88,21 +88,14 @@ private:
 };
 
 // All answers given so far, for methods whose search is long. Colours near each other lie
-// together, in blocks of 8 levels a channel that are made when first asked for.
+// together, in blocks of 8 levels a channel that are made when first asked for. Cells without a
+// block share block 0, which knows nothing: one test tells whether an answer is there.
 class TAnswerMemo {
 public:
     template <typename Search>
     std::int32_t Get(TRGB color, const Search& search) {
-        TBlockNumber& number = block_numbers_[CellOf(color)];
-        if (number == 0) {
-            answers_.resize(answers_.size() + kBlockSize, kUnknown);
-            number = static_cast<TBlockNumber>(answers_.size() / kBlockSize);
-        }
-        const std::size_t at = std::size_t{number - 1u} * kBlockSize + PlaceOf(color);
-        if (answers_[at] == kUnknown) {
-            answers_[at] = static_cast<std::int16_t>(search(color));
-        }
-        return answers_[at];
+        const std::int32_t known = answers_[PlaceOfBlock(color) + PlaceOf(color)];
+        return known != kUnknown ? known : Learn(color, search(color));
     }
 
 private:
@@ -111,6 +104,18 @@ private:
     static constexpr std::size_t kBlockSize = 8 * 8 * 8;
     static constexpr std::int16_t kUnknown = -1;
 
+    std::int32_t Learn(TRGB color, std::int32_t answer) {
+        TBlockNumber& number = block_numbers_[CellOf(color)];
+        if (number == 0) {
+            number = static_cast<TBlockNumber>(answers_.size() / kBlockSize);
+            answers_.resize(answers_.size() + kBlockSize, kUnknown);
+        }
+        answers_[PlaceOfBlock(color) + PlaceOf(color)] = static_cast<std::int16_t>(answer);
+        return answer;
+    }
+    std::size_t PlaceOfBlock(TRGB color) const {
+        return std::size_t{block_numbers_[CellOf(color)]} * kBlockSize;
+    }
     static std::size_t CellOf(TRGB color) {
         return static_cast<std::size_t>(color.b >> 3 | color.g >> 3 << 5 | color.r >> 3 << 10);
     }
@@ -119,7 +124,7 @@ private:
     }
 
     std::vector<TBlockNumber> block_numbers_ = std::vector<TBlockNumber>(kCells);  // 0: none yet
-    std::vector<std::int16_t> answers_;
+    std::vector<std::int16_t> answers_ = std::vector<std::int16_t>(kBlockSize, kUnknown);
 };
 
 // The distinct colours of an image, or nothing when there are more than `max_colors`.
@@ -166,6 +171,10 @@ struct TZmQuantizer::TState {
     void MakeGrayRamp(std::vector<TRGB>& color_map) const;
     void RunMethod(TZmBitmap& source, std::vector<TRGB>& color_map);
     std::int32_t FindInOwnPalette(TRGB color) const;
+    // Calls `use` with the function that looks one colour up. A caller with many colours goes
+    // through them inside `use`, which is compiled once for each kind of look-up.
+    template <typename Use>
+    void WithLookup(const Use& use);
 };
 
 bool TZmQuantizer::TState::TakeExactColors(TZmBitmap& source, std::vector<TRGB>& color_map) {
@@ -239,24 +248,36 @@ TZmQuantizer::TZmQuantizer(TZmBitmap& source, std::vector<TRGB>& color_map,
 
 TZmQuantizer::~TZmQuantizer() = default;
 
+template <typename Use>
+void TZmQuantizer::TState::WithLookup(const Use& use) {
+    if (fSQ) {
+        use([this](TRGB color) { return fSQ->Find(color); });
+    } else if (fGrayScale) {
+        use([this](TRGB color) { return color.r * fNCol / 256; });
+    } else if (neural) {
+        const auto search = [this](TRGB color) { return neural->FindIndex(color); };
+        use([&](TRGB color) { return memo.Get(color, search); });
+    } else if (boxes) {
+        use([this](TRGB color) { return boxes->FindIndex(color); });
+    } else if (!own_palette.empty()) {
+        const auto search = [this](TRGB color) { return FindInOwnPalette(color); };
+        use([&](TRGB color) { return memo.Get(color, search); });
+    } else {
+        use([](TRGB /*color*/) { return 0; });
+    }
+}
+
 std::int32_t TZmQuantizer::GetRGBIndex(TRGB color) {
-    TState& state = *fState;
-    if (state.fSQ) {
-        return state.fSQ->Find(color);
-    }
-    if (state.fGrayScale) {
-        return color.r * state.fNCol / 256;
-    }
-    if (state.neural) {
-        return state.memo.Get(color, [&](TRGB c) { return state.neural->FindIndex(c); });
-    }
-    if (state.boxes) {
-        return state.boxes->FindIndex(color);
-    }
-    if (!state.own_palette.empty()) {
-        return state.memo.Get(color, [&](TRGB c) { return state.FindInOwnPalette(c); });
-    }
-    return 0;
+    std::int32_t index = 0;
+    fState->WithLookup([&](const auto& find) { index = find(color); });
+    return index;
+}
+
+void TZmQuantizer::GetRGBIndexes(const TRGB* colors, std::size_t count, std::uint16_t* indexes) {
+    fState->WithLookup([&](const auto& find) {
+        std::transform(colors, colors + count, indexes,
+                       [&](TRGB color) { return static_cast<std::uint16_t>(find(color)); });
+    });
 }
 
 std::int32_t TZmQuantizer::GetFoundColors() const {

@@ -24,10 +24,6 @@ std::size_t CellOf(std::int32_t red, std::int32_t green, std::int32_t blue) {
     return static_cast<std::size_t>(blue | green << 5 | red << 10);
 }
 
-std::size_t CellOfColor(TRGB color) {
-    return CellOf(color.r >> kDroppedBits, color.g >> kDroppedBits, color.b >> kDroppedBits);
-}
-
 std::size_t Bin(std::int32_t level) {
     return static_cast<std::size_t>(level);
 }
@@ -214,10 +210,6 @@ void TBoxPalette::WritePalette(std::vector<TRGB>& color_map) const {
         color_map[i] =
             TRGB{level(mean[kBlueChannel]), level(mean[kGreenChannel]), level(mean[kRedChannel])};
     }
-}
-
-std::int32_t TBoxPalette::FindIndex(TRGB color) const {
-    return table_[CellOfColor(color)];
 }
 
 }  // namespace zm

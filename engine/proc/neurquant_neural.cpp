@@ -22,7 +22,6 @@ constexpr std::int32_t kBiasStep = 65536;
 constexpr std::int32_t kInitialAlpha = 1024;  // stands for 1
 constexpr std::int32_t kRadiusShift = 6;
 constexpr std::int32_t kRadiusDecay = 30;
-constexpr std::int32_t kRadiusPowerShift = 18;
 constexpr std::int32_t kMaxNeurons = 1024;
 constexpr std::int64_t kMinPixelsToSkip = 2000;
 
@@ -46,6 +45,15 @@ public:
 
     std::int64_t Total() const { return total_; }
     TRGB Next() {
+        if (next_ == ahead_.size()) {
+            std::generate(ahead_.begin(), ahead_.end(), [this] { return Read(); });
+            next_ = 0;
+        }
+        return ahead_[next_++];
+    }
+
+private:
+    TRGB Read() {
         // An image smaller than the step is left behind by the walk: the row wraps.
         const auto y = static_cast<std::int32_t>(position_ / width_ % height_);
         const auto x = static_cast<std::int32_t>(position_ % width_);
@@ -56,13 +64,15 @@ public:
         return pixels_.GetPixel(x, y);
     }
 
-private:
     TZmRgbRows pixels_;
     std::int32_t width_;
     std::int32_t height_;
     std::int64_t total_;
     std::int32_t step_;
     std::int64_t position_ = 0;
+    // Pixels far apart wait for memory; read one after the other, many do so at the same time.
+    std::array<TRGB, 64> ahead_{};
+    std::size_t next_ = ahead_.size();
 };
 
 }  // namespace
@@ -115,7 +125,7 @@ std::int32_t NeuralStep(std::int64_t pixel_count) {
 
 TNeuralPalette::TNeuralPalette(TZmBitmap& source, std::int32_t color_count, std::int32_t quality)
     : count_(color_count),
-      blue_(WholeBlocks(color_count), kContestFarAway),
+      blue_(WholeBlocks(color_count) + kContestBlock, kContestFarAway),
       green_(blue_),
       red_(blue_),
       freq_(blue_.size(), 0),
@@ -159,16 +169,18 @@ void TNeuralPalette::Train(TZmBitmap& source, std::int32_t sampling_factor) {
 
 // The power falls from the winner outward with the square of the distance.
 void TNeuralPalette::RebuildRadiusPower() {
-    radius_power_.resize(At(radius_));
+    radius_power_.assign(2 * At(radius_) + kContestBlock, 0);
     const std::int32_t square = radius_ * radius_;
-    for (std::int32_t i = 0; i < radius_; ++i) {
-        radius_power_[At(i)] = (square - i * i) * 256 / square * alpha_;
+    for (std::int32_t i = 1; i < radius_; ++i) {
+        const std::int32_t power = (square - i * i) * 256 / square * alpha_;
+        radius_power_[At(radius_ - 1 - i)] = power;
+        radius_power_[At(radius_ - 1 + i)] = power;
     }
 }
 
 std::int32_t TNeuralPalette::Contest(std::int32_t b, std::int32_t g, std::int32_t r) {
     const TContestView neurons{blue_.data(), green_.data(), red_.data(),
-                               freq_.data(), bias_.data(),  blue_.size()};
+                               freq_.data(), bias_.data(),  WholeBlocks(count_)};
     const TContestResult result = RunContest(neurons, b, g, r);
     freq_[At(result.closest)] += kFreqStep;
     bias_[At(result.closest)] -= kBiasStep;
@@ -184,27 +196,17 @@ void TNeuralPalette::MoveWinner(std::int32_t neuron, const TEntry& sample) {
     move(red_[At(neuron)], sample.r);
 }
 
-void TNeuralPalette::MoveNeighbour(std::int32_t neuron, std::int32_t power, const TEntry& sample) {
-    const auto move = [power](std::int32_t& value, std::int32_t target) {
-        std::int32_t product = (value - target) * power;
-        product += product < 0 ? (1 << kRadiusPowerShift) - 1 : 0;  // toward zero
-        value -= product >> kRadiusPowerShift;
-    };
-    move(blue_[At(neuron)], sample.b);
-    move(green_[At(neuron)], sample.g);
-    move(red_[At(neuron)], sample.r);
-}
-
 void TNeuralPalette::MoveNeighbours(std::int32_t neuron, const TEntry& sample) {
-    for (std::int32_t k = 1; k < radius_; ++k) {
-        const std::int32_t power = radius_power_[At(k)];
-        if (neuron + k < count_) {
-            MoveNeighbour(neuron + k, power, sample);
-        }
-        if (neuron - k >= 0) {
-            MoveNeighbour(neuron - k, power, sample);
-        }
+    if (radius_ == 0) {
+        return;
     }
+    const std::int32_t first = std::max(neuron - (radius_ - 1), 0);
+    const std::int32_t last = std::min(neuron + (radius_ - 1), count_ - 1);
+    const std::int32_t* const powers = &radius_power_[At(first - neuron + radius_ - 1)];
+    const std::size_t count = At(last - first + 1);
+    MoveToward(&blue_[At(first)], powers, count, sample.b);
+    MoveToward(&green_[At(first)], powers, count, sample.g);
+    MoveToward(&red_[At(first)], powers, count, sample.r);
 }
 
 void TNeuralPalette::Finish() {

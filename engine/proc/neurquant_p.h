@@ -53,6 +53,12 @@ TContestResult RunContestPlain(const TContestView& neurons, std::int32_t b, std:
 TContestResult RunContest(const TContestView& neurons, std::int32_t b, std::int32_t g,
                           std::int32_t r);
 
+/// Moves values toward a target: value i by powers[i] / 2^18 of the way, truncating toward zero.
+/// Values and target are 0 to 4080, powers 0 to 2^18. Whole blocks of kContestBlock numbers are
+/// read and written behind both starts, at least `count` of them.
+void MoveToward(std::int32_t* values, const std::int32_t* powers, std::size_t count,
+                std::int32_t target);
+
 /// A one-dimensional self-organising map trained with samples of the image, in integer
 /// arithmetic: channels have 4 fractional bits, the learning rate 10, radius 6.
 class TNeuralPalette {
@@ -76,7 +82,6 @@ private:
     std::int32_t Contest(std::int32_t b, std::int32_t g, std::int32_t r);
     void MoveWinner(std::int32_t neuron, const TEntry& sample);
     void MoveNeighbours(std::int32_t neuron, const TEntry& sample);
-    void MoveNeighbour(std::int32_t neuron, std::int32_t power, const TEntry& sample);
     void RebuildRadiusPower();
     void Finish();
     void BuildGreenIndex();
@@ -88,6 +93,7 @@ private:
     std::vector<std::int32_t> red_;
     std::vector<std::int32_t> freq_;
     std::vector<std::int32_t> bias_;
+    // Of the neurons from radius - 1 below the winner to radius - 1 above it, with 0 for itself.
     std::vector<std::int32_t> radius_power_;
     std::int32_t alpha_ = 0;
     std::int32_t radius_ = 0;     // in neurons; 0 moves the winner only
@@ -104,7 +110,7 @@ public:
     /// Entry i is the mean colour of box i; entries behind the last box are left alone.
     void WritePalette(std::vector<TRGB>& color_map) const;
     /// Box that the colour lies in.
-    std::int32_t FindIndex(TRGB color) const;
+    std::int32_t FindIndex(TRGB color) const { return table_[CellOfColor(color)]; }
 
 private:
     static constexpr std::int32_t kLevels = 32;
@@ -123,6 +129,9 @@ private:
         double variance_sum = 0;
     };
 
+    static std::size_t CellOfColor(TRGB color) {
+        return static_cast<std::size_t>(color.b >> 3 | color.g >> 3 << 5 | color.r >> 3 << 10);
+    }
     void CountPixels(TZmBitmap& source);
     TBox MakeWholeBox() const;
     void AddCells(TBox& box) const;

@@ -1,5 +1,5 @@
-// The contest of the neural palette over whole vectors of neurons. Integer arithmetic: the same
-// numbers as the plain loop gives.
+// The contest of the neural palette and the moves after it over whole vectors of neurons. Integer
+// arithmetic: the same numbers as plain loops give.
 
 #include <cstddef>
 
@@ -46,6 +46,24 @@ TContestResult FindWinners(const TContestView& neurons, std::int32_t b, std::int
             hn::GetLane(hn::MinOfLanes(tag, winner)) & kMask};
 }
 
+void MoveValues(std::int32_t* values, const std::int32_t* powers, std::size_t count,
+                std::int32_t target) {
+    constexpr int kPowerShift = 18;
+    const hn::CappedTag<std::int32_t, kContestBlock> tag;
+    const auto goal = hn::Set(tag, target);
+    const auto below_one = hn::Set(tag, (1 << kPowerShift) - 1);
+    const std::size_t lanes = hn::Lanes(tag);
+    for (std::size_t i = 0; i < count; i += lanes) {
+        // Numbers behind the last one stay as they are: power 0.
+        const auto power =
+            hn::IfThenElseZero(hn::FirstN(tag, count - i), hn::LoadU(tag, powers + i));
+        const auto value = hn::LoadU(tag, values + i);
+        auto product = hn::Mul(hn::Sub(value, goal), power);
+        product = hn::Add(product, hn::And(hn::BroadcastSignBit(product), below_one));
+        hn::StoreU(hn::Sub(value, hn::ShiftRight<kPowerShift>(product)), tag, values + i);
+    }
+}
+
 }  // namespace zm::HWY_NAMESPACE
 HWY_AFTER_NAMESPACE();
 
@@ -53,10 +71,16 @@ HWY_AFTER_NAMESPACE();
 namespace zm {
 
 HWY_EXPORT(FindWinners);
+HWY_EXPORT(MoveValues);
 
 TContestResult RunContest(const TContestView& neurons, std::int32_t b, std::int32_t g,
                           std::int32_t r) {
     return HWY_DYNAMIC_DISPATCH(FindWinners)(neurons, b, g, r);
+}
+
+void MoveToward(std::int32_t* values, const std::int32_t* powers, std::size_t count,
+                std::int32_t target) {
+    HWY_DYNAMIC_DISPATCH(MoveValues)(values, powers, count, target);
 }
 
 }  // namespace zm

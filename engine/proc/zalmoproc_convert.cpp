@@ -74,6 +74,21 @@ public:
         }
         return finder_->Find(color);
     }
+    /// Find of a row of colours.
+    void FindRow(const TRGB* row, std::vector<std::uint16_t>& indexes) {
+        if (quantizer_ == nullptr) {
+            std::transform(row, row + indexes.size(), indexes.begin(), [this](TRGB color) {
+                return static_cast<std::uint16_t>(finder_->Find(color));
+            });
+            return;
+        }
+        quantizer_->GetRGBIndexes(row, indexes.size(), indexes.data());
+        for (std::size_t x = 0; x < indexes.size(); ++x) {
+            if (indexes[x] >= palette_.colors.size()) {
+                indexes[x] = static_cast<std::uint16_t>(Find(row[x]));
+            }
+        }
+    }
 
 private:
     TZmPalette palette_;
@@ -120,10 +135,7 @@ void MapPixels(TZmBitmap& source, TZmBitmap& target, TColorChoice& choice, TZmDi
             continue;
         }
         if (dither == zmdtSolid) {
-            // In one loop the look-ups of many pixels wait for memory at the same time.
-            std::transform(row, row + indexes.size(), indexes.begin(), [&](TRGB color) {
-                return static_cast<std::uint16_t>(choice.Find(color));
-            });
+            choice.FindRow(row, indexes);
         } else {
             ditherer.MapRow(row, indexes.data());
         }

@@ -65,8 +65,10 @@ private:
 
     const std::vector<std::int32_t>& FilteredRow(std::int32_t index);
     void PrepareMeans();
+    void PrepareWindows();
     void FilterRow(const Sample* in, std::int32_t* out);
-    void ShrinkRow(const Sample* in, std::int32_t* out) const;
+    void ShrinkSpans(std::size_t first, const Sample* in, std::int32_t* out) const;
+    void ShrinkRowByWindows(const Sample* in, std::int32_t* out);
     void EnlargeRow(const Sample* in, std::int32_t* out) const;
     void EnlargeRowFast(const Sample* in, std::int32_t* out) const;
     void MeanRow(std::int32_t y);
@@ -88,8 +90,11 @@ private:
     double scale_y_;
     std::vector<TColumnSpan> spans_;
     std::array<TFilteredRow, 2> rows_;
-    std::vector<TMeanSpan> means_;         ///< fast form of shrinking zm24RGB
-    std::vector<std::uint8_t> row_copy_;   ///< for it: a row with a byte behind
+    std::vector<TMeanSpan> means_;        ///< fast form of shrinking zm24RGB far
+    std::vector<std::uint8_t> row_copy_;  ///< for it: a row with a byte behind
+    TMeanWindows windows_;                ///< fast form of shrinking bytes a little
+    std::vector<std::uint32_t> places_;   ///< in the window means, of the leading spans
+    std::vector<std::uint8_t> window_means_;
     std::vector<std::int32_t> fast_sums_;  ///< fast form of vertical means
     std::vector<std::int64_t> sums_;
     std::vector<Sample> output_;
@@ -122,9 +127,45 @@ TFastLinear<Sample, kChannels>::TFastLinear(TZmBitmap& source, TZmBitmap& target
     for (TFilteredRow& row : rows_) {
         row.samples = MakeWorkBuffer<std::int32_t>(samples + 1);
     }
+    PrepareWindows();
     PrepareMeans();
     sums_ = MakeWorkBuffer<std::int64_t>(scale_y_ > 1 ? 0 : samples);
     output_ = MakeWorkBuffer<Sample>(samples);
+}
+
+/// Neighbouring spans differ by a pixel in length. Where they are short, the means of all windows
+/// of both lengths are sooner made, by whole vectors, than those wanted one by one. Only the
+/// last span, or the last few, may be of another kind.
+template <typename Sample, std::size_t kChannels>
+void TFastLinear<Sample, kChannels>::PrepareWindows() {
+    const std::size_t row_bytes = static_cast<std::size_t>(source_width_) * kChannels;
+    if (!is_fast_ || sizeof(Sample) != 1 || scale_x_ > 1 || row_bytes < kMinWindowRow ||
+        spans_.size() < 2) {
+        return;
+    }
+    const auto length = [](const TColumnSpan& span) {
+        return static_cast<std::size_t>(span.right - span.left) + 1;
+    };
+    const auto by_length = [&](const TColumnSpan& a, const TColumnSpan& b) {
+        return length(a) < length(b);
+    };
+    const auto ends = std::minmax_element(spans_.begin(), spans_.end() - 1, by_length);
+    windows_ = TMeanWindows{kChannels, length(*ends.first), length(*ends.second)};
+    if (windows_.shortest < 2 || windows_.longest > kMaxWindow ||
+        windows_.longest > windows_.shortest + 1) {
+        return;
+    }
+    for (const TColumnSpan& span : spans_) {
+        const std::size_t left = static_cast<std::size_t>(span.left);
+        const bool is_short = length(span) == windows_.shortest;
+        if ((!is_short && length(span) != windows_.longest) ||
+            left + windows_.longest > static_cast<std::size_t>(source_width_)) {
+            break;
+        }
+        places_.push_back(
+            static_cast<std::uint32_t>(left * kChannels + (is_short ? 0 : row_bytes)));
+    }
+    window_means_ = MakeWorkBuffer<std::uint8_t>(static_cast<std::int64_t>(row_bytes) * 2 + 1);
 }
 
 /// The spans for the vector loop, where that applies.
@@ -133,7 +174,7 @@ void TFastLinear<Sample, kChannels>::PrepareMeans() {
     const auto is_long = [](const TColumnSpan& span) {
         return span.right - span.left >= kMaxMeanLength;
     };
-    if (!is_fast_ || kChannels != 3 || sizeof(Sample) != 1 || scale_x_ > 1 ||
+    if (!is_fast_ || kChannels != 3 || sizeof(Sample) != 1 || scale_x_ > 1 || !places_.empty() ||
         std::any_of(spans_.begin(), spans_.end(), is_long)) {
         return;
     }
@@ -145,10 +186,13 @@ void TFastLinear<Sample, kChannels>::PrepareMeans() {
     row_copy_.assign(static_cast<std::size_t>(source_width_) * kChannels + 1, 0);
 }
 
-/// Each channel becomes the truncating mean of its span.
+/// Each channel becomes the truncating mean of its span, from span `first` on.
 template <typename Sample, std::size_t kChannels>
-void TFastLinear<Sample, kChannels>::ShrinkRow(const Sample* in, std::int32_t* out) const {
-    for (const TColumnSpan& span : spans_) {
+void TFastLinear<Sample, kChannels>::ShrinkSpans(std::size_t first, const Sample* in,
+                                                 std::int32_t* out) const {
+    out += first * kChannels;
+    for (std::size_t i = first; i < spans_.size(); ++i) {
+        const TColumnSpan& span = spans_[i];
         std::array<std::int64_t, kChannels> sums{};
         const Sample* pixel = in + static_cast<std::size_t>(span.left) * kChannels;
         for (std::int32_t column = span.left; column <= span.right; ++column) {
@@ -160,6 +204,21 @@ void TFastLinear<Sample, kChannels>::ShrinkRow(const Sample* in, std::int32_t* o
         for (const std::int64_t sum : sums) {
             *out++ = static_cast<std::int32_t>(sum / count);
         }
+    }
+}
+
+template <typename Sample, std::size_t kChannels>
+void TFastLinear<Sample, kChannels>::ShrinkRowByWindows(const Sample* in, std::int32_t* out) {
+    if constexpr (sizeof(Sample) == 1) {
+        MeanWindowsOfRow(in, static_cast<std::size_t>(source_width_) * kChannels, windows_,
+                         window_means_.data());
+        if constexpr (kChannels == 3) {
+            PickPixels24(window_means_.data(), places_.data(), places_.size(), out);
+        } else {
+            std::transform(places_.begin(), places_.end(), out,
+                           [this](std::uint32_t place) { return window_means_[place]; });
+        }
+        ShrinkSpans(places_.size(), in, out);
     }
 }
 
@@ -191,11 +250,13 @@ void TFastLinear<Sample, kChannels>::EnlargeRowFast(const Sample* in, std::int32
 
 template <typename Sample, std::size_t kChannels>
 void TFastLinear<Sample, kChannels>::FilterRow(const Sample* in, std::int32_t* out) {
-    if (!means_.empty()) {
+    if (!places_.empty()) {
+        ShrinkRowByWindows(in, out);
+    } else if (!means_.empty()) {
         std::memcpy(row_copy_.data(), in, row_copy_.size() - 1);
         MeanSpans24(row_copy_.data(), means_.data(), means_.size(), out);
     } else if (scale_x_ <= 1) {
-        ShrinkRow(in, out);
+        ShrinkSpans(0, in, out);
     } else if (is_fast_) {
         EnlargeRowFast(in, out);
     } else {
@@ -253,14 +314,11 @@ template <typename Sample, std::size_t kChannels>
 void TFastLinear<Sample, kChannels>::MeanRowsFast(std::int32_t top, std::int32_t bottom) {
     fast_sums_.assign(output_.size(), 0);
     for (std::int32_t row = top; row <= bottom; ++row) {
-        const std::int32_t* samples = FilteredRow(row).data();
-        for (std::size_t i = 0; i < fast_sums_.size(); ++i) {
-            fast_sums_[i] += samples[i];
-        }
+        AddInts(FilteredRow(row).data(), fast_sums_.size(), fast_sums_.data());
     }
-    const TQuotient quotient(bottom - top + 1);
-    for (std::size_t i = 0; i < fast_sums_.size(); ++i) {
-        output_[i] = quotient(static_cast<float>(fast_sums_[i]));
+    if constexpr (sizeof(Sample) == 1) {
+        DivideInts(fast_sums_.data(), fast_sums_.size(), TQuotient(bottom - top + 1),
+                   output_.data());
     }
 }
 

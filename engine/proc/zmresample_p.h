@@ -229,6 +229,30 @@ struct TMeanSpan {
 void MeanSpans24(const std::uint8_t* in, const TMeanSpan* spans, std::size_t count,
                  std::int32_t* out);
 
+/// Means of all the windows of a row: of `shortest` pixels and, if `longest` is one more, of
+/// that too. Lengths are 2 to kMaxWindow; a pixel is `step` bytes.
+struct TMeanWindows {
+    std::size_t step = 0;
+    std::size_t shortest = 0;
+    std::size_t longest = 0;
+};
+inline constexpr std::size_t kMaxWindow = 9;
+/// Bytes that a row must have for MeanWindowsOfRow.
+inline constexpr std::size_t kMinWindowRow = 128;
+/// out[i] = the truncating mean of the window that starts with in[i]; the longer windows follow
+/// at out[bytes + i]. Windows that the longest does not fit behind are left out.
+void MeanWindowsOfRow(const std::uint8_t* in, std::size_t bytes, const TMeanWindows& windows,
+                      std::uint8_t* out);
+/// Four numbers from each place, the next ones over the fourth: three-byte pixels gathered.
+void PickPixels24(const std::uint8_t* in, const std::uint32_t* places, std::size_t count,
+                  std::int32_t* out);
+
+/// sums += numbers.
+void AddInts(const std::int32_t* numbers, std::size_t count, std::int32_t* sums);
+/// Sums within kMaxFloatSum, divided.
+void DivideInts(const std::int32_t* sums, std::size_t count, const TQuotient& quotient,
+                std::uint8_t* out);
+
 /// Two rows of integers of -1024 to 1024 and a fraction between them.
 struct TBlendRows {
     const std::int32_t* upper = nullptr;

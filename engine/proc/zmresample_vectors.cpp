@@ -1,5 +1,6 @@
 // Vector loops of the kernel and the Fast linear engines.
 
+#include <algorithm>
 #include <cstddef>
 #include <cstring>
 
@@ -31,7 +32,88 @@ void MeanSpans(const std::uint8_t* in, const TMeanSpan* spans, std::size_t count
     }
 }
 
+void MeanWindows(const std::uint8_t* in, std::size_t bytes, const TMeanWindows& windows,
+                 std::uint8_t* out) {
+    for (std::size_t length = windows.shortest; length <= windows.longest; ++length, out += bytes) {
+        for (std::size_t i = 0; i + (windows.longest - 1) * windows.step < bytes; ++i) {
+            std::size_t sum = 0;
+            for (std::size_t k = 0; k < length; ++k) {
+                sum += in[i + k * windows.step];
+            }
+            out[i] = static_cast<std::uint8_t>(sum / length);
+        }
+    }
+}
+
+void PickPixels(const std::uint8_t* in, const std::uint32_t* places, std::size_t count,
+                std::int32_t* out) {
+    for (std::size_t x = 0; x < count; ++x, out += 3) {
+        std::copy_n(in + places[x], 4, out);
+    }
+}
+
 #else
+
+using TByteTag = hn::ScalableTag<std::uint8_t>;
+using TWordTag = hn::Repartition<std::uint16_t, TByteTag>;
+
+/// Sums of the bytes at even places and of those at odd ones.
+struct TWindowSums {
+    hn::Vec<TWordTag> all;  ///< odd * 256 + even, modulo 65536
+    hn::Vec<TWordTag> odd;
+};
+
+HWY_INLINE void AddToWindow(const std::uint8_t* in, TWindowSums& sums) {
+    const auto bytes = hn::BitCast(TWordTag(), hn::LoadU(TByteTag(), in));
+    sums.all = hn::Add(sums.all, bytes);
+    sums.odd = hn::Add(sums.odd, hn::ShiftRight<8>(bytes));
+}
+
+/// Divides by `length` with a factor of 65536 / length rounded up: less than `length` too much a
+/// unit, so that a quotient is too large by less than 255 * length^2 / 65536 / length, which is
+/// below the 1 / length that would reach the next integer.
+HWY_INLINE void StoreWindow(const TWindowSums& sums, std::size_t length, std::uint8_t* out) {
+    static_assert(255 * kMaxWindow * kMaxWindow < 65536);
+    const TWordTag tag;
+    const auto factor = hn::Set(tag, static_cast<std::uint16_t>((65535 + length) / length));
+    const auto even = hn::MulHigh(hn::Sub(sums.all, hn::ShiftLeft<8>(sums.odd)), factor);
+    const auto odd = hn::MulHigh(sums.odd, factor);
+    const auto both = hn::Or(even, hn::ShiftLeft<8>(odd));
+    hn::StoreU(hn::BitCast(TByteTag(), both), TByteTag(), out);
+}
+
+/// The last vector overlaps the one before it.
+void MeanWindows(const std::uint8_t* in, std::size_t bytes, const TMeanWindows& windows,
+                 std::uint8_t* out) {
+    const std::size_t lanes = hn::Lanes(TByteTag());
+    const std::size_t step = windows.step;
+    const std::size_t shortest = windows.shortest;
+    const std::size_t last = bytes - (windows.longest - 1) * step - lanes;
+    for (std::size_t i = 0;; i = i + lanes < last ? i + lanes : last) {
+        TWindowSums sums{hn::Zero(TWordTag()), hn::Zero(TWordTag())};
+        const std::uint8_t* const end = in + i + shortest * step;
+        for (const std::uint8_t* at = in + i; at != end; at += step) {
+            AddToWindow(at, sums);
+        }
+        StoreWindow(sums, shortest, out + i);
+        if (windows.longest > shortest) {
+            AddToWindow(end, sums);
+            StoreWindow(sums, windows.longest, out + bytes + i);
+        }
+        if (i == last) {
+            return;
+        }
+    }
+}
+
+void PickPixels(const std::uint8_t* in, const std::uint32_t* places, std::size_t count,
+                std::int32_t* out) {
+    const hn::FixedTag<std::uint8_t, 4> byte_tag;
+    const hn::FixedTag<std::int32_t, 4> int_tag;
+    for (std::size_t x = 0; x < count; ++x, out += 3) {
+        hn::StoreU(hn::PromoteTo(int_tag, hn::LoadU(byte_tag, in + places[x])), int_tag, out);
+    }
+}
 
 /// The channels of a pixel side by side; the fourth lane belongs to the next pixel.
 void MeanSpans(const std::uint8_t* in, const TMeanSpan* spans, std::size_t count,
@@ -203,6 +285,43 @@ void MixRows(const TWeightedRows& rows, std::size_t count, std::uint8_t* out) {
     }
 }
 
+void AddNumbers(const std::int32_t* numbers, std::size_t count, std::int32_t* sums) {
+    const hn::ScalableTag<std::int32_t> tag;
+    const std::size_t lanes = hn::Lanes(tag);
+    std::size_t i = 0;
+    for (; i + lanes <= count; i += lanes) {
+        hn::StoreU(hn::Add(hn::LoadU(tag, sums + i), hn::LoadU(tag, numbers + i)), tag, sums + i);
+    }
+    for (; i < count; ++i) {
+        sums[i] += numbers[i];
+    }
+}
+
+template <class D>
+HWY_INLINE void DivideVector(D tag, const std::int32_t* sums, const TQuotient& quotient,
+                             std::uint8_t* out) {
+    const hn::Rebind<std::int32_t, D> int_tag;
+    const hn::Rebind<std::uint8_t, D> byte_tag;
+    auto value = hn::ConvertTo(tag, hn::LoadU(int_tag, sums));
+    value =
+        hn::Mul(hn::Add(value, hn::Set(tag, quotient.Half())), hn::Set(tag, quotient.Reciprocal()));
+    value = hn::Min(hn::Max(value, hn::Zero(tag)), hn::Set(tag, 255.0f));
+    hn::StoreU(hn::DemoteTo(byte_tag, hn::ConvertTo(int_tag, value)), byte_tag, out);
+}
+
+void DivideNumbers(const std::int32_t* sums, std::size_t count, const TQuotient& quotient,
+                   std::uint8_t* out) {
+    const hn::ScalableTag<float> wide;
+    const hn::CappedTag<float, 1> narrow;
+    std::size_t i = 0;
+    for (const std::size_t lanes = hn::Lanes(wide); i + lanes <= count; i += lanes) {
+        DivideVector(wide, sums + i, quotient, out + i);
+    }
+    for (; i < count; ++i) {
+        DivideVector(narrow, sums + i, quotient, out + i);
+    }
+}
+
 template <class D>
 HWY_INLINE bool BlendVector(D tag, const TBlendRows& rows, std::size_t i, std::uint8_t* out) {
     const hn::Rebind<std::int32_t, D> int_tag;
@@ -237,10 +356,14 @@ HWY_AFTER_NAMESPACE();
 #if HWY_ONCE
 namespace zm {
 
+HWY_EXPORT(AddNumbers);
 HWY_EXPORT(BlendInts);
+HWY_EXPORT(DivideNumbers);
 HWY_EXPORT(FilterPairs);
 HWY_EXPORT(MeanSpans);
+HWY_EXPORT(MeanWindows);
 HWY_EXPORT(MixRows);
+HWY_EXPORT(PickPixels);
 HWY_EXPORT(RowsAtOnce);
 HWY_EXPORT(SpreadPairs);
 
@@ -265,6 +388,25 @@ void MixByteRows(const TWeightedRows& rows, std::size_t count, std::uint8_t* out
 void MeanSpans24(const std::uint8_t* in, const TMeanSpan* spans, std::size_t count,
                  std::int32_t* out) {
     HWY_DYNAMIC_DISPATCH(MeanSpans)(in, spans, count, out);
+}
+
+void MeanWindowsOfRow(const std::uint8_t* in, std::size_t bytes, const TMeanWindows& windows,
+                      std::uint8_t* out) {
+    HWY_DYNAMIC_DISPATCH(MeanWindows)(in, bytes, windows, out);
+}
+
+void PickPixels24(const std::uint8_t* in, const std::uint32_t* places, std::size_t count,
+                  std::int32_t* out) {
+    HWY_DYNAMIC_DISPATCH(PickPixels)(in, places, count, out);
+}
+
+void AddInts(const std::int32_t* numbers, std::size_t count, std::int32_t* sums) {
+    HWY_DYNAMIC_DISPATCH(AddNumbers)(numbers, count, sums);
+}
+
+void DivideInts(const std::int32_t* sums, std::size_t count, const TQuotient& quotient,
+                std::uint8_t* out) {
+    HWY_DYNAMIC_DISPATCH(DivideNumbers)(sums, count, quotient, out);
 }
 
 bool BlendIntRows(const TBlendRows& rows, std::size_t count, std::uint8_t* out) {

@@ -88,8 +88,9 @@ def check_directions(sources):
 def may_know_system(name):
     """The platform room, views, and test sources that are built for one system, as their names
     say."""
-    return name.startswith(("engine/platform/", "actions/views/win32/")) or re.match(
-        r"tests/.*(linux|win32)", name)
+    return name.startswith(
+        ("engine/platform/", "actions/views/win32/", "host/views/win32/")) or re.match(
+            r"tests/.*(linux|win32)", name)
 
 
 def check_systems(sources):

@@ -156,6 +156,22 @@ TEST(CanvasText, WrapsInARectangle) {
     EXPECT_GT(HeightOf(ink), 2 * kEm);
 }
 
+/// The bottom of the ink of three lines within a height of so many tenths of a line.
+std::int32_t InkBottom(std::int32_t tenths, bool is_typographic) {
+    TDrawing drawing(100, 120);
+    SetFont(*drawing.zm_canvas, kEm);
+    const std::int32_t line = drawing.zm_canvas->MeasureText(u"H").y;
+    drawing.zm_canvas->SetTypographicDrawText(is_typographic);
+    drawing.zm_canvas->DrawText(u"HH\nHH\nHH", TRect{5, 0, 95, line * tenths / 10});
+    return drawing.CoveredArea() > 0 ? drawing.InkBounds().bottom : 0;
+}
+
+TEST(CanvasText, HeightsLimitTheLines) {
+    for (int t : {4, 8, 11, 14, 16, 18, 21, 26, 32}) {
+        printf("%d: %d %d\n", t, InkBottom(t, true), InkBottom(t, false));
+    }
+}
+
 TEST(CanvasText, StylesChangeThePixels) {
     double area[5];
     TRect ink[5];

@@ -373,6 +373,55 @@ TEST(Quantizer, AnswersDoNotDependOnEarlierOnes) {
     }
 }
 
+// A row of colours gets the answers of single ones, whatever answers them: exact colours, greys,
+// the network, boxes, a palette of the image's own (also for colours that it has not).
+TEST(Quantizer, RowsAndSingleColoursAgree) {
+    auto queries = test::MakeNoise(zm24RGB, 300, 1, 41);
+    const auto* const row = reinterpret_cast<const TRGB*>(queries->GetScanLine(0));
+    const struct {
+        TZmPixelFormat format;
+        std::int32_t width;
+        std::int32_t method;
+    } cases[] = {{zm24RGB, 12, kNeural},
+                 {zm8g, 40, kNeural},
+                 {zm24RGB, 40, kNeural},
+                 {zm24RGB, 40, kBoxes},
+                 {zm8p, 40, kNeural}};
+    for (const auto& c : cases) {
+        const TReductionSettings settings(c.method, -1);
+        auto image = test::MakeNoise(c.format, c.width, 20, 42);
+        std::vector<TRGB> map;
+        TZmQuantizer by_row(*image, map, 256);
+        TZmQuantizer by_color(*image, map, 256);
+        std::vector<std::uint16_t> indexes(300);
+        for (int round = 0; round < 2; ++round) {
+            by_row.GetRGBIndexes(row, indexes.size(), indexes.data());
+            for (std::size_t i = 0; i < indexes.size(); ++i) {
+                ASSERT_EQ(indexes[i], by_color.GetRGBIndex(row[i])) << int{c.format} << ' ' << i;
+            }
+        }
+    }
+}
+
+// Every count, against the formula in plain numbers; what lies behind stays as it was.
+TEST(Quantizer, MovesTowardTheTarget) {
+    for (std::size_t count = 0; count <= 70; ++count) {
+        std::vector<std::int32_t> powers;
+        std::vector<std::int32_t> values;
+        for (std::size_t i = 0; i < 70 + 2 * kContestBlock; ++i) {
+            powers.push_back(static_cast<std::int32_t>(i * 7919 * 31 % 262145));
+            values.push_back(static_cast<std::int32_t>(i * 1237 % 4081));
+        }
+        std::vector<std::int32_t> expected = values;
+        const auto target = static_cast<std::int32_t>(count * 997 % 4081);
+        for (std::size_t i = 0; i < count; ++i) {
+            expected[i] -= (values[i] - target) * powers[i] / 262144;
+        }
+        MoveToward(values.data(), powers.data(), count, target);
+        ASSERT_EQ(values, expected) << count;
+    }
+}
+
 // Vectors of neurons and single ones find the same winners, ties included, and leave the same
 // frequencies and biases.
 TEST(Quantizer, ContestsAgree) {

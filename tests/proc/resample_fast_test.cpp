@@ -64,6 +64,22 @@ TEST(ResampleFormsTest, FastLinear) {
     });
 }
 
+/// Spans of 2 to 10 pixels, whole ratios and others, with all lengths of the last vector.
+TEST(ResampleFormsTest, FastLinearByWindows) {
+    for (std::int32_t width = 90; width <= 250; width += 5) {
+        for (const std::int32_t tenths : {10, 11, 15, 20, 25, 33, 40, 47, 55, 70, 80, 85, 95}) {
+            const TZmImageSize to{width * 10 / tenths, 4};
+            for (const TZmPixelFormat format : {zm8g, zm24RGB}) {
+                CompareForms(format, {width, 7}, to, width % 2 == 0 ? kNoiseContent : kSteps,
+                             [](TZmBitmap& source, TZmBitmap& target, TResampleForm form) {
+                                 return ResampleFastLinear(source, target, nullptr, kNobody, form);
+                             });
+            }
+            ASSERT_FALSE(testing::Test::HasFailure());
+        }
+    }
+}
+
 TEST(ResampleFormsTest, FastLinearInARectangle) {
     const TRect rect{3, 2, 30, 11};
     CompareForms(zm24RGB, {71, 30}, {35, 14}, kNoiseContent,

@@ -1,10 +1,12 @@
 // Saves a picture of every form as the system shows it: win32_gallery PERCENT FOLDER
 #include <windows.h>
 
+#include <algorithm>
 #include <cctype>
 #include <cstdlib>
 #include <iostream>
 #include <map>
+#include <vector>
 
 #include "actions/uActionFormLayout.h"
 #include "actions/views/uFormToolkit.h"
@@ -53,13 +55,16 @@ bool SavePicture(HWND window, const std::u16string& file_name) {
     BITMAPINFOHEADER format{};
     format.biSize = sizeof(format);
     format.biWidth = client.right;
-    format.biHeight = 1;
+    format.biHeight = -client.bottom;  // the top row first
     format.biPlanes = 1;
     format.biBitCount = 24;
-    // The system counts rows from below.
-    for (LONG row = 0; row < client.bottom; ++row) {
-        GetDIBits(memory, copy, static_cast<UINT>(client.bottom - 1 - row), 1, picture.GetRow(row),
-                  reinterpret_cast<BITMAPINFO*>(&format), DIB_RGB_COLORS);
+    const auto row_bytes = (static_cast<std::size_t>(client.right) * 3 + 3) / 4 * 4;
+    std::vector<std::uint8_t> pixels(row_bytes * static_cast<std::size_t>(client.bottom));
+    GetDIBits(memory, copy, 0, static_cast<UINT>(client.bottom), pixels.data(),
+              reinterpret_cast<BITMAPINFO*>(&format), DIB_RGB_COLORS);
+    for (std::int32_t row = 0; row < client.bottom; ++row) {
+        std::copy_n(&pixels[row_bytes * static_cast<std::size_t>(row)],
+                    static_cast<std::size_t>(client.right) * 3, picture.GetRow(row));
     }
     DeleteDC(memory);
     DeleteObject(copy);

@@ -21,12 +21,14 @@ constexpr std::int32_t kPointsPerInch = 72;
 constexpr std::size_t kMaxSampleLength = 500;
 constexpr LONG kSwatchGap = 2;
 
+/// What makes a window of the system a control of a kind.
 struct TWindowLook {
     const wchar_t* window_class;
     DWORD style;
     DWORD extended_style = 0;
 };
 
+/// The default button is the one that the enter key presses from every field.
 TWindowLook ButtonLook(const TFormControl& control) {
     if (control.kind == fcSpeedButton) {
         return {kSpeedButtonClass, WS_GROUP};
@@ -53,6 +55,7 @@ TWindowLook LookOf(const TFormControl& control) {
     return ButtonLook(control);
 }
 
+/// A visible child without size; PlaceControls gives it its place.
 HWND NewWindow(HWND dialog, const TWindowLook& look, const std::u16string& text, int id) {
     const HWND window =
         CreateWindowExW(look.extended_style, look.window_class, WideText(text),
@@ -73,6 +76,8 @@ std::u16string PlainTitle(const std::u16string& title) {
     return doubled;
 }
 
+/// The buttons follow their frame: the system takes what stands behind a group's first window, up
+/// to the next group, for one choice.
 void AddRadioButtons(HWND dialog, const TFormControl& group, std::int32_t index,
                      TControlWindows& windows) {
     for (std::size_t item = 0; item < group.items.size(); ++item) {
@@ -106,6 +111,8 @@ HFONT NewFormFont(std::int32_t scale_percent) {
     NONCLIENTMETRICSW metrics{};
     metrics.cbSize = sizeof(metrics);
     SystemParametersInfoW(SPI_GETNONCLIENTMETRICS, sizeof(metrics), &metrics, 0);
+    // The face is the user's; the size is the design's, because the host's scale already says how
+    // large the user wants all.
     LOGFONTW font = metrics.lfMessageFont;
     font.lfHeight = -ScaleLength(kFontHeight, scale_percent);
     font.lfWidth = 0;
@@ -123,6 +130,7 @@ std::int32_t LineHeight(HFONT font) {
 }
 
 std::u16string WindowText(HWND window) {
+    // Lengths come from the system and are those of texts in memory: they cannot overflow here.
     const int length = GetWindowTextLengthW(window);
     std::u16string text(static_cast<std::size_t>(length) + 1, u'\0');
     const int read = GetWindowTextW(window, reinterpret_cast<wchar_t*>(text.data()), length + 1);
@@ -180,6 +188,7 @@ void DrawSample(const DRAWITEMSTRUCT& draw, const TFormControlState& state) {
     RECT place = draw.rcItem;
     FillRect(draw.hDC, &place, GetSysColorBrush(COLOR_BTNFACE));
     const std::u16string start = state.text.substr(0, kMaxSampleLength);
+    // The size on screen is the stored one at any scale of the form: it shows what will be drawn.
     const LOGFONTW record = FontRecord(state.font, draw.hDC);
     const TGdiObject<HFONT> font(CreateFontIndirectW(&record));
     const HGDIOBJ old_font = SelectObject(draw.hDC, font.Get());

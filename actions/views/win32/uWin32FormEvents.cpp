@@ -56,6 +56,8 @@ void TWin32FormView::OnEditChanged(std::int32_t control) {
     form_.SetText(control, WindowText(Windows(control).main));
 }
 
+/// A list's choice counts at once; a colour box's only when it is confirmed, because its first
+/// item opens a picker.
 void TWin32FormView::OnListEvent(std::int32_t control, int code) {
     const HWND list = Windows(control).main;
     if (Control(control).kind == fcComboBox) {
@@ -71,6 +73,7 @@ void TWin32FormView::OnListEvent(std::int32_t control, int code) {
     if (code != CBN_SELENDOK && code != CBN_SELENDCANCEL && !moved_closed) {
         return;
     }
+    // More than one of these may come for one choice; the last one tells.
     color_confirmed_ = code != CBN_SELENDCANCEL;
     if (pending_color_box_ < 0) {
         pending_color_box_ = control;
@@ -88,6 +91,7 @@ void TWin32FormView::OnColorChosen(std::int32_t control) {
     form_.SetIndex(control, static_cast<std::int32_t>(index));
 }
 
+/// Clicks of all windows of the system's button class, radio buttons and check boxes among them.
 void TWin32FormView::OnButtonClicked(std::int32_t control, HWND window) {
     const TControlWindows& windows = Windows(control);
     switch (Control(control).kind) {
@@ -182,6 +186,10 @@ INT_PTR TWin32FormView::HandleMessage(UINT message, WPARAM wparam, LPARAM lparam
             return TRUE;
         case kColorChosenMessage: OnColorChosen(static_cast<std::int32_t>(wparam)); return TRUE;
         case WM_HELP: SendHelp(); return TRUE;
+        case WM_NCDESTROY:  // by the host, when it ends in the midst
+            window_ = nullptr;
+            WakeLoop();
+            return FALSE;
         case WM_SIZE:
             if (opened_ && wparam != SIZE_MINIMIZED) {
                 PlaceControls();
@@ -201,6 +209,7 @@ INT_PTR TWin32FormView::HandleMessage(UINT message, WPARAM wparam, LPARAM lparam
     }
 }
 
+/// The system's way in: finds the view of a window.
 INT_PTR CALLBACK TWin32FormView::DialogProc(HWND window, UINT message, WPARAM wparam,
                                             LPARAM lparam) {
     if (message == WM_INITDIALOG) {
@@ -217,7 +226,6 @@ INT_PTR CALLBACK TWin32FormView::DialogProc(HWND window, UINT message, WPARAM wp
     } catch (const std::exception& error) {
         if (!view->opened_) {
             view->failure_ = Utf16FromUtf8(error.what());
-            EndDialog(window, 0);
         } else {
             MessageBoxA(window, error.what(), nullptr, MB_OK | MB_ICONERROR);
         }

@@ -3,11 +3,8 @@
 #include <commctrl.h>
 
 #include <algorithm>
-#include <exception>
 
 #include "actions/uActionFormLayout.h"
-#include "actions/views/win32/uWin32FormIds.h"
-#include "engine/foundation/zmstrings.h"
 
 /// The dialog itself: its making, places and states. What its user does is in
 /// uWin32FormEvents.cpp.
@@ -38,19 +35,23 @@ private:
     int& depth_;
 };
 
-/// A dialog template without controls; its menu, class and title are empty texts.
-struct TEmptyTemplate {
+/// A dialog template without controls; its menu, class and title are empty texts. The system reads
+/// it as one run of words that begins at a double word.
+struct alignas(DWORD) TEmptyTemplate {
     DLGTEMPLATE head{};
     WORD menu = 0;
     WORD window_class = 0;
     WORD title = 0;
 };
+static_assert(sizeof(TEmptyTemplate) == sizeof(DLGTEMPLATE) + 3 * sizeof(WORD));
 
+/// Frames of a form that keeps its size and of one that the user can resize.
 DWORD WindowStyle(TFormBorder border) {
     const DWORD style = WS_POPUP | WS_CAPTION | WS_SYSMENU;
     return border == fbsSizeable ? style | WS_THICKFRAME | WS_MAXIMIZEBOX : style | DS_MODALFRAME;
 }
 
+/// What the window's own frame and title add to its client area.
 SIZE FrameSize(HWND window) {
     RECT frame{};
     AdjustWindowRectEx(&frame, static_cast<DWORD>(GetWindowLongW(window, GWL_STYLE)), FALSE,
@@ -80,6 +81,7 @@ POINT CentredPlace(HWND main_window, SIZE size) {
             place(over.top, over.bottom, size.cy, work.top, work.bottom)};
 }
 
+/// Hosts may give a window that has gone, or one inside of their main window.
 HWND ValidMainWindow(void* handle) {
     const auto window = static_cast<HWND>(handle);
     return window != nullptr && IsWindow(window) != FALSE ? GetAncestor(window, GA_ROOT) : nullptr;
@@ -88,17 +90,20 @@ HWND ValidMainWindow(void* handle) {
 }  // namespace
 
 BOOL CALLBACK TOtherWindows::DisableOne(HWND window, LPARAM others) {
-    if (IsWindowVisible(window) != FALSE && IsWindowEnabled(window) != FALSE) {
-        reinterpret_cast<TOtherWindows*>(others)->disabled_.push_back(window);
+    auto& self = *reinterpret_cast<TOtherWindows*>(others);
+    if (window != self.dialog_ && IsWindowVisible(window) != FALSE &&
+        IsWindowEnabled(window) != FALSE) {
+        self.disabled_.push_back(window);
         EnableWindow(window, FALSE);
     }
     return TRUE;
 }
 
-void TOtherWindows::Disable(HWND main_window) {
+void TOtherWindows::Disable(HWND dialog, HWND main_window) {
+    dialog_ = dialog;
     EnumThreadWindows(GetCurrentThreadId(), &DisableOne, reinterpret_cast<LPARAM>(this));
     if (main_window != nullptr) {
-        DisableOne(main_window, reinterpret_cast<LPARAM>(this));
+        DisableOne(main_window, reinterpret_cast<LPARAM>(this));  // it may be another thread's
     }
 }
 
@@ -142,25 +147,50 @@ bool TWin32FormView::Run(std::u16string& reason) {
     TEmptyTemplate design;
     design.head.style = WindowStyle(form_.Design().border);
     const HWND active = GetActiveWindow();
-    // The other windows may lie on the screen without the main one: a host's window that edits
-    // the step. The form belongs before the one that the user is in.
-    const HWND owner = main_window_ != nullptr ? main_window_ : active;
-    others_.Disable(main_window_);
-    DialogBoxIndirectParamW(OwnModule(), &design.head, owner, &DialogProc,
-                            reinterpret_cast<LPARAM>(this));
-    const DWORD error = GetLastError();
+    CreateDialogIndirectParamW(OwnModule(), &design.head,
+                               main_window_ != nullptr ? main_window_ : active, &DialogProc,
+                               reinterpret_cast<LPARAM>(this));
+    if (opened_) {
+        others_.Disable(window_, main_window_);
+        ShowWindow(window_, SW_SHOW);
+        RunMessages();
+    } else {
+        reason = failure_.empty() ? u"the system opens no window." : failure_;
+    }
+    // Before the dialog goes: the system makes another window active then, one that is enabled.
     others_.Enable();
+    if (window_ != nullptr) {
+        DestroyWindow(window_);
+    }
+    // The host may have been in another of its windows than the main one.
     if (active != nullptr && IsWindow(active) != FALSE && GetActiveWindow() != active) {
         SetActiveWindow(active);
-    }
-    if (!opened_) {
-        reason = failure_.empty() ? u"the system opens no window (error " +
-                                        Utf16FromUtf8(std::to_string(error)) + u")."
-                                  : failure_;
     }
     return opened_;
 }
 
+/// The dialog's own loop, for the help key: not every control passes it on.
+void TWin32FormView::RunMessages() {
+    MSG message{};
+    while (!closed_ && window_ != nullptr) {
+        const BOOL got = GetMessageW(&message, nullptr, 0, 0);
+        if (got == FALSE) {
+            PostQuitMessage(static_cast<int>(message.wParam));  // meant for the host's loop
+        }
+        if (got == FALSE || got == -1) {
+            return;
+        }
+        const bool is_own = message.hwnd == window_ || IsChild(window_, message.hwnd) != FALSE;
+        if (is_own && message.message == WM_KEYDOWN && message.wParam == VK_F1) {
+            SendHelp();
+        } else if (IsDialogMessageW(window_, &message) == FALSE) {
+            TranslateMessage(&message);
+            DispatchMessageW(&message);
+        }
+    }
+}
+
+/// Makes all that the dialog shows, before it does.
 void TWin32FormView::Open() {
     const TThemedScope themed;
     SetWindowTextW(window_, WideText(form_.Design().caption));
@@ -188,6 +218,7 @@ void TWin32FormView::SizeWindow() {
                  SWP_NOZORDER | SWP_NOACTIVATE);
 }
 
+/// The design's smallest size, with the frame as it is on this system.
 SIZE TWin32FormView::SmallestWindow() const {
     const TActionFormDesign& design = form_.Design();
     const SIZE frame = FrameSize(window_);
@@ -218,6 +249,7 @@ void TWin32FormView::BuildControl(std::int32_t control) {
     }
 }
 
+/// The tool tip goes with the dialog, which owns it.
 void TWin32FormView::AddHint(std::int32_t control) {
     const HWND tip =
         CreateWindowExW(WS_EX_TOPMOST, TOOLTIPS_CLASSW, nullptr, WS_POPUP | TTS_ALWAYSTIP, 0, 0, 0,
@@ -232,6 +264,7 @@ void TWin32FormView::AddHint(std::int32_t control) {
 }
 
 void TWin32FormView::FocusFirst() {
+    // As the tab key does it: the text of an edit becomes selected.
     const HWND first = GetNextDlgTabItem(window_, nullptr, FALSE);
     SendMessageW(window_, WM_NEXTDLGCTL, reinterpret_cast<WPARAM>(first), TRUE);
 }
@@ -310,6 +343,7 @@ void TWin32FormView::ShowText(std::int32_t control) {
         case fcColorBox:
         case fcRadioGroup: break;
         default:
+            // A text that the user has just typed must not lose its caret.
             if (WindowText(window) != text) {
                 SetWindowTextW(window, WideText(text));
             }
@@ -327,6 +361,7 @@ void TWin32FormView::ShowIndex(std::int32_t control) {
             InvalidateRect(windows.main, nullptr, TRUE);
             break;
         case fcRadioGroup:
+            // The tab key goes to the chosen button only; arrow keys go on from there.
             for (std::size_t item = 0; item < windows.items.size(); ++item) {
                 const bool chosen = static_cast<std::size_t>(index) == item;
                 const LONG style = GetWindowLongW(windows.items[item], GWL_STYLE) & ~WS_TABSTOP;
@@ -354,9 +389,13 @@ void TWin32FormView::ShowEnabled(std::int32_t control) {
 }
 
 void TWin32FormView::CloseWindow() {
-    // Before the dialog goes: the system makes another window active then, one that is enabled.
-    others_.Enable();
-    EndDialog(window_, 0);
+    closed_ = true;
+    WakeLoop();
+}
+
+/// The loop may wait inside of the call that brought it here.
+void TWin32FormView::WakeLoop() {
+    PostThreadMessageW(GetCurrentThreadId(), WM_NULL, 0, 0);
 }
 
 bool TWin32FormView::PickFile(TFilePick pick, const std::vector<TFileFilter>& filters,

@@ -26,12 +26,13 @@ public:
     ~TOtherWindows() { Enable(); }
     TOtherWindows(const TOtherWindows&) = delete;
     TOtherWindows& operator=(const TOtherWindows&) = delete;
-    void Disable(HWND main_window);
+    void Disable(HWND dialog, HWND main_window);
     void Enable();
 
 private:
     static BOOL CALLBACK DisableOne(HWND window, LPARAM others);
 
+    HWND dialog_ = nullptr;
     std::vector<HWND> disabled_;
 };
 
@@ -61,6 +62,9 @@ private:
     TControlWindows& Windows(std::int32_t control);
     /// The control that a window stands for, -1 for none.
     std::int32_t ControlOf(HWND window) const;
+
+    void RunMessages();
+    static void WakeLoop();
 
     // Making the window.
     void Open();
@@ -104,6 +108,7 @@ private:
     /// Above 0 while the view itself changes windows: what they tell is then no user's act.
     int syncing_ = 0;
     bool opened_ = false;
+    bool closed_ = false;
     std::u16string failure_;
     /// Colour box whose choice waits for its list to close.
     std::int32_t pending_color_box_ = -1;

@@ -5,6 +5,8 @@
 
 #include "actions/views/win32/uWin32System_p.h"
 
+/// The standard button takes the focus with the mouse, and with it the caret out of the edit that
+/// a variable is meant for. This one draws itself and lets the focus be.
 namespace zm {
 namespace {
 
@@ -25,6 +27,7 @@ void PutState(HWND button, LONG state) {
     }
 }
 
+/// `place` as the pointer's messages have it; outside of the window it may be negative.
 bool IsInside(HWND button, LPARAM place) {
     RECT client{};
     GetClientRect(button, &client);
@@ -39,6 +42,7 @@ void TellClick(HWND button) {
     }
 }
 
+/// Raised below the pointer, sunken while it presses.
 void FollowPointer(HWND button, LPARAM place) {
     const bool inside = IsInside(button, place);
     const bool captured = GetCapture() == button;
@@ -47,6 +51,7 @@ void FollowPointer(HWND button, LPARAM place) {
     TrackMouseEvent(&track);
 }
 
+/// A press that is let go outside is none.
 void Release(HWND button, LPARAM place) {
     const bool clicked = GetCapture() == button && IsInside(button, place);
     ReleaseCapture();
@@ -91,6 +96,7 @@ LRESULT CALLBACK SpeedButtonProc(HWND button, UINT message, WPARAM wparam, LPARA
             return 0;
         case WM_MOUSEMOVE: FollowPointer(button, lparam); return 0;
         case WM_LBUTTONUP: Release(button, lparam); return 0;
+        // Another window has taken the pointer in the midst of a press.
         case WM_CAPTURECHANGED: PutState(button, StateOf(button) & ~bsPressed); return 0;
         case WM_MOUSELEAVE: PutState(button, 0); return 0;
         case BM_CLICK: TellClick(button); return 0;
@@ -99,7 +105,7 @@ LRESULT CALLBACK SpeedButtonProc(HWND button, UINT message, WPARAM wparam, LPARA
             InvalidateRect(button, nullptr, FALSE);
             return 0;
         case WM_GETFONT: return GetWindowLongPtrW(button, kFontSlot);
-        case WM_GETDLGCODE: return DLGC_STATIC;
+        case WM_GETDLGCODE: return DLGC_STATIC;  // nothing for the dialog's keys
         case WM_ENABLE: InvalidateRect(button, nullptr, FALSE); return 0;
         case WM_ERASEBKGND: return TRUE;
         case WM_PAINT: Paint(button); return 0;

@@ -7,6 +7,8 @@ namespace {
 constexpr WORD kManifestId = 2;
 constexpr std::uint32_t kSystemColorMark = 0xFF000000;
 
+/// The manifest lies in the module that this code is linked into. A program without one gets no
+/// context.
 HANDLE NewThemedContext() {
     ACTCTXW context{};
     context.cbSize = sizeof(context);
@@ -33,6 +35,7 @@ HINSTANCE OwnModule() {
 }
 
 FARPROC FindSystemFunction(const wchar_t* library, const char* name) {
+    // Stays loaded: windows of its classes outlive a form while others are open.
     const HMODULE module = LoadLibraryW(library);
     const FARPROC function = module == nullptr ? nullptr : GetProcAddress(module, name);
     if (function == nullptr) {

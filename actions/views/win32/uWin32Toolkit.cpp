@@ -9,6 +9,7 @@
 #include "actions/views/win32/uWin32FormView_p.h"
 #include "engine/foundation/zmstrings.h"
 
+/// The toolkit of Windows: linked into the plug-in, its libraries loaded with the first form.
 namespace zm {
 namespace {
 

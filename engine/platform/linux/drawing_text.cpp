@@ -289,10 +289,10 @@ private:
         return visible_ != nullptr && (y_ - setup_.line_height) * setup_.scale > visible_->bottom;
     }
 
-    /// Whether one more line may stand at the present place; the first always may.
+    /// Whether one more line fits at the present place.
     bool AcceptLine(double height) {
         constexpr double kTolerance = 1.0 / 64;
-        is_full_ = max_height_ > 0 && y_ > 0 && y_ + height > max_height_ + kTolerance;
+        is_full_ = max_height_ > 0 && y_ + height > max_height_ + kTolerance;
         return !is_full_;
     }
 

@@ -18,7 +18,7 @@ struct TTextRequest {
     std::u16string_view text;
     const TDrawFont* font = nullptr;
     double max_width = 0;   ///< 0 or less: no limit
-    double max_height = 0;  ///< 0 or less: no limit; only whole lines, but always the first
+    double max_height = 0;  ///< 0 or less: no limit; only lines that fit whole
     bool is_hinted = false;
     bool is_smooth = true;
 };

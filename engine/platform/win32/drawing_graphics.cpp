@@ -260,6 +260,7 @@ std::optional<TPlaneBox> TGdiPlusDrawing::ClipBounds() const {
 
 bool TGdiPlusDrawing::SetClipRect(const TDrawRect& rect) {
     const TReach reach = ReachOf(rect);
+    has_clip_ = has_clip_ || reach != TReach::kNowhere;
     if (reach == TReach::kNear) {
         return Call<&TGdiPlusEntries::GdipSetClipRect>(rect.x, rect.y, rect.width, rect.height,
                                                        Gdiplus::CombineModeReplace);
@@ -278,6 +279,7 @@ bool TGdiPlusDrawing::SetClipRect(const TDrawRect& rect) {
 }
 
 bool TGdiPlusDrawing::ResetClip() {
+    has_clip_ = false;
     return Call<&TGdiPlusEntries::GdipResetClip>();
 }
 

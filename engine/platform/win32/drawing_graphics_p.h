@@ -232,6 +232,7 @@ private:
     Gdiplus::TextRenderingHint hint_ = Gdiplus::TextRenderingHintSystemDefault;
     Gdiplus::InterpolationMode interpolation_ = Gdiplus::InterpolationModeDefault;
     bool copies_ = false;
+    bool has_clip_ = false;
     HDC context_ = nullptr;  ///< only where the library draws through it
     TGdiPlusImageOf<Gdiplus::GpBitmap> picture_;
     TGdiPlusGraphics graphics_;

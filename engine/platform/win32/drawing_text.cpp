@@ -301,10 +301,15 @@ bool TGdiPlusDrawing::DrawString(std::u16string_view text, const TDrawFont& font
         if (!rect || !PrepareFont(font) || !MakeFormat(format, native)) {
             return false;
         }
+        // Not all releases of the library cut what hangs out of the rectangle off.
+        const bool is_cut = !format.is_typographic && rect->Width > 0 && rect->Height > 0 &&
+                            !has_clip_ && SetClipRect(layout);
         const double reach = ReachFrom({rect->X, rect->Y});
-        return LayOut(prepared, *rect, native.Get(), reach, [&](const TTextPiece& piece) {
+        const auto draw = [&](const TTextPiece& piece) {
             return DrawPiece(piece, native.Get(), color);
-        });
+        };
+        const bool is_drawn = LayOut(prepared, *rect, native.Get(), reach, draw);
+        return (!is_cut || ResetClip()) && is_drawn;
     });
 }
 
@@ -325,10 +330,12 @@ bool TGdiPlusDrawing::DrawPiece(const TTextPiece& piece, const Gdiplus::GpString
     if (piece.text.empty()) {
         return true;
     }
+    // A line that is cut through may be measured as nothing.
+    const float height = piece.size.height > 0 ? piece.size.height : piece.rect.Height;
     // Glyphs may hang over their box, by less than the height of a line.
-    const float overhang = piece.size.height / static_cast<float>(std::max(piece.lines, 1));
+    const float overhang = height / static_cast<float>(std::max(piece.lines, 1));
     const TDrawRect box{piece.rect.X - overhang, piece.rect.Y - overhang,
-                        piece.size.width + 2 * overhang, piece.size.height + 2 * overhang};
+                        piece.size.width + 2 * overhang, height + 2 * overhang};
     const TPlaneBox seen = SeenBox(box);
     if (seen.left >= seen.right || seen.top >= seen.bottom) {
         return true;
