@@ -167,9 +167,16 @@ std::int32_t InkBottom(std::int32_t tenths, bool is_typographic) {
 }
 
 TEST(CanvasText, HeightsLimitTheLines) {
-    for (int t : {4, 8, 11, 14, 16, 18, 21, 26, 32}) {
-        printf("%d: %d %d\n", t, InkBottom(t, true), InkBottom(t, false));
-    }
+    const std::int32_t line = InkBottom(10, true) > 0 ? kEm * 6 / 5 : 0;
+    ASSERT_GT(line, 0);
+    // Typographic text has whole lines only, other text is cut through at the end of the box.
+    EXPECT_EQ(InkBottom(4, true), 0);
+    EXPECT_EQ(InkBottom(8, true), 0);
+    EXPECT_EQ(InkBottom(18, true), InkBottom(10, true));
+    EXPECT_NEAR(InkBottom(28, true), InkBottom(18, true) + line, 2);
+    EXPECT_NEAR(InkBottom(4, false), line * 4 / 10, 1);
+    EXPECT_NEAR(InkBottom(16, false), line * 16 / 10, 1);
+    EXPECT_EQ(InkBottom(35, false), InkBottom(35, true));
 }
 
 TEST(CanvasText, StylesChangeThePixels) {

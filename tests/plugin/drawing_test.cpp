@@ -112,6 +112,10 @@ TEST_F(DrawingTest, PicturePositionsOfBothAxes) {
         EXPECT_TRUE(DrawOverlay(row.keys));
         ExpectInk(row.ink, row.keys);
     }
+    MakeOverlay(1, 1, kGreen);
+    OpenPlain(11, 8);
+    EXPECT_TRUE(DrawOverlay(u"x_pos=2\r\ny_pos=1"));
+    ExpectInk({10, 3, 11, 4}, u"one pixel");
     for (const char16_t* keys : {u"custom_x=2147483647", u"custom_x=-2147483648",
                                  u"custom_y=2147483647", u"custom_y=-2147483648"}) {
         OpenPlain(11, 8);
@@ -277,6 +281,15 @@ TEST_F(DrawingTest, FontStylesShow) {
     EXPECT_GT(InkSum(*both), InkSum(*underlined) * 21 / 20) << "bold and underlined";
     EXPECT_GT(Ink(*both).bottom, ink.bottom);
     ExpectSamePixels(*both, *WhiteText(text + u"261"));  // the low byte counts
+}
+
+TEST_F(DrawingTest, SizesArePointsAt96DotsPerInch) {
+    // Capitals of this font are 0.729 of the em square high, whose side is points x 96 / 72.
+    for (const std::int32_t points : {16, 33}) {
+        const TRect ink = Ink(
+            *WhiteText(u"text=HEH\r\nfont_name=DejaVu Sans\r\nfont_size=" + IntegerToText(points)));
+        EXPECT_NEAR(ink.bottom - ink.top, points * 96 * 0.729 / 72, 1) << points;
+    }
 }
 
 TEST_F(DrawingTest, TextTakesSizeColourAndVariables) {

@@ -18,8 +18,8 @@ namespace {
 constexpr std::uint32_t kJobs = 8;
 constexpr int kRounds = 3;
 
-/// Opens, resizes, crops, borders and saves under a job of its own; also meets every kind of
-/// failure on the way. True when each step did what it should.
+/// Opens, resizes, crops, borders, draws a picture and a text, and saves under a job of its own;
+/// also meets every kind of failure on the way. True when each step did what it should.
 bool RunJob(TPluginCaller& caller, std::uint32_t task, const std::u16string& input,
             const std::u16string& output) {
     bool good = !caller.Exec(gaResizeImage, u"image_w=10\r\nimage_h=10", task);
@@ -28,6 +28,11 @@ bool RunJob(TPluginCaller& caller, std::uint32_t task, const std::u16string& inp
     good &= caller.Exec(gaCropImage, u"l=10\r\nt=10\r\nr=-10\r\nb=-10", task);
     good &= !caller.Exec(gaCropImage, u"l=5\r\nr=5", task);
     good &= caller.Exec(gaAddBorder, u"l={w}\r\nt={w}\r\nr={w}\r\nb={w}\r\ncolor=255", task);
+    good &= caller.Exec(gaImageOnImage, u"opacity=60\r\nx_pos=2\r\nimage_file=" + input, task);
+    good &= caller.Exec(gaTextOnImage,
+                        u"text=Job " + IntegerToText(static_cast<std::int32_t>(task)) +
+                            u" \u05E9\u05DC\r\nfont_size=40\r\nfont_styles=7\r\nx_pos=1",
+                        task);
     good &= !caller.Exec(gaOpenImage, u"image_file=" + input + u".missing", task);
     good &= caller.Exec(gaSaveImage, u"format=1\r\nimage_file=" + output, task);
     caller.JobStop(gaOpenImage, task);

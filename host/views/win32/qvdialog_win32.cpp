@@ -4,6 +4,7 @@
 
 #include <algorithm>
 #include <exception>
+#include <iterator>
 #include <stdexcept>
 
 #include "engine/foundation/zmstrings.h"
@@ -17,7 +18,6 @@ constexpr int kButtonPadding = 12;    ///< left and right of a caption
 constexpr int kButtonRowPadding = 6;  ///< above and below it
 constexpr int kColumnPadding = 14;    ///< left and right of a column's text, together
 constexpr int kMaxColumnShare = 3;    ///< a column before the last has at most a third
-constexpr wchar_t kMessageTitle[] = L"Job Editor";
 
 /// A dialog template without controls; its menu, class and title are empty texts.
 struct TEmptyTemplate {

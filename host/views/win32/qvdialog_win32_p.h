@@ -15,6 +15,7 @@ namespace zm::qvrun {
 // Pixels of a plain screen.
 inline constexpr int kMargin = 12;
 inline constexpr int kGap = 6;
+inline constexpr wchar_t kMessageTitle[] = L"Job Editor";
 
 /// A list of rows with one text per column. The last column takes the room that is left.
 class TRowList {

@@ -104,11 +104,14 @@ SIZE TEditDialog::CommonButtonSize() const {
     return ButtonSize({add_, configure_, remove_, up_, down_, save_, close_});
 }
 
-/// The placeholder beside the buttons.
+/// The placeholder beside the buttons, and all of these above the longest hint.
 SIZE TEditDialog::SmallestClient() const {
+    constexpr int kColumnButtons = 5;
     const SIZE button = CommonButtonSize();
     const SIZE text = TextSize(kPlaceholder);
-    return {text.cx + button.cx + 5 * kMargin, text.cy + 4 * button.cy + 4 * kMargin};
+    const LONG hint = kMaxHintLines * TextSize(u"X").cy;
+    return {text.cx + button.cx + 5 * kMargin,
+            kColumnButtons * (button.cy + kGap) + std::max(hint, button.cy) + 3 * kMargin};
 }
 
 int TEditDialog::HintHeight(int width) const {
@@ -295,7 +298,7 @@ bool TEditDialog::MayClose() {
     if (!editor_.IsChanged()) {
         return true;
     }
-    const int answer = MessageBoxW(Window(), L"Save the changes of the job?", L"Job Editor",
+    const int answer = MessageBoxW(Window(), L"Save the changes of the job?", kMessageTitle,
                                    MB_YESNOCANCEL | MB_ICONQUESTION);
     return answer == IDNO || (answer == IDYES && Save());
 }
