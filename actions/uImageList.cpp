@@ -158,9 +158,9 @@ bool TQVImageList::SaveToFile(const IStepParams& params, TZmBitmap& bitmap) {
 }
 
 bool TQVImageList::SaveToClipboard(const IStepParams& params, TZmBitmap& bitmap) {
-    const bool copied = bitmap.CopyToClipboard(/*IncludeZalmoFormat=*/true,
-                                               /*IncludePNGFormat=*/false, kClipboardDpi,
-                                               kClipboardDpi);
+    const bool copied =
+        bitmap.CopyToClipboard(/*IncludeZalmoFormat=*/true,
+                               /*IncludePNGFormat=*/false, kClipboardDpi, kClipboardDpi);
     if (!copied) {
         ReportJobError(params.GetTaskId(), kErrorNotSaved, u"Cannot copy image to clipboard");
     }

@@ -46,8 +46,7 @@ public:
     /// Shows the plug-in's dialog for a step. The step's new text; nothing when it stays, because
     /// the user cancelled or because of what the desk's log then tells.
     std::optional<std::u16string> Configure(std::int32_t action_index,
-                                            const std::u16string& step_text,
-                                            IHostDesk& desk) const;
+                                            const std::u16string& step_text, IHostDesk& desk) const;
 
 private:
     friend class THostJob;

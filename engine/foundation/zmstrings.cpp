@@ -158,17 +158,26 @@ struct TFoldRange {
 
 /// Simple case folding of the Unicode character database, for the scripts that key names use.
 constexpr TFoldRange kFoldRanges[] = {
-    {0x0041, 0x005A, 32, 1},                              // ASCII
-    {0x00B5, 0x00B5, 775, 1},                             // micro sign to mu
-    {0x00C0, 0x00D6, 32, 1},                              // Latin-1
-    {0x00D8, 0x00DE, 32, 1},  {0x0178, 0x0178, -121, 1},  // y with diaeresis, whose small letter is
-                                                          // in Latin-1
-    {0x0386, 0x0386, 38, 1},                              // Greek
-    {0x0388, 0x038A, 37, 1},  {0x038C, 0x038C, 64, 1},   {0x038E, 0x038F, 63, 1},
-    {0x0391, 0x03A1, 32, 1},  {0x03A3, 0x03AB, 32, 1},   {0x03C2, 0x03C2, 1, 1},  // final sigma
-    {0x0400, 0x040F, 80, 1},                                                      // Cyrillic
-    {0x0410, 0x042F, 32, 1},  {0x0460, 0x0480, 1, 2},    {0x048A, 0x04BE, 1, 2},
-    {0x04C0, 0x04C0, 15, 1},  {0x04C1, 0x04CD, 1, 2},    {0x04D0, 0x052E, 1, 2},
+    {0x0041, 0x005A, 32, 1},   // ASCII
+    {0x00B5, 0x00B5, 775, 1},  // micro sign to mu
+    {0x00C0, 0x00D6, 32, 1},   // Latin-1
+    {0x00D8, 0x00DE, 32, 1},
+    {0x0178, 0x0178, -121, 1},  // y with diaeresis, whose small letter is
+                                // in Latin-1
+    {0x0386, 0x0386, 38, 1},    // Greek
+    {0x0388, 0x038A, 37, 1},
+    {0x038C, 0x038C, 64, 1},
+    {0x038E, 0x038F, 63, 1},
+    {0x0391, 0x03A1, 32, 1},
+    {0x03A3, 0x03AB, 32, 1},
+    {0x03C2, 0x03C2, 1, 1},   // final sigma
+    {0x0400, 0x040F, 80, 1},  // Cyrillic
+    {0x0410, 0x042F, 32, 1},
+    {0x0460, 0x0480, 1, 2},
+    {0x048A, 0x04BE, 1, 2},
+    {0x04C0, 0x04C0, 15, 1},
+    {0x04C1, 0x04CD, 1, 2},
+    {0x04D0, 0x052E, 1, 2},
 };
 
 char16_t FoldCase(char16_t character) {
