@@ -4,6 +4,7 @@
 #include <algorithm>
 #include <atomic>
 #include <condition_variable>
+#include <optional>
 #include <system_error>
 #include <thread>
 
@@ -17,31 +18,32 @@ namespace {
 constexpr std::chrono::milliseconds kConnectTime{5000};
 constexpr std::uint32_t kAnyType = XCB_GET_PROPERTY_TYPE_ANY;
 
-/// Nil when the library or one of its functions is missing. It stays loaded: code of its own may
-/// still run when our module goes.
-const TXcb* LoadXcb() {
+constexpr char kXcbLibrary[] = "libxcb.so.1";
+
+/// Nothing when the library or one of its functions is missing. It stays loaded: code of its own
+/// may still run when our module goes.
+std::optional<TXcb> LoadXcb() {
     std::string error_text;
-    auto library = LoadInstalledLibrary("libxcb.so.1", error_text);
+    const auto library = LoadInstalledLibrary(kXcbLibrary, error_text);
     if (library == nullptr) {
-        return nullptr;
+        return std::nullopt;
     }
-    auto xcb = std::make_unique<TXcb>();
+    TXcb xcb{};
     bool is_complete = true;
-#define ZM_XCB_BIND(name)                                                                 \
-    xcb->name = reinterpret_cast<decltype(xcb->name)>(library->FindSymbol("xcb_" #name)); \
-    is_complete = is_complete && xcb->name != nullptr;
+#define ZM_XCB_BIND(name)                                                               \
+    xcb.name = reinterpret_cast<decltype(xcb.name)>(library->FindSymbol("xcb_" #name)); \
+    is_complete = is_complete && xcb.name != nullptr;
     ZM_XCB_FUNCTIONS(ZM_XCB_BIND)
 #undef ZM_XCB_BIND
-    if (!is_complete) {
-        return nullptr;
-    }
-    static_cast<void>(library.release());
-    return xcb.release();
+    const bool is_kept =
+        is_complete && ::dlopen(kXcbLibrary, RTLD_NOW | RTLD_NOLOAD | RTLD_NODELETE) != nullptr;
+    return is_kept ? std::optional(xcb) : std::nullopt;
 }
 
+/// In storage of the module, which needs no clean-up.
 const TXcb* BindXcb() {
-    static const TXcb* const xcb = LoadXcb();
-    return xcb;
+    static const std::optional<TXcb> xcb = LoadXcb();
+    return xcb ? &*xcb : nullptr;
 }
 
 /// Keeps the code of this module in memory for good.

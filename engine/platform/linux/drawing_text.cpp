@@ -456,13 +456,40 @@ namespace {
 struct TEnginePool {
     std::mutex lock;
     std::vector<std::unique_ptr<TTextEngine>> engines;
+    bool is_open = true;
 };
 constexpr std::size_t kMostIdleEngines = 16;
 
-/// Never freed: a thread may still draw while the process ends.
+/// The pool is emptied when its module goes. It has no destructor of its own: canvases that go
+/// later still give their engines back, which then end there.
+union TPoolStorage {
+    TPoolStorage() : pool() {}
+    ~TPoolStorage() {}  // NOLINT(modernize-use-equals-default): the member stays
+    TPoolStorage(const TPoolStorage&) = delete;
+    TPoolStorage& operator=(const TPoolStorage&) = delete;
+
+    TEnginePool pool;
+};
+
+class TPoolCloser {
+public:
+    explicit TPoolCloser(TEnginePool& pool) : pool_(pool) {}
+    ~TPoolCloser() {
+        const std::scoped_lock guard(pool_.lock);
+        pool_.is_open = false;
+        std::vector<std::unique_ptr<TTextEngine>>().swap(pool_.engines);
+    }
+    TPoolCloser(const TPoolCloser&) = delete;
+    TPoolCloser& operator=(const TPoolCloser&) = delete;
+
+private:
+    TEnginePool& pool_;
+};
+
 TEnginePool& EnginePool() {
-    static TEnginePool* const pool = new TEnginePool;
-    return *pool;
+    static TPoolStorage storage;
+    static const TPoolCloser closer(storage.pool);
+    return storage.pool;
 }
 
 }  // namespace
@@ -471,7 +498,7 @@ void TReturnTextEngine::operator()(TTextEngine* engine) const {
     std::unique_ptr<TTextEngine> owner(engine);
     TEnginePool& pool = EnginePool();
     const std::scoped_lock guard(pool.lock);
-    if (pool.engines.size() < kMostIdleEngines && !owner->IsWorn()) {
+    if (pool.is_open && pool.engines.size() < kMostIdleEngines && !owner->IsWorn()) {
         pool.engines.push_back(std::move(owner));
     }
 }
