@@ -169,6 +169,8 @@ public:
     bool CaptureFromScreen() { return Refuse(); }
     bool LoadThumbnailFromExplorer(const TName&) { return Refuse(); }
     bool Acquire() { return Refuse(); }
+    /// Shows the parameters of a file type with a preview. There is no such dialog here.
+    virtual bool DoPreviews() { return Refuse(); }
 
 protected:
     ~TZmIOFormats() = default;

@@ -299,6 +299,7 @@ TEST_F(DriverSources, ThumbnailsAreMadeOfTheAttachedBitmap) {
 TEST_F(DriverSources, WhatNeedsAViewOrAScreenFails) {
     io_->SetAborting(false);
     EXPECT_FALSE(io_->CaptureFromScreen());
+    EXPECT_FALSE(io_->DoPreviews());
     EXPECT_TRUE(io_->GetAborting());
     EXPECT_FALSE(io_->OpenAVIFile(u"a.avi"));
     EXPECT_FALSE(io_->LoadFromFile(u"a.avi", /*check_unknown=*/false));
