@@ -3,6 +3,8 @@
 #include <gtest/gtest.h>
 #include <gtk/gtk.h>
 
+#include <cstdio>
+#include <cstdlib>
 #include <deque>
 #include <functional>
 #include <string>
@@ -111,23 +113,36 @@ public:
     }
 
 private:
-    /// An act may open a dialog and with it another main loop, in which the next acts come.
+    /// An act may open a dialog and with it another main loop, in which the next acts come. A
+    /// dialog that nobody answers would wait for ever: the program ends instead.
     static gboolean Step(gpointer data) {
         auto& user = *static_cast<TGtkUser*>(data);
         GtkWidget* const window =
             user.acts_.empty() ? nullptr : FindWindow(user.acts_.front().first);
+        if (user.acts_.size() != user.waiting_) {
+            user.waiting_ = user.acts_.size();
+            user.since_ = g_get_monotonic_time();
+        } else if (user.waiting_ != 0 && g_get_monotonic_time() - user.since_ > kLimit) {
+            std::fprintf(stderr, "Nobody answers: the act in %s, %zu before the end, is not done\n",
+                         user.acts_.front().first.c_str(), user.waiting_);
+            std::_Exit(EXIT_FAILURE);
+        }
         if (window != nullptr) {
-            const auto act = std::move(user.acts_.front());
+            auto act = std::move(user.acts_.front());
             user.acts_.pop_front();
             if (!act.second(window)) {
-                user.acts_.push_front(act);
+                user.acts_.push_front(std::move(act));
             }
         }
         return G_SOURCE_CONTINUE;
     }
 
+    static constexpr gint64 kLimit = 60'000'000;  ///< microseconds for one act
+
     GSource* source_;
     std::deque<std::pair<std::string, TAct>> acts_;
+    std::size_t waiting_ = 0;
+    gint64 since_ = 0;
 };
 
 }  // namespace zm::test
