@@ -71,6 +71,8 @@ constexpr TZmImageSize kSmall{kSmallWidth, kSmallHeight};
 constexpr TZmImageSize kDyadic{1024, 768};
 constexpr TZmImageSize kUneven{1111, 833};
 constexpr TZmImageSize kUnevenLarge{3777, 2833};
+constexpr TZmImageSize kNarrowHigh{1000, 4000};
+constexpr TZmImageSize kWideLow{5000, 1000};
 
 BENCHMARK_CAPTURE(Resample, BilinearShrink, kLarge, kSmall, rfBilinear)
     ->Unit(benchmark::kMillisecond);
@@ -81,6 +83,10 @@ BENCHMARK_CAPTURE(Resample, BilinearShrinkUneven, kLarge, kUneven, rfBilinear)
 BENCHMARK_CAPTURE(Resample, BilinearEnlarge, kSmall, kLarge, rfBilinear)
     ->Unit(benchmark::kMillisecond);
 BENCHMARK_CAPTURE(Resample, BilinearEnlargeUneven, kSmall, kUnevenLarge, rfBilinear)
+    ->Unit(benchmark::kMillisecond);
+BENCHMARK_CAPTURE(Resample, BilinearNarrowerAndHigher, kLarge, kNarrowHigh, rfBilinear)
+    ->Unit(benchmark::kMillisecond);
+BENCHMARK_CAPTURE(Resample, BilinearWiderAndLower, kLarge, kWideLow, rfBilinear)
     ->Unit(benchmark::kMillisecond);
 BENCHMARK_CAPTURE(Resample, BicubicEnlarge, kSmall, kLarge, rfBicubic)
     ->Unit(benchmark::kMillisecond);

@@ -35,12 +35,13 @@ StartWineDesktop() {
     "$source_dir/scripts/run-wine.sh" 'C:\windows\system32\explorer.exe' /desktop \
         </dev/null >/dev/null 2>&1 &
     wine_desktop_pid=$!
-    # It starts while this small program runs; the pause covers what it does after. There is no
-    # window manager: with the setting Wine does not wait two seconds for its answer each time
-    # that a window closes.
+    # It starts while this small program runs; the pause covers what it does after, and is longer
+    # where programs start slowly. There is no window manager: with the setting Wine does not wait
+    # two seconds for its answer each time that a window closes.
+    local start=$SECONDS
     "$source_dir/scripts/run-wine.sh" 'C:\windows\system32\reg.exe' add \
         'HKCU\Software\Wine\X11 Driver' /v Managed /t REG_SZ /d N /f </dev/null >/dev/null 2>&1
-    sleep 2
+    sleep $((2 + SECONDS - start))
 }
 
 StopWineDisplay() {

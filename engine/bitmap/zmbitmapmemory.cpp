@@ -11,7 +11,7 @@ namespace zm {
 namespace {
 
 constexpr std::int64_t kAutoSystemHeapBytes = 1048576;
-constexpr std::int64_t kMarkerBytes = 4;
+constexpr std::int64_t kMarkerBytes = 4;  // where from, whether filled, two unused
 constexpr std::uint8_t kMarkerRuntime = 0;
 constexpr std::uint8_t kMarkerSystem = 1;
 constexpr std::int64_t kNoLimit = std::numeric_limits<std::int64_t>::max();
@@ -30,7 +30,8 @@ void* AllocateMarked(bool from_system, std::int64_t size_bytes) {
         return nullptr;
     }
     auto* const first = static_cast<std::uint8_t*>(block);
-    *first = from_system ? kMarkerSystem : kMarkerRuntime;
+    first[0] = from_system ? kMarkerSystem : kMarkerRuntime;
+    first[1] = 0;
     return first + kMarkerBytes;
 }
 
@@ -60,6 +61,17 @@ void FreeBitmapBlock(void* block, TZmMemoryAllocator allocator, std::int64_t siz
         platform::SystemHeapFree(first, static_cast<std::size_t>(size_bytes + kMarkerBytes));
     } else {
         std::free(first);
+    }
+}
+
+bool WasBlockFilled(const void* block, TZmMemoryAllocator allocator) {
+    return block != nullptr && allocator != zmmaVCL &&
+           static_cast<const std::uint8_t*>(block)[1 - kMarkerBytes] != 0;
+}
+
+void NoteBlockFilled(void* block, TZmMemoryAllocator allocator) {
+    if (block != nullptr && allocator != zmmaVCL) {
+        static_cast<std::uint8_t*>(block)[1 - kMarkerBytes] = 1;
     }
 }
 

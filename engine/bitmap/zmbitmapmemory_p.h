@@ -13,6 +13,12 @@ void* AllocateBitmapBlock(TZmMemoryAllocator allocator, std::int64_t size_bytes)
 /// Frees a block with the allocator and the size that made it; nil is ignored.
 void FreeBitmapBlock(void* block, TZmMemoryAllocator allocator, std::int64_t size_bytes);
 
+/// Whether NoteBlockFilled was called for a block; False too for one of zmmaVCL, which cannot tell.
+/// The system clears memory on its first use, which leaves it in the caches: only blocks that were
+/// filled before gain from stores past these.
+bool WasBlockFilled(const void* block, TZmMemoryAllocator allocator);
+void NoteBlockFilled(void* block, TZmMemoryAllocator allocator);
+
 /// Blocks of the system's heap for images in fragments; nil without room.
 std::uint8_t* AllocateBitmapFragment(std::int64_t size_bytes);
 void FreeBitmapFragment(std::uint8_t* fragment, std::int64_t size_bytes);

@@ -19,9 +19,9 @@
 /// ParseDibInfo refuses, rows that are not all there, and virtual bitmaps. The last row may lack
 /// its padding.
 ///
-/// CreateDIB: the image, or a rectangle of it, as a packed one: 1 bit for zm1g, 8 for zm8p and
-/// greys, 24 for all others; the alpha plane is left out. Empty for an empty image, a rectangle
-/// outside it, and beyond 2^31 - 1 bytes. Resolutions in dots per inch, 0 for none.
+/// CreateDIB: the image, or a rectangle of it (x2, y2 included), as a packed one: 1 bit for zm1g, 8
+/// for zm8p and greys, 24 for all others; the alpha plane is left out. Empty for an empty image, a
+/// rectangle outside it, and beyond 2^31 - 1 bytes. Resolutions in dots per inch, 0 for none.
 namespace zm {
 
 inline constexpr std::size_t kDibHeaderBytes = 40;

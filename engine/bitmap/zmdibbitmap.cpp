@@ -246,7 +246,6 @@ void TZmBitmap::MergeFromTDibBitmap(TZmDibbitmap* source, std::int32_t x, std::i
     pixels.EncapsulateMemory(source->GetBits(), source->GetWidth(), source->GetHeight(),
                              source->GetPixelFormat(), /*do_free_image=*/false, zmboBOTTOMLEFT);
     pixels.CopyRectTo(this, 0, 0, x, y, pixels.fWidth, pixels.fHeight, /*copy_alpha=*/false);
-    Changed();
 }
 
 }  // namespace zm

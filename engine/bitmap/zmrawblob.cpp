@@ -11,6 +11,7 @@
 #include <cstring>
 #include <limits>
 #include <span>
+#include <utility>
 #include <vector>
 
 #include "engine/bitmap/zmpixelformats.h"
@@ -292,9 +293,6 @@ bool ReadRows(TStream& stream, std::int64_t position, TZmBitmap& bitmap) {
 /// What the fields tell about an allocated bitmap.
 void ApplyFields(const TRawLayout& layout, TZmBitmap& bitmap) {
     const TRawFields& fields = layout.fields;
-    for (std::size_t i = 0; i < layout.palette.size(); ++i) {
-        bitmap.SetPalette(static_cast<std::int32_t>(i), layout.palette[i]);
-    }
     bitmap.SetPaletteUsed(fields.palette_used);
     bitmap.SetFull(fields.is_full);
     bitmap.SetBlackValue(fields.black_value);
@@ -406,7 +404,15 @@ bool TZmBitmap::LoadRAWFromBufferOrStream(const void* Buffer, std::int64_t buffe
     loaded.fMinFileSize = fMinFileSize;
     loaded.fMemoryAllocator = fMemoryAllocator;
     loaded.fOrigin = fOrigin;
-    if (!ReadBlob(*stream, start, layout, loaded) || !TakeRaw(loaded)) {
+    bool is_loaded = ReadBlob(*stream, start, layout, loaded);
+    if (is_loaded && !layout.palette.empty()) {
+        // Greys can carry a palette too; colours by index always have all entries.
+        const std::size_t count = std::max(layout.palette.size(), loaded.fRGBPalette.size());
+        loaded.fRGBPalette = std::move(layout.palette);
+        loaded.fRGBPalette.resize(count);
+    }
+    is_loaded = is_loaded && TakeRaw(loaded);
+    if (!is_loaded) {
         stream->SetPosition(start);
         return false;
     }

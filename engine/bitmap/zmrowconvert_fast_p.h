@@ -12,6 +12,11 @@ namespace zm {
 /// none of the instructions that it needs.
 TZmRowFunction FindFastRowFunction(TZmPixelFormat from, TZmPixelFormat to);
 
+/// The twin of a row function that stores past the caches, for rows of large targets whose lines
+/// need not be read first; the caller ends with hwy::FlushStream. Nil when there is none: a row
+/// function with a move of the row that it made is then as good.
+TZmRowFunction FindStreamingRowFunction(TZmPixelFormat from, TZmPixelFormat to);
+
 /// Sets bit x where `gray[x]` is above `levels[x % 8]`, and clears it elsewhere; runs over whole
 /// bytes of eight pixels and returns how many pixels that were (a multiple of 8, at most
 /// `width`).

@@ -14,6 +14,7 @@
 
 #undef HWY_TARGET_INCLUDE
 #define HWY_TARGET_INCLUDE "engine/bitmap/zmrowconvert_simd.cpp"
+#include <hwy/cache_control.h>
 #include <hwy/foreach_target.h>
 #include <hwy/highway.h>
 
@@ -33,6 +34,10 @@ struct TFastRows {
     TZmRowFunction gray_to_24 = nullptr;  // zm8g to zm24RGB
     TZmRowFunction gray_to_32 = nullptr;  // zm8g to zm32RGB
     TZmRowFunction palette = nullptr;     // zm8p to zm24RGB
+    // Past the caches.
+    TZmRowFunction stream_alpha = nullptr;          // zm24RGB to zm32RGB
+    TZmRowFunction stream_without_alpha = nullptr;  // zm32RGB to zm24RGB
+    TZmRowFunction stream_gray_to_32 = nullptr;     // zm8g to zm32RGB
     TZmBitsAboveFunction bits_above = nullptr;
 };
 
@@ -181,22 +186,142 @@ void WidenRow(const std::uint8_t* source, std::uint8_t* dest, std::int32_t width
     FindPlainRowFunction(kFrom, kTo)(source, dest, left, context);
 }
 
+/// Asks for what is read soon. The processor does so itself, but not beyond the page that it is in.
+HWY_INLINE void Prefetch(const std::uint8_t* source) {
+    constexpr std::uintptr_t kAheadBytes = 4096;
+    const std::uintptr_t address = reinterpret_cast<std::uintptr_t>(source) + kAheadBytes;
+    hwy::Prefetch(reinterpret_cast<const std::uint8_t*>(address));  // any address may be asked for
+}
+
+using TBlockHalves = hn::CappedTag<std::uint8_t, 2 * kBlockBytes>;
+using TBlockLines = hn::CappedTag<std::uint8_t, 4 * kBlockBytes>;
+
+/// Stores four blocks past the caches; `dest` is the start of a line of 64 bytes. Halves of a line
+/// would hold up the reading between them.
+HWY_INLINE void StreamLine(TBlock a, TBlock b, TBlock c, TBlock d, std::uint8_t* dest) {
+#if HWY_MAX_BYTES >= 64
+    const TBlockHalves half;
+    hn::Stream(hn::Combine(TBlockLines(), hn::Combine(half, d, c), hn::Combine(half, b, a)),
+               TBlockLines(), dest);
+#elif HWY_MAX_BYTES >= 32
+    const TBlockHalves half;
+    hn::Stream(hn::Combine(half, b, a), half, dest);
+    hn::Stream(hn::Combine(half, d, c), half, dest + 2 * kBlockBytes);
+#else
+    const TBlockBytes bytes;
+    hn::Stream(a, bytes, dest);
+    hn::Stream(b, bytes, dest + kBlockBytes);
+    hn::Stream(c, bytes, dest + 2 * kBlockBytes);
+    hn::Stream(d, bytes, dest + 3 * kBlockBytes);
+#endif
+}
+
+/// WidenRow to pixels of four bytes, in lines that go past the caches.
+template <typename Map, TZmPixelFormat kFrom, TZmPixelFormat kTo, std::uint32_t kSetBits>
+void StreamRow(const std::uint8_t* source, std::uint8_t* dest, std::int32_t width,
+               const TZmRowContext& context) {
+    static_assert(Map::kDestBytes == 4);
+    constexpr std::size_t kLineBytes = 4 * kBlockBytes;
+    constexpr auto kLinePixels = static_cast<std::int32_t>(kLineBytes / Map::kDestBytes);
+    constexpr std::size_t kBlockSource = 4 * Map::kSourceBytes;
+    constexpr auto kNeeded = static_cast<std::int32_t>(
+        (3 * kBlockSource + kBlockBytes + Map::kSourceBytes - 1) / Map::kSourceBytes);
+    static constexpr TWideningStep<Map> kPlan;
+    static_assert(kPlan.is_sound && TWideningStep<Map>::kBlocks == 1 &&
+                  kPlan.blocks[0].offset == 0);
+    const TBlockBytes bytes;
+    const TBlock set = hn::BitCast(bytes, hn::Set(TBlockWords(), kSetBits));
+    const TBlock order = hn::LoadU(bytes, kPlan.blocks[0].bytes);
+    const auto widen = [=](const std::uint8_t* pixels) HWY_ATTR {
+        return hn::Or(hn::TableLookupBytes(hn::LoadU(bytes, pixels), order), set);
+    };
+    const std::size_t before = (0 - reinterpret_cast<std::uintptr_t>(dest)) % kLineBytes;
+    const bool can_align = before % Map::kDestBytes == 0;
+    const auto head = static_cast<std::int32_t>(before / Map::kDestBytes);
+    std::int32_t left = width;
+    if (can_align && head < left) {
+        WidenRow<Map, kFrom, kTo, kSetBits>(source, dest, head, context);
+        source += static_cast<std::size_t>(head) * Map::kSourceBytes;
+        dest += before;
+        left -= head;
+        for (; left >= kNeeded; left -= kLinePixels, dest += kLineBytes) {
+            Prefetch(source);
+            StreamLine(widen(source), widen(source + kBlockSource),
+                       widen(source + 2 * kBlockSource), widen(source + 3 * kBlockSource), dest);
+            source += 4 * kBlockSource;
+        }
+    }
+    WidenRow<Map, kFrom, kTo, kSetBits>(source, dest, left, context);
+}
+
 // The narrowing loops store whole blocks of which the last bytes are written again by the next
 // step, or by the plain function; they end before such a store would leave the row.
 constexpr std::int32_t kPixelsInABlock = 6;  // touched by 16 bytes of zm24RGB
 
-void DropAlphaRow(const std::uint8_t* source, std::uint8_t* dest, std::int32_t width,
-                  const TZmRowContext& context) {
-    alignas(kBlockBytes) static constexpr std::uint8_t kFirstThree[kBlockBytes] = {
-        0, 1, 2, 4, 5, 6, 8, 9, 10, 12, 13, 14, 0x80, 0x80, 0x80, 0x80};
+/// The first three of every four bytes, in front.
+alignas(kBlockBytes) constexpr std::uint8_t kFirstThree[kBlockBytes] = {
+    0, 1, 2, 4, 5, 6, 8, 9, 10, 12, 13, 14, 0x80, 0x80, 0x80, 0x80};
+
+/// Sixteen pixels without their alpha in three blocks.
+HWY_INLINE void PackColors(const std::uint8_t* source, TBlock* colors) {
     const TBlockBytes bytes;
     const TBlock first_three = hn::Load(bytes, kFirstThree);
+    const auto four_pixels = [=](std::size_t offset) HWY_ATTR {
+        return hn::TableLookupBytesOr0(hn::LoadU(bytes, source + offset), first_three);
+    };
+    const TBlock second = four_pixels(kBlockBytes);
+    const TBlock third = four_pixels(2 * kBlockBytes);
+    colors[0] = hn::Or(four_pixels(0), hn::ShiftLeftBytes<12>(bytes, second));
+    colors[1] = hn::Or(hn::ShiftRightBytes<4>(bytes, second), hn::ShiftLeftBytes<8>(bytes, third));
+    colors[2] = hn::Or(hn::ShiftRightBytes<8>(bytes, third),
+                       hn::ShiftLeftBytes<4>(bytes, four_pixels(3 * kBlockBytes)));
+}
+
+void DropAlphaRow(const std::uint8_t* source, std::uint8_t* dest, std::int32_t width,
+                  const TZmRowContext& context) {
+    const TBlockBytes bytes;
     std::int32_t left = width;
+    for (; left >= 16; left -= 16, source += 64, dest += 48) {
+        TBlock colors[3];
+        PackColors(source, colors);
+        hn::StoreU(colors[0], bytes, dest);
+        hn::StoreU(colors[1], bytes, dest + kBlockBytes);
+        hn::StoreU(colors[2], bytes, dest + 2 * kBlockBytes);
+    }
+    const TBlock first_three = hn::Load(bytes, kFirstThree);
     for (; left >= kPixelsInABlock; left -= 4, source += 16, dest += 12) {
         const TBlock colors = hn::TableLookupBytesOr0(hn::LoadU(bytes, source), first_three);
         hn::StoreU(colors, bytes, dest);
     }
     FindPlainRowFunction(zm32RGB, zm24RGB)(source, dest, left, context);
+}
+
+/// DropAlphaRow in lines that go past the caches, three lines of 64 pixels at a time.
+void StreamWithoutAlpha(const std::uint8_t* source, std::uint8_t* dest, std::int32_t width,
+                        const TZmRowContext& context) {
+    constexpr std::int32_t kPixels = 64;
+    constexpr std::size_t kInverseOfThree = 43;  // modulo 64
+    const auto head = static_cast<std::int32_t>((0 - reinterpret_cast<std::uintptr_t>(dest)) *
+                                                kInverseOfThree % kPixels);
+    std::int32_t left = width;
+    if (head < left) {
+        DropAlphaRow(source, dest, head, context);
+        source += std::ptrdiff_t{head} * 4;
+        dest += std::ptrdiff_t{head} * 3;
+        left -= head;
+        for (; left >= kPixels; left -= kPixels, source += 4 * kPixels, dest += 3 * kPixels) {
+            TBlock colors[12];
+            for (std::size_t i = 0; i < 4; ++i) {
+                Prefetch(source + 4 * kBlockBytes * i);
+                PackColors(source + 4 * kBlockBytes * i, colors + 3 * i);
+            }
+            for (std::size_t i = 0; i < 3; ++i) {
+                const TBlock* const line = colors + 4 * i;
+                StreamLine(line[0], line[1], line[2], line[3], dest + 4 * kBlockBytes * i);
+            }
+        }
+    }
+    DropAlphaRow(source, dest, left, context);
 }
 
 /// Five pixels at a time: the high bytes of words 0 to 7, and of words 7 to 14, red first.
@@ -428,6 +553,9 @@ TFastRows GetFastRows() {
     rows.from_words = FromWordsRow;
     rows.gray_to_24 = WidenRow<TGrayTo24, zm8g, zm24RGB, 0>;
     rows.gray_to_32 = WidenRow<TGrayTo32, zm8g, zm32RGB, 0xFF000000u>;
+    rows.stream_alpha = StreamRow<TColorTo32, zm24RGB, zm32RGB, 0xFF000000u>;
+    rows.stream_without_alpha = StreamWithoutAlpha;
+    rows.stream_gray_to_32 = StreamRow<TGrayTo32, zm8g, zm32RGB, 0xFF000000u>;
     rows.bits_above = BitsAbove;
 #if HWY_TARGET == HWY_AVX3_DL
     rows.to_gray = ToGrayRowByBytes;
@@ -461,6 +589,16 @@ TZmRowFunction FindFastRowFunction(TZmPixelFormat from, TZmPixelFormat to) {
         case zm8p << 4 | zm24RGB: return rows.palette != nullptr ? rows.palette : Row8pTo24Fast;
         case zm8g << 4 | zm24RGB: return rows.gray_to_24;
         case zm8g << 4 | zm32RGB: return rows.gray_to_32;
+        default: return nullptr;
+    }
+}
+
+TZmRowFunction FindStreamingRowFunction(TZmPixelFormat from, TZmPixelFormat to) {
+    const TFastRows rows = HWY_DYNAMIC_DISPATCH(GetFastRows)();
+    switch (from << 4 | to) {
+        case zm24RGB << 4 | zm32RGB: return rows.stream_alpha;
+        case zm32RGB << 4 | zm24RGB: return rows.stream_without_alpha;
+        case zm8g << 4 | zm32RGB: return rows.stream_gray_to_32;
         default: return nullptr;
     }
 }

@@ -87,7 +87,9 @@ void TZmBitmapSurface::CopyToTBitmap(TBitmap* Dest) {
     const auto used_bytes = static_cast<std::size_t>(
         (std::int64_t{width} * PixelFormatInfo(bitmap.GetPixelFormat()).bit_count + 7) / 8);
     for (std::int32_t y = 0; y < height; ++y) {
-        std::memcpy(Dest->GetScanLine(y), bitmap.GetScanLine(y), used_bytes);
+        if (const std::uint8_t* const row = bitmap.GetScanLine(y); row != nullptr) {
+            std::memcpy(Dest->GetScanLine(y), row, used_bytes);
+        }
     }
     Dest->SetModified(true);
 }

@@ -7,6 +7,7 @@
 #include <utility>
 
 #include "engine/bitmap/zmmask.h"
+#include "engine/bitmap/zmrunmover_p.h"
 #include "engine/foundation/zmnumbers.h"
 #include "engine/foundation/zmsettings.h"
 #include "engine/platform/memory.h"
@@ -202,8 +203,15 @@ void TZmBitmap::CopyPixelsFrom(TZmBaseBitmap* source) {
     if (fIsVirtual) {
         return;  // its rows are rendered, not kept
     }
-    const auto row_bytes = static_cast<std::size_t>(std::min(fRowLen, source->GetRowLen()));
-    for (std::int32_t y = 0; y < fHeight; ++y) {
+    const auto* const bitmap = dynamic_cast<const TZmBitmap*>(source);
+    const bool is_rendered = bitmap != nullptr && bitmap->fIsVirtual;
+    // Rows of virtual bitmaps may end with their last pixel, or within rows of another bitmap.
+    const std::int64_t used_bytes = (std::int64_t{fWidth} * fBitCount + 7) / 8;
+    const auto row_bytes =
+        static_cast<std::size_t>(is_rendered ? used_bytes : std::min(fRowLen, source->GetRowLen()));
+    const bool is_upward = IsStoredBottomUp(*this) && !is_rendered;
+    for (std::int32_t i = 0; i < fHeight; ++i) {
+        const std::int32_t y = is_upward ? fHeight - 1 - i : i;
         const std::uint8_t* const from = source->GetScanLine(y);
         std::uint8_t* const to = GetScanLine(y);
         if (from != nullptr && to != nullptr) {
@@ -343,6 +351,7 @@ void TZmBitmap::SwitchTo(TZmBitmap* target) {
 void TZmBitmap::SaveState() {
     auto saved = std::make_unique<TZmBitmap>();
     saved->fMinFileSize = fMinFileSize;
+    saved->CopySettingsFrom(*this);
     const TZmBitmapOrigin origin = fOrigin;
     SwitchTo(saved.get());
     fOrigin = origin;

@@ -69,8 +69,8 @@ public:
 
     // Storage.
     /// With the size and format that the bitmap already has, nothing is done to the pixels unless
-    /// fFullReallocate is set. Sizes below 1, unknown formats and byte counts beyond the address
-    /// space give False and size 0.
+    /// fFullReallocate is set. Sizes below 1, unknown formats, rows beyond 32 bits and images that
+    /// no place has room for give False and size 0.
     bool Allocate(std::int32_t width, std::int32_t height, TZmPixelFormat format) override;
     bool Allocate(std::int32_t width, std::int32_t height, TColor fill_color,
                   std::int32_t alpha) override;
@@ -191,7 +191,7 @@ public:
     void RemoveAlphaChannel(bool merge, TColor background);
     void ReplaceAlphaChannel(std::unique_ptr<TZmBitmap> plane);
     std::unique_ptr<TZmBitmap> DetachAlphaChannel(bool create_if_not_exists);
-    /// Run on a plane: fFull says whether all values are 255.
+    /// Run on a plane: fFull says whether all values are 255 (on others, all bytes of pixels).
     void SyncFull();
     bool GetFull() const { return fFull; }
     void SetFull(bool full) { fFull = full; }
@@ -292,6 +292,9 @@ public:
     bool Read(TStream* stream, std::int32_t file_type, TIOParams* params);
     bool Read(const void* buffer, std::int64_t size_bytes, std::int32_t file_type,
               TIOParams* params);
+    /// A resource of a module, by the names of its type and of itself (see TZalmoIO).
+    bool LoadFromResource(const std::u16string& module_path, const std::u16string& resource_type,
+                          const std::u16string& resource_name, std::int32_t file_type);
     /// Saves. Nil parameters: the bitmap's own, bits and samples brought in line with the format;
     /// otherwise the given values are assigned over the bitmap's own first. A file that cannot
     /// be created raises EFCreateError.
@@ -316,9 +319,10 @@ public:
     bool CopyFromDIB(const void* dib, std::int64_t dib_bytes);
     bool CopyFromDIB(const void* bitmap_info, std::int64_t info_bytes, const void* pixels,
                      std::int64_t pixel_bytes);
-    std::vector<std::uint8_t> CreateDIB(std::int32_t dpi_x, std::int32_t dpi_y);
-    std::vector<std::uint8_t> CreateDIB(const TRect& inclusive_rect, std::int32_t dpi_x,
-                                        std::int32_t dpi_y);
+    std::vector<std::uint8_t> CreateDIB(std::int32_t dpi_x = 0, std::int32_t dpi_y = 0);
+    std::vector<std::uint8_t> CreateDIB(std::int32_t x1, std::int32_t y1, std::int32_t x2,
+                                        std::int32_t y2, std::int32_t dpi_x = 0,
+                                        std::int32_t dpi_y = 0);
 
     const std::u16string& GetFilename() const { return fFilename; }
     void SetFilename(const std::u16string& name) { fFilename = name; }
@@ -345,6 +349,7 @@ private:
 
     bool AllocateStorage();
     bool AllocateNewStorage(std::int32_t width, std::int32_t height, TZmPixelFormat format);
+    bool AllocateFirstPixels(TZmPixelFormat format);
     bool ChooseAndAllocate(std::int64_t size_bytes);
     bool AllocateInMemory(std::int64_t size_bytes);
     bool AllocateInFile(std::int64_t size_bytes);

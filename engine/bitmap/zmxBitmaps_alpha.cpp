@@ -24,10 +24,10 @@ void MergeRow(std::uint8_t* pixels, const std::uint8_t* alpha, std::int32_t widt
     }
 }
 
-bool IsOpaqueRow(const std::uint8_t* alpha, std::int32_t width) {
+bool IsOpaqueRow(const std::uint8_t* alpha, std::int64_t byte_count) {
     unsigned all = 255;
-    for (std::int32_t x = 0; x < width; ++x) {
-        all &= alpha[x];
+    for (std::int64_t i = 0; i < byte_count; ++i) {
+        all &= alpha[i];
     }
     return all == 255;
 }
@@ -102,13 +102,11 @@ std::unique_ptr<TZmBitmap> TZmBitmap::DetachAlphaChannel(bool create_if_not_exis
 }
 
 void TZmBitmap::SyncFull() {
-    if (GetPixelFormat() != zm8g) {
-        return;
-    }
+    const std::int64_t used_bytes = (std::int64_t{GetWidth()} * fBitCount + 7) / 8;
     bool is_full = true;
     for (std::int32_t y = 0; is_full && y < fHeight; ++y) {
         const std::uint8_t* const row = GetScanLine(y);
-        is_full = row != nullptr && IsOpaqueRow(row, fWidth);
+        is_full = row != nullptr && IsOpaqueRow(row, used_bytes);
     }
     fFull = is_full;
 }
@@ -138,8 +136,11 @@ void TZmBitmap::CopyRGBAToPlane() {
     for (std::int32_t y = 0; y < fHeight; ++y) {
         const std::uint8_t* const pixels = GetScanLine(y);
         std::uint8_t* const alpha = plane->GetScanLine(y);
+        if (pixels == nullptr || alpha == nullptr) {
+            continue;
+        }
         for (std::int32_t x = 0; x < fWidth; ++x) {
-            alpha[x] = pixels[4 * x + 3];
+            alpha[x] = pixels[4 * std::int64_t{x} + 3];
         }
         plane->fFull = plane->fFull && IsOpaqueRow(alpha, fWidth);
     }
@@ -205,10 +206,11 @@ void TZmBitmap::CopyToTZmMask(TZmMask& dest) {
     const auto width = static_cast<std::size_t>(std::min(plane->fWidth, fWidth));
     for (std::int32_t y = 0; y < std::min(plane->fHeight, fHeight); ++y) {
         std::uint8_t* const mask_row = dest.GetScanLine(y);
-        if (mask_row == nullptr) {
+        const std::uint8_t* const alpha = plane->GetScanLine(y);
+        if (mask_row == nullptr || alpha == nullptr) {
             return;
         }
-        std::memcpy(mask_row, plane->GetScanLine(y), width);
+        std::memcpy(mask_row, alpha, width);
     }
     dest.SyncRect();
     dest.SyncFull();

@@ -4,6 +4,8 @@
 #include <cstring>
 #include <utility>
 
+#include "engine/bitmap/zmrowfiller_p.h"
+#include "engine/bitmap/zmrunmover_p.h"
 #include "engine/bitmap/zmxBitmaps.h"
 #include "engine/foundation/zmnumbers.h"
 
@@ -42,6 +44,40 @@ void FillAround(TZmBitmap& bitmap, const TRect& inner, double value) {
     bitmap.FillRect(0, inner.top, inner.left - 1, inner.bottom, value);
     bitmap.FillRect(inner.right + 1, inner.top, right, inner.bottom, value);
     bitmap.FillRect(0, inner.bottom + 1, right, bottom, value);
+}
+
+/// Where the columns and rows of a new picture come from, and what lies around them.
+struct TCropPlan {
+    TOverlap columns;
+    TOverlap lines;
+    const TRowFiller* filler = nullptr;  ///< nil: the rest stays as allocated
+};
+
+/// Makes a new picture of whole bytes row by row, each row whole, so that memory that the system
+/// clears on its first use is written while it still lies in the caches.
+void CropRows(TZmBitmap& source, TZmBitmap& dest, const TCropPlan& plan) {
+    const std::int32_t width = dest.GetWidth();
+    const std::int32_t right = plan.columns.dest + plan.columns.length;
+    const auto pixel_bytes = static_cast<std::size_t>(dest.GetBitCount()) / 8;
+    const auto count = static_cast<std::size_t>(plan.columns.length) * pixel_bytes;
+    const std::size_t from = static_cast<std::size_t>(plan.columns.source) * pixel_bytes;
+    const std::size_t to = static_cast<std::size_t>(plan.columns.dest) * pixel_bytes;
+    const std::int32_t height = dest.GetHeight();
+    const bool is_upward = IsStoredBottomUp(dest);
+    for (std::int32_t i = 0; i < height; ++i) {
+        const std::int32_t y = is_upward ? height - 1 - i : i;
+        const std::int32_t line = y - plan.lines.dest;
+        const bool is_inside = line >= 0 && line < plan.lines.length;
+        std::uint8_t* const row = dest.GetScanLine(y);
+        if (is_inside) {
+            const std::uint8_t* const pixels = source.GetScanLine(plan.lines.source + line);
+            std::memcpy(row + to, pixels + from, count);
+        }
+        if (plan.filler != nullptr) {
+            plan.filler->Fill(row, 0, is_inside ? plan.columns.dest : width);
+            plan.filler->Fill(row, right, is_inside ? width - right : 0);
+        }
+    }
 }
 
 /// First and last coordinate of a new canvas, counted in the old one. Both centre offsets, of a
@@ -143,14 +179,20 @@ void TZmBitmap::CropPixelsFrom(TZmBitmap& source, std::int32_t x1, std::int32_t 
     const TOverlap columns = FindOverlap(x1, fWidth, source.fWidth);
     const TOverlap lines = FindOverlap(y1, fHeight, source.fHeight);
     const bool is_overlapping = columns.length > 0 && lines.length > 0;
-    if (fill_value != nullptr && (!is_overlapping || fPixelFormat == zm1g)) {
+    const bool is_one_bit = fPixelFormat == zm1g;
+    if (fill_value != nullptr && (!is_overlapping || is_one_bit)) {
         // One bit a pixel is filled whole, which gives the unused bits of the rows a value too.
         Fill(*fill_value);
-    } else if (fill_value != nullptr) {
-        FillAround(*this, PictureIn(columns, lines), *fill_value);
     }
-    source.CopyRectTo(this, columns.source, lines.source, columns.dest, lines.dest, columns.length,
-                      lines.length, /*copy_alpha=*/false);
+    if (is_overlapping && is_one_bit) {
+        source.CopyRectTo(this, columns.source, lines.source, columns.dest, lines.dest,
+                          columns.length, lines.length, /*copy_alpha=*/false);
+    } else if (is_overlapping) {
+        const TRowFiller filler(fPixelFormat,
+                                MakePattern(fPixelFormat, fill_value ? *fill_value : 0), fWidth);
+        CropRows(source, *this,
+                 TCropPlan{columns, lines, fill_value != nullptr ? &filler : nullptr});
+    }
 }
 
 /// Gives this new image the plane of `source`, cropped at the same corner; grown parts take

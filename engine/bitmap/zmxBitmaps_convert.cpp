@@ -6,10 +6,13 @@
 #include <array>
 #include <cstring>
 
+#include "engine/bitmap/zmbitmapmemory_p.h"
 #include "engine/bitmap/zmonebit_p.h"
 #include "engine/bitmap/zmquantizer.h"
 #include "engine/bitmap/zmrgbpixels_p.h"
 #include "engine/bitmap/zmrowconvert.h"
+#include "engine/bitmap/zmrowconvert_fast_p.h"
+#include "engine/bitmap/zmrunmover_p.h"
 #include "engine/bitmap/zmxBitmaps.h"
 #include "engine/foundation/zmnumbers.h"
 
@@ -126,6 +129,45 @@ TZmPixelFormat FindPreferredFormat(TZmPixelFormat present, const TZmPixelFormatS
     return static_cast<TZmPixelFormat>(ordinal);
 }
 
+/// Converts rows one after the other into a bitmap. Where the target is large and was in use
+/// before, they go past the caches, which saves reading the target's lines before they are
+/// overwritten: by a function of their own, or moved from a buffer when the source is no larger.
+class TRowWriter {
+public:
+    TRowWriter(TZmBitmap& source, TZmBitmap& dest, bool was_dest_filled)
+        : convert_(FindRowFunction(source.GetPixelFormat(), dest.GetPixelFormat())),
+          width_(dest.GetWidth()),
+          row_bytes_(static_cast<std::size_t>(std::int64_t{width_} * dest.GetBitCount() / 8)),
+          mover_(dest, dest.GetRowLen() * dest.GetHeight()) {
+        if (!was_dest_filled || !mover_.IsStreaming()) {
+            return;
+        }
+        const TZmRowFunction stream =
+            FindStreamingRowFunction(source.GetPixelFormat(), dest.GetPixelFormat());
+        if (stream != nullptr) {
+            convert_ = stream;  // the mover ends what it leaves under way
+        } else if (source.GetBitCount() <= dest.GetBitCount()) {
+            buffer_.resize(row_bytes_);
+        }
+    }
+
+    void Write(const std::uint8_t* from, std::uint8_t* to, const TZmRowContext& context) {
+        if (buffer_.empty()) {
+            convert_(from, to, width_, context);
+        } else {
+            convert_(from, buffer_.data(), width_, context);
+            mover_.Move(to, buffer_.data(), row_bytes_);
+        }
+    }
+
+private:
+    TZmRowFunction convert_;
+    std::int32_t width_;
+    std::size_t row_bytes_;
+    TRunMover mover_;
+    std::vector<std::uint8_t> buffer_;
+};
+
 template <typename Channel>
 bool IsGrayRow(const std::uint8_t* row, std::int32_t width, std::size_t channel_count) {
     for (std::int32_t x = 0; x < width; ++x, row += channel_count * sizeof(Channel)) {
@@ -141,7 +183,6 @@ bool IsGrayRow(const std::uint8_t* row, std::int32_t width, std::size_t channel_
 // Cells of the matrix.
 
 void TZmBitmap::ConvertRowsFrom(TZmBitmap& source) {
-    const TZmRowFunction convert = FindRowFunction(source.fPixelFormat, fPixelFormat);
     const TZmRowContext context = source.GetRowLayout().context;
     if (fPixelFormat == zm8p && source.fPixelFormat == zm1g) {
         fRGBPalette.assign(kPaletteEntries, TRGB{});
@@ -149,12 +190,20 @@ void TZmBitmap::ConvertRowsFrom(TZmBitmap& source) {
     } else if (fPixelFormat == zm8p) {
         SetGrayPalette();
     }
-    for (std::int32_t y = 0; y < fHeight; ++y) {
+    const bool was_filled =
+        fEncapsulatedFromMemory || WasBlockFilled(fRealMemory, fRealMemoryAllocator);
+    TRowWriter writer(source, *this, was_filled);
+    const bool is_upward = IsStoredBottomUp(*this) && !source.fIsVirtual;
+    for (std::int32_t i = 0; i < fHeight; ++i) {
+        const std::int32_t y = is_upward ? fHeight - 1 - i : i;
         const std::uint8_t* const from = source.GetScanLine(y);
         std::uint8_t* const to = GetScanLine(y);
         if (from != nullptr && to != nullptr) {
-            convert(from, to, fWidth, context);
+            writer.Write(from, to, context);
         }
+    }
+    if (!fEncapsulatedFromMemory) {
+        NoteBlockFilled(fRealMemory, fRealMemoryAllocator);
     }
 }
 
@@ -165,23 +214,30 @@ void TZmBitmap::ConvertToOneBitFrom(TZmBitmap& source) {
         return;
     }
     const bool is_ordered = fDefaultDitherMethod == zmOrdered;
+    const bool is_ordered_float = is_ordered && source.fPixelFormat == zm32f;
     TGrayRows rows(source, source.GetRowLayout().context);
     std::int32_t level = 0;
     if (!is_ordered) {
         TGrayHistogram histogram{};
         for (std::int32_t y = 0; y < fHeight; ++y) {
-            AddToHistogram(rows.GetRow(y), fWidth, histogram);
+            if (const std::uint8_t* const gray = rows.GetRow(y)) {
+                AddToHistogram(gray, fWidth, histogram);
+            }
         }
         level = FindAutomaticLevel(histogram);
     }
     for (std::int32_t y = 0; y < fHeight; ++y) {
+        const std::uint8_t* const from = is_ordered_float ? source.GetScanLine(y) : rows.GetRow(y);
         std::uint8_t* const to = GetScanLine(y);
-        if (!is_ordered) {
-            ThresholdBits(rows.GetRow(y), to, fWidth, level);
-        } else if (source.fPixelFormat == zm32f) {
-            OrderedBitsFromFloat(source.GetScanLine(y), to, fWidth, y);
+        if (from == nullptr || to == nullptr) {
+            continue;
+        }
+        if (is_ordered_float) {
+            OrderedBitsFromFloat(from, to, fWidth, y);
+        } else if (is_ordered) {
+            OrderedBitsFromGray(from, to, fWidth, y);
         } else {
-            OrderedBitsFromGray(rows.GetRow(y), to, fWidth, y);
+            ThresholdBits(from, to, fWidth, level);
         }
     }
 }
@@ -198,6 +254,9 @@ void TZmBitmap::ConvertGrayRangeFrom(TZmBitmap& source) {
         for (std::int32_t y = 0; y < fHeight; ++y) {
             const std::uint8_t* const from = source.GetScanLine(y);
             std::uint8_t* to = GetScanLine(y);
+            if (from == nullptr || to == nullptr) {
+                continue;
+            }
             for (std::int32_t x = 0; x < fWidth; ++x, to += 3) {
                 std::memset(to, table[GrayAt(from, x, is_16_bit)], 3);
             }
@@ -276,13 +335,16 @@ bool TZmBitmap::SetPixelFormat(TZmPixelFormat format) {
     if (format == GetPixelFormat()) {
         return true;
     }
-    if (fIsVirtual || IsEmpty()) {
+    if (fIsVirtual || fWidth < 1 || fHeight < 1) {
         fPixelFormat = IsImageFormat(format) ? format : zmnull;
         DeriveFields();
         return true;
     }
     if (!IsImageFormat(format)) {
         return false;
+    }
+    if (IsEmpty()) {
+        return AllocateFirstPixels(format);
     }
     if (fLocation == zmTBitmap) {
         return ConvertTBitmapFormat(format);
@@ -291,13 +353,39 @@ bool TZmBitmap::SetPixelFormat(TZmPixelFormat format) {
     old.fMinFileSize = fMinFileSize;
     old.fMemoryAllocator = fMemoryAllocator;
     old.MovePixelsFrom(*this);
-    if (!AllocateNewStorage(old.fWidth, old.fHeight, format) || !ConvertPixelsFrom(old)) {
+    bool is_converted = false;
+    try {
+        is_converted =
+            AllocateNewStorage(old.fWidth, old.fHeight, format) && ConvertPixelsFrom(old);
+    } catch (...) {  // a row on disk that cannot be mapped, or no memory for a row
+        FreePixels();
+        MovePixelsFrom(old);
+        throw;
+    }
+    if (!is_converted) {
         FreePixels();
         MovePixelsFrom(old);
         return false;
     }
     Changed();
     return true;
+}
+
+/// Makes room for a bitmap that was given its sides before its format. Without room the sides
+/// stay, and the format is none.
+bool TZmBitmap::AllocateFirstPixels(TZmPixelFormat format) {
+    const std::int32_t width = fWidth;
+    const std::int32_t height = fHeight;
+    const bool is_allocated = AllocateNewStorage(width, height, format);
+    if (is_allocated) {
+        Changed();
+    } else {
+        fWidth = width;
+        fHeight = height;
+        fPixelFormat = zmnull;
+        DeriveFields();
+    }
+    return is_allocated;
 }
 
 /// Converts within what a platform bitmap can hold; other formats are refused.
@@ -343,6 +431,9 @@ bool TZmBitmap::IsGrayScale() {
     }
     for (std::int32_t y = 0; y < fHeight && !IsEmpty(); ++y) {
         const std::uint8_t* const row = GetScanLine(y);
+        if (row == nullptr) {
+            return false;
+        }
         const bool is_gray = format == zm48RGB
                                  ? IsGrayRow<std::uint16_t>(row, fWidth, 3)
                                  : IsGrayRow<std::uint8_t>(row, fWidth, format == zm24RGB ? 3 : 4);

@@ -1,28 +1,24 @@
 /// Fills: one pixel is made from the value, rows are its repetition.
 
 #include <algorithm>
-#include <array>
 #include <cstring>
 #include <vector>
 
 #include "engine/bitmap/zmbitrow_p.h"
 #include "engine/bitmap/zmrowconvert.h"
+#include "engine/bitmap/zmrowfiller_p.h"
+#include "engine/bitmap/zmrunmover_p.h"
 #include "engine/bitmap/zmxBitmaps.h"
 #include "engine/foundation/zmnumbers.h"
 
 namespace zm {
 namespace {
 
-/// The bytes of one pixel; for zm1g the first byte is not 0 when bits are to be set.
-struct TPixelPattern {
-    std::array<std::uint8_t, 8> bytes{};
-    std::size_t size = 1;
-
-    bool HasEqualBytes() const {
-        return std::all_of(bytes.begin(), bytes.begin() + static_cast<std::ptrdiff_t>(size),
-                           [this](std::uint8_t byte) { return byte == bytes[0]; });
-    }
-};
+bool HasEqualBytes(const TPixelPattern& pattern) {
+    return std::all_of(pattern.bytes.begin(),
+                       pattern.bytes.begin() + static_cast<std::ptrdiff_t>(pattern.size),
+                       [&](std::uint8_t byte) { return byte == pattern.bytes[0]; });
+}
 
 template <typename T>
 TPixelPattern PatternOf(const T& pixel) {
@@ -40,21 +36,6 @@ TPixelPattern PatternOfColor(TRGB rgb, TZmPixelFormat format) {
     FindRowFunction(zm24RGB, format)(reinterpret_cast<const std::uint8_t*>(&rgb),
                                      pattern.bytes.data(), 1, TZmRowContext{});
     return pattern;
-}
-
-TPixelPattern MakePattern(TZmPixelFormat format, double value) {
-    const std::int32_t integer = TruncToInt(value);
-    switch (format) {
-        case zm1g: return PatternOf(static_cast<std::uint8_t>(value != 0 ? 255 : 0));
-        case zm16g: return PatternOf(static_cast<std::uint16_t>(integer));
-        case zm24RGB: return PatternOf(RGBFromColor(integer));
-        case zm32f: return PatternOf(static_cast<float>(value));
-        case zmCMYK:
-        case zm48RGB:
-        case zmCIELab:
-        case zm32RGB: return PatternOfColor(RGBFromColor(integer), format);
-        default: return PatternOf(static_cast<std::uint8_t>(integer));
-    }
 }
 
 /// `count` pixels in a row, made by doubling.
@@ -88,29 +69,58 @@ private:
 void FillRows(TZmBitmap& bitmap, const TRect& rect, const TPixelPattern& pattern) {
     const std::int32_t width = rect.right - rect.left + 1;
     const bool is_whole_rows = width == bitmap.GetWidth();
-    const bool is_one_bit = bitmap.GetPixelFormat() == zm1g;
-    const bool is_one_byte = !is_one_bit && pattern.HasEqualBytes();
-    const std::size_t offset = static_cast<std::size_t>(rect.left) * pattern.size;
-    const std::size_t count = static_cast<std::size_t>(width) * pattern.size;
-    // Whole rows take the unused bits of their last byte along.
-    const std::int64_t bit_count = is_whole_rows ? (std::int64_t{width} + 7) / 8 * 8 : width;
-    std::vector<std::uint8_t> row;
-    if (!is_one_bit && !is_one_byte) {
-        row = MakePatternRow(pattern, static_cast<std::size_t>(width));
-    }
-    for (std::int32_t y = rect.top; y <= rect.bottom; ++y) {
-        std::uint8_t* const line = bitmap.GetScanLine(y);
-        if (is_one_bit) {
-            FillBits(line, rect.left, bit_count, pattern.bytes[0] != 0);
-        } else if (is_one_byte) {
-            std::memset(line + offset, pattern.bytes[0], count);
-        } else {
-            std::memcpy(line + offset, row.data(), count);
-        }
+    const TRowFiller filler(bitmap.GetPixelFormat(), pattern, width);
+    // Whole rows of bits take the unused ones of their last byte along.
+    const bool takes_rest = bitmap.GetPixelFormat() == zm1g && is_whole_rows;
+    const std::int64_t count = takes_rest ? (std::int64_t{width} + 7) / 8 * 8 : width;
+    const bool is_upward = IsStoredBottomUp(bitmap);
+    for (std::int32_t i = 0; i <= rect.bottom - rect.top; ++i) {
+        const std::int32_t y = is_upward ? rect.bottom - i : rect.top + i;
+        filler.Fill(bitmap.GetScanLine(y), rect.left, count);
     }
 }
 
 }  // namespace
+
+TPixelPattern MakePattern(TZmPixelFormat format, double value) {
+    const std::int32_t integer = TruncToInt(value);
+    switch (format) {
+        case zm1g: return PatternOf(static_cast<std::uint8_t>(value != 0 ? 255 : 0));
+        case zm16g: return PatternOf(static_cast<std::uint16_t>(integer));
+        case zm24RGB: return PatternOf(RGBFromColor(integer));
+        case zm32f: return PatternOf(static_cast<float>(value));
+        case zmCMYK:
+        case zm48RGB:
+        case zmCIELab:
+        case zm32RGB: return PatternOfColor(RGBFromColor(integer), format);
+        default: return PatternOf(static_cast<std::uint8_t>(integer));
+    }
+}
+
+TRowFiller::TRowFiller(TZmPixelFormat format, const TPixelPattern& pattern,
+                       std::int32_t longest_run)
+    : pattern_(pattern), is_one_bit_(format == zm1g) {
+    if (!is_one_bit_ && !HasEqualBytes(pattern) && longest_run > 0) {
+        run_ = MakePatternRow(pattern, static_cast<std::size_t>(longest_run));
+    }
+}
+
+void TRowFiller::Fill(std::uint8_t* row, std::int32_t x, std::int64_t count) const {
+    if (count < 1) {
+        return;
+    }
+    if (is_one_bit_) {
+        FillBits(row, x, count, pattern_.bytes[0] != 0);
+        return;
+    }
+    std::uint8_t* const first = row + static_cast<std::size_t>(x) * pattern_.size;
+    const std::size_t bytes = static_cast<std::size_t>(count) * pattern_.size;
+    if (run_.empty()) {
+        std::memset(first, pattern_.bytes[0], bytes);
+    } else {
+        std::memcpy(first, run_.data(), bytes);
+    }
+}
 
 void TZmBitmap::Fill(double value) {
     FillRect(0, 0, GetWidth() - 1, fHeight - 1, value);

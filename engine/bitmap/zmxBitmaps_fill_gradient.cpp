@@ -2,6 +2,7 @@
 
 #include <algorithm>
 #include <cstring>
+#include <new>
 #include <type_traits>
 #include <vector>
 
@@ -96,6 +97,15 @@ void WriteGradientPixel(TZmPixelFormat format, const TZmPixelBytes& start, const
     }
 }
 
+/// Bytes of pixels of a gradient, of which a long row of bits can ask for more than there can be.
+std::size_t BytesOfPixels(std::int64_t count, std::size_t pixel_bytes) {
+    const std::int64_t bytes = count * static_cast<std::int64_t>(pixel_bytes);
+    if (!FitsAddressSpace(bytes)) {
+        throw std::bad_alloc();
+    }
+    return static_cast<std::size_t>(bytes);
+}
+
 /// The pixels of all places that a rectangle's visible part has, ordered for rows: falling along
 /// a row where the way leads to the left.
 class TGradientTable {
@@ -110,12 +120,11 @@ public:
             way.PlaceOf(visible.left, visible.bottom), way.PlaceOf(visible.right, visible.bottom)};
         const auto [low, high] = std::minmax_element(std::begin(corners), std::end(corners));
         first_ = step_ < 0 ? *high : *low;
-        const auto count = static_cast<std::size_t>(*high - *low + 1);
-        bytes_.resize(count * pixel_bytes_);
-        for (std::size_t i = 0; i < count; ++i) {
-            const auto offset = static_cast<std::int64_t>(i);
-            WriteGradientPixel(format, start, end, bytes_.data() + i * pixel_bytes_,
-                               step_ < 0 ? first_ - offset : first_ + offset, way.Length());
+        bytes_.resize(BytesOfPixels(*high - *low + 1, pixel_bytes_));
+        std::int64_t place = first_;
+        for (std::size_t i = 0; i < bytes_.size(); i += pixel_bytes_) {
+            WriteGradientPixel(format, start, end, bytes_.data() + i, place, way.Length());
+            place += step_ < 0 ? -1 : 1;
         }
     }
 
@@ -128,7 +137,7 @@ public:
         if (step_ != 0) {
             return pixel;
         }
-        buffer.resize(static_cast<std::size_t>(width) * pixel_bytes_);
+        buffer.resize(BytesOfPixels(width, pixel_bytes_));
         for (std::size_t i = 0; i < buffer.size(); i += pixel_bytes_) {
             std::memcpy(buffer.data() + i, pixel, pixel_bytes_);
         }

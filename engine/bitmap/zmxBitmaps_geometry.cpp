@@ -1,51 +1,61 @@
 /// Copies and moves of rectangles.
 
 #include <algorithm>
-#include <cstring>
 #include <vector>
 
 #include "engine/bitmap/zmbitrow_p.h"
 #include "engine/bitmap/zmcopyspan_p.h"
 #include "engine/bitmap/zmellipse_p.h"
 #include "engine/bitmap/zmrgbpixels_p.h"
+#include "engine/bitmap/zmrunmover_p.h"
 #include "engine/bitmap/zmxBitmaps.h"
 #include "engine/foundation/zmnumbers.h"
 
 namespace zm {
 namespace {
 
+/// Pixels that go through RGB at a time, so that the buffer stays in the nearest cache.
+constexpr std::int32_t kRunPixels = 4096;
+
 /// Copies runs of pixels from rows of one bitmap to rows of another or of the same.
 class TRunCopier {
 public:
-    TRunCopier(const TZmRowLayout& source, const TZmRowLayout& dest, bool is_same_bitmap)
+    TRunCopier(const TZmRowLayout& source, const TZmRowLayout& dest, bool is_same_bitmap,
+               const TRunMover& mover)
         : source_(source),
           dest_(dest),
           is_same_format_(source.format == dest.format),
           is_same_bitmap_(is_same_bitmap),
-          pixel_bytes_(PixelFormatInfo(source.format).bit_count / 8) {}
+          pixel_bytes_(PixelFormatInfo(source.format).bit_count / 8),
+          mover_(mover) {}
 
     void Copy(const std::uint8_t* from, std::int32_t from_x, std::uint8_t* to, std::int32_t to_x,
               std::int32_t count) {
         if (!is_same_format_) {
-            pixels_.resize(static_cast<std::size_t>(count));
-            LoadRGBPixels(from, from_x, count, source_, pixels_.data());
-            StoreRGBPixels(pixels_.data(), to, to_x, count, dest_);
+            ConvertRun(from, from_x, to, to_x, count);
         } else if (source_.format == zm1g) {
             CopyBitRun(from, from_x, to, to_x, count);
         } else {
             const auto bytes =
                 static_cast<std::size_t>(count) * static_cast<std::size_t>(pixel_bytes_);
-            const std::uint8_t* const first = from + std::int64_t{from_x} * pixel_bytes_;
-            std::uint8_t* const target = to + std::int64_t{to_x} * pixel_bytes_;
-            if (is_same_bitmap_) {
-                std::memmove(target, first, bytes);
-            } else {
-                std::memcpy(target, first, bytes);
-            }
+            mover_.Move(to + std::int64_t{to_x} * pixel_bytes_,
+                        from + std::int64_t{from_x} * pixel_bytes_, bytes);
         }
     }
 
 private:
+    void ConvertRun(const std::uint8_t* from, std::int32_t from_x, std::uint8_t* to,
+                    std::int32_t to_x, std::int32_t count) {
+        pixels_.resize(static_cast<std::size_t>(std::min(count, kRunPixels)));
+        while (count > 0) {
+            const std::int32_t length = std::min(count, kRunPixels);
+            LoadRGBPixels(from, from_x, length, source_, pixels_.data());
+            StoreRGBPixels(pixels_.data(), to, to_x, length, dest_);
+            from_x += length;
+            to_x += length;
+            count -= length;
+        }
+    }
     void CopyBitRun(const std::uint8_t* from, std::int32_t from_x, std::uint8_t* to,
                     std::int32_t to_x, std::int32_t count) {
         if (!is_same_bitmap_) {
@@ -62,6 +72,7 @@ private:
     bool is_same_format_;
     bool is_same_bitmap_;
     std::int32_t pixel_bytes_;
+    const TRunMover& mover_;
     std::vector<TRGB> pixels_;
     std::vector<std::uint8_t> bits_;
 };
@@ -133,9 +144,11 @@ void TZmBitmap::CopyRowsTo(TZmBitmap& dest, const TRect& area, std::int32_t shif
     const bool is_same_bitmap = &dest == this;
     const TZmRowLayout source_layout = GetRowLayout();
     const TZmRowLayout dest_layout = dest.GetRowLayout();
-    TRunCopier copier(source_layout, dest_layout, is_same_bitmap);
+    const std::int64_t pixels = std::int64_t{area.right - area.left} * (area.bottom - area.top);
+    const TRunMover mover(dest, pixels / 8 * fBitCount);
+    TRunCopier copier(source_layout, dest_layout, is_same_bitmap, mover);
     // Inside one image, rows are taken before they are overwritten.
-    const bool is_upward = is_same_bitmap && shift_y < 0;
+    const bool is_upward = is_same_bitmap ? shift_y < 0 : IsStoredBottomUp(dest);
     for (std::int32_t i = 0; i < area.bottom - area.top; ++i) {
         const std::int32_t y = is_upward ? area.bottom - 1 - i : area.top + i;
         std::int64_t left = area.left;

@@ -3,9 +3,9 @@
 
 #include <algorithm>
 #include <cmath>
-#include <cstring>
 
 #include "engine/bitmap/zmrender_p.h"
+#include "engine/bitmap/zmrunmover_p.h"
 #include "engine/foundation/zmnumbers.h"
 
 namespace zm {
@@ -106,15 +106,19 @@ bool HasColorRows(TZmBitmap& bitmap) {
            bitmap.GetRowLen() / 3 >= bitmap.GetWidth();
 }
 
-/// Rows that lie one to one, from the top.
+/// Rows that lie one to one: an image into itself from the top, others as they lie in memory.
 void CopyRows(TZmBitmap& source, const TZmRenderCall& call, const TRect& area) {
     const auto bytes = static_cast<std::size_t>(area.right - area.left) * sizeof(TRGB);
     const std::int64_t source_x = std::int64_t{call.source.x} + area.left - call.dest.x;
-    for (std::int32_t y = area.top; y < area.bottom; ++y) {
+    const std::int32_t height = area.bottom - area.top;
+    const TRunMover mover(*call.destination, static_cast<std::int64_t>(bytes) * height);
+    const bool is_upward = &source != call.destination && IsStoredBottomUp(*call.destination);
+    for (std::int32_t i = 0; i < height; ++i) {
+        const std::int32_t y = is_upward ? area.bottom - 1 - i : area.top + i;
         const TRowHold from(source, call.source.y + (y - call.dest.y));
         const TRowHold to(*call.destination, y);
         if (from.Get() != nullptr && to.Get() != nullptr) {
-            std::memmove(to.Get() + std::int64_t{area.left} * 3, from.Get() + source_x * 3, bytes);
+            mover.Move(to.Get() + std::int64_t{area.left} * 3, from.Get() + source_x * 3, bytes);
         }
     }
 }
@@ -227,8 +231,11 @@ void TZmBitmapRendering::RenderDirect(const TZmRenderCall& call) {
     const bool is_reduced = call.transparency < 255 || call.opacity < 1.0;
     const bool is_blending = is_reduced || (plane != nullptr && !plane->GetFull());
     const TRect area = FindVisibleRect(call);
+    const bool is_visible = area.left < area.right && area.top < area.bottom;
     if (IsPlainCopy(call, is_blending)) {
-        CopyRows(Self(), call, area);
+        if (is_visible) {
+            CopyRows(Self(), call, area);
+        }
     } else {
         const std::vector<std::uint8_t> row_alpha(
             static_cast<std::size_t>(is_reduced ? GetWidth() : 0),
@@ -239,7 +246,7 @@ void TZmBitmapRendering::RenderDirect(const TZmRenderCall& call) {
         TZmLookupTable& rows = call.rows != nullptr ? *call.rows : own_rows;
         PrepareTable(columns, call.dest.width, call.source.x, call.ratio_x, GetWidth());
         PrepareTable(rows, call.dest.height, call.source.y, call.ratio_y, GetHeight());
-        if (area.left < area.right && area.top < area.bottom) {
+        if (is_visible) {
             TZmRenderTransfer transfer{call.destination, area};
             transfer.columns = columns.data() + (area.left - call.dest.x);
             transfer.rows = rows.data() + (area.top - call.dest.y);

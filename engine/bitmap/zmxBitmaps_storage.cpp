@@ -139,8 +139,8 @@ bool TZmBitmap::AllocateStorage() {
     }
     if (!fIsVirtual) {
         const auto size_bytes = CheckedMul(fRowLen, fHeight);
-        if (!size_bytes || *size_bytes > kLargestImageBytes ||
-            !FitsAddressSpace(*size_bytes + kBlockSlackBytes) || !ChooseAndAllocate(*size_bytes)) {
+        // Larger than the address space is no obstacle: such an image goes to disk.
+        if (!size_bytes || *size_bytes > kLargestImageBytes || !ChooseAndAllocate(*size_bytes)) {
             return false;
         }
     }

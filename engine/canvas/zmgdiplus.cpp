@@ -13,7 +13,7 @@
 namespace zm {
 
 platform::TArgb ZmColorToARGB(TColor Color, std::int32_t Alpha) {
-    return platform::MakeArgb(Clamp8(Alpha), RGBFromColor(Color));
+    return platform::MakeArgb(Clamp8(Alpha), RGBFromColor(ColorToRGB(Color)));
 }
 
 TZmLibraryHold::TZmLibraryHold(bool is_wanted)

@@ -97,7 +97,7 @@ private:
     bool is_bound_ = false;
 };
 
-/// The colour's channels with an alpha before them; a system colour's high byte is dropped.
+/// The channels of the colour that ColorToRGB gives, with an alpha before them.
 platform::TArgb ZmColorToARGB(TColor Color, std::int32_t Alpha);
 
 /// Pen of an antialiasing canvas. Without the library it only passes its values on to the
@@ -179,8 +179,8 @@ private:
 
 using TZmMetafileHeader = platform::TDrawMetafileHeader;
 
-/// A recorded picture. One that cannot be read, or without a reader on this system, has a header
-/// of type 0 and draws nothing.
+/// A recorded picture. One that cannot be read, or of a kind that this system cannot play, has a
+/// header of type 0 and draws nothing.
 class TZmMetafile {
 public:
     explicit TZmMetafile(const std::u16string& Filename);

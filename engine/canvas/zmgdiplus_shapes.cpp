@@ -333,6 +333,7 @@ void TZmCanvas::GradientFillRect(const TRect& Rect, TColor FromColor, TColor ToC
     TZmBrush gradient(/*Brush=*/nullptr);
     gradient.SetTransparency(fBrush->GetTransparency());
     gradient.SetBackTransparency(fBrush->GetBackTransparency());
+    gradient.SetStyle(fBrush->GetStyle());  // counts where the direction gives no gradient
     gradient.SetColor(FromColor);
     gradient.SetBackColor(ToColor);
     gradient.SetGradient(Dir, SaturateToInt32(std::int64_t{rect.right} - rect.left),

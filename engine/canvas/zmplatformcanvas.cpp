@@ -1,6 +1,13 @@
 #include "engine/canvas/zmplatformcanvas.h"
 
+#include "engine/platform/screen.h"
+
 namespace zm {
+
+TColor ColorToRGB(TColor Color) {
+    const auto number = static_cast<std::uint8_t>(Color & 0xFF);
+    return Color < 0 ? static_cast<TColor>(platform::SystemColor(number)) : Color;
+}
 
 platform::TDrawFont DrawFontOf(const TFont& font) {
     platform::TDrawFont result;
@@ -33,11 +40,11 @@ platform::TPlatformCanvas* TCanvas::Device() {
 }
 
 platform::TPlainPen TCanvas::PlainPen() const {
-    return {Pen.Color, Pen.Width, Pen.Style, Pen.Mode};
+    return {ColorToRGB(Pen.Color), Pen.Width, Pen.Style, Pen.Mode};
 }
 
 platform::TPlainBrush TCanvas::PlainBrush() const {
-    return {Brush.Color, Brush.Style};
+    return {ColorToRGB(Brush.Color), Brush.Style};
 }
 
 void* TCanvas::GetHandle() {
@@ -137,24 +144,27 @@ TPoint TCanvas::TextExtent(const std::u16string& Text) {
 }
 
 void TCanvas::TextOut(std::int32_t X, std::int32_t Y, const std::u16string& Text) {
-    if (auto* const device = Device()) {
-        const TColor* const background = Brush.Style == bsClear ? nullptr : &Brush.Color;
-        device->TextOut(X, Y, Text, DrawFontOf(Font), Font.Color, background, /*clip=*/nullptr);
-    }
+    DrawText(X, Y, Text, /*clip=*/nullptr);
 }
 
 void TCanvas::TextRect(const TRect& Rect, std::int32_t X, std::int32_t Y,
                        const std::u16string& Text) {
+    DrawText(X, Y, Text, &Rect);
+}
+
+void TCanvas::DrawText(std::int32_t x, std::int32_t y, const std::u16string& text,
+                       const TRect* clip) {
     if (auto* const device = Device()) {
-        const TColor* const background = Brush.Style == bsClear ? nullptr : &Brush.Color;
-        device->TextOut(X, Y, Text, DrawFontOf(Font), Font.Color, background, &Rect);
+        const TColor background = ColorToRGB(Brush.Color);
+        device->TextOut(x, y, text, DrawFontOf(Font), ColorToRGB(Font.Color),
+                        Brush.Style == bsClear ? nullptr : &background, clip);
     }
 }
 
 void TCanvas::TextInRect(const TRect& Rect, const std::u16string& Text,
                          const platform::TPlainTextLayout& Layout) {
     if (auto* const device = Device()) {
-        device->TextInRect(Rect, Text, DrawFontOf(Font), Font.Color, Layout);
+        device->TextInRect(Rect, Text, DrawFontOf(Font), ColorToRGB(Font.Color), Layout);
     }
 }
 

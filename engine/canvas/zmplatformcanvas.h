@@ -121,6 +121,7 @@ public:
 
 private:
     platform::TPlatformCanvas* Device();
+    void DrawText(std::int32_t x, std::int32_t y, const std::u16string& text, const TRect* clip);
     platform::TPlainPen PlainPen() const;
     platform::TPlainBrush PlainBrush() const;
 
@@ -129,6 +130,9 @@ private:
     std::unique_ptr<platform::TPlatformCanvas> device_;
     std::uint32_t generation_ = 0;  // of the pixels that device_ draws on
 };
+
+/// The colour that a value stands for: negative values number the system's colours (low byte).
+TColor ColorToRGB(TColor Color);
 
 /// What the drawing calls take of a font.
 platform::TDrawFont DrawFontOf(const TFont& font);

@@ -1,15 +1,14 @@
 // Reader of Windows and OS/2 bitmaps (BMP, DIB, RLE): a file header of 14 bytes, an info header
 // told by its size, a palette or channel masks, and rows of whole 32-bit words, bottom row first
-// unless the height is negative. Little-endian throughout. 1, 4, 8, 16, 24 and 32 bits per pixel,
-// RLE4, RLE8 and bit fields; embedded JPEG and PNG, Huffman and 24-bit run-length data are not
-// read.
+// unless the height is negative. Little-endian throughout. 1, 2, 4, 8, 16, 24 and 32 bits per
+// pixel, RLE4, RLE8 and bit fields; embedded JPEG and PNG, Huffman and 24-bit run-length data are
+// not read.
 
 #include "engine/codecs/bmpfilt.h"
 
 #include <algorithm>
 #include <bit>
 #include <cstring>
-#include <new>
 #include <optional>
 
 #include "engine/bitmap/zmmask.h"
@@ -142,15 +141,21 @@ TIOBMPVersion VersionOfHeader(std::uint32_t header_bytes) {
     }
 }
 
-// Which compression goes with which depth; depths outside the table are not read at all.
+bool HasBitFields(std::uint32_t compression) {
+    return compression == kBmpBitFields || compression == kBmpAlphaBitFields;
+}
+
+// Which compression goes with which depth; depths outside the table are not read at all. At 24
+// bits masks can only name the bytes in their usual order, so they are passed over.
 bool IsDepthSupported(std::int32_t bit_count, std::uint32_t compression) {
     switch (bit_count) {
         case 1:
-        case 24: return compression == kBmpNone;
+        case 2: return compression == kBmpNone;
         case 4: return compression == kBmpNone || compression == kBmpRle4;
         case 8: return compression == kBmpNone || compression == kBmpRle8;
         case 16:
-        case 32: return compression == kBmpNone || compression == kBmpBitFields;
+        case 32: return compression == kBmpNone || HasBitFields(compression);
+        case 24: return compression == kBmpNone || compression == kBmpBitFields;
         default: return false;
     }
 }
@@ -167,7 +172,8 @@ TBmpStatus ReadFileHeader(TBmpRead& read) {
     read.header.file_bytes = reader.U32LE();
     reader.Skip(4);
     read.header.pixel_offset = reader.U32LE();
-    if (read.byte_limit == 0) {
+    // A size that ends before the pixels begin is nothing to go by.
+    if (read.byte_limit == 0 && read.header.file_bytes > read.header.pixel_offset) {
         read.byte_limit = read.header.file_bytes;
     }
     return TBmpStatus::kOk;
@@ -288,13 +294,14 @@ void ReadPalette(TBmpRead& read) {
     read.params.fColorMapCount = read.palette_count;
 }
 
-// Headers that are too short to hold masks have them behind: three at 16 bits, four at 32.
+// Headers that are too short to hold masks have them behind: three at 16 bits, four at 32 and
+// where the compression says that alpha has one.
 TBmpStatus ReadMasks(TBmpRead& read) {
     TBmpHeader& header = read.header;
     if (header.bit_count != 16 && header.bit_count != 32) {
         return TBmpStatus::kOk;
     }
-    if (header.compression != kBmpBitFields) {
+    if (!HasBitFields(header.compression)) {
         header.masks = header.bit_count == 16 ? kMasks555 : kMasks8888;
         return TBmpStatus::kOk;
     }
@@ -303,7 +310,8 @@ TBmpStatus ReadMasks(TBmpRead& read) {
     if (in_header) {
         return TBmpStatus::kOk;
     }
-    std::size_t mask_bytes = header.bit_count == 16 ? 12 : 16;
+    const bool has_three = header.bit_count == 16 && header.compression == kBmpBitFields;
+    std::size_t mask_bytes = has_three ? 12 : 16;
     // Many files with a 40-byte header keep no room for an alpha mask: where the pixels begin
     // behind the third mask, a fourth one would be the first pixel.
     const std::int64_t position = read.stream.GetPosition();
@@ -379,7 +387,8 @@ TBmpStatus AllocateImage(TBmpRead& read) {
     const TZmPixelFormat format = TargetFormat(read);
     // The alpha mask counts too: 32 bits stand for three bytes of colour and one of alpha.
     const std::int32_t bits = std::max(header.bit_count, PixelFormatInfo(format).bit_count);
-    if (!ImageSizeIsAcceptable(header.width, header.height, bits, read.stream_bytes - read.start)) {
+    if (!ImageSizeIsAcceptable(header.width, header.height, bits, read.stream_bytes - read.start) ||
+        !FitsAddressSpace(BmpRowBytes(header.width, bits))) {
         return TBmpStatus::kTooLarge;
     }
     if (!read.bitmap.Allocate(header.width, header.height, format)) {
@@ -417,6 +426,13 @@ void InvertRow1(TBmpRead& read, const std::uint8_t* source, std::uint8_t* dest, 
     const std::size_t count = (static_cast<std::size_t>(read.header.width) + 7) / 8;
     std::transform(source, source + count, dest,
                    [](std::uint8_t bits) { return static_cast<std::uint8_t>(~bits); });
+}
+
+void ColorRow2(TBmpRead& read, const std::uint8_t* source, std::uint8_t* dest, std::int32_t) {
+    auto* pixels = reinterpret_cast<TRGB*>(dest);
+    for (std::int32_t x = 0; x < read.header.width; ++x) {
+        pixels[x] = read.palette[source[x / 4] >> (6 - x % 4 * 2) & 3];
+    }
 }
 
 void UnpackRow4(TBmpRead& read, const std::uint8_t* source, std::uint8_t* dest, std::int32_t) {
@@ -526,6 +542,7 @@ TDecodeRow ChooseRowDecoder(const TBmpRead& read, bool with_alpha) {
     const bool native = read.params.fNativePixelFormat;
     switch (read.header.bit_count) {
         case 1: return IsWhiteBlackPalette(read) ? InvertRow1 : CopyRow1;
+        case 2: return ColorRow2;
         case 4: return native ? UnpackRow4 : ColorRow4;
         case 8: return native ? CopyRow8 : ColorRow8;
         case 16:
@@ -546,6 +563,7 @@ struct TRowPlan {
     TStream& source;
     TDecodeRow decode;
     std::size_t row_bytes;
+    std::size_t pixel_bytes;  // of row_bytes, without the padding
     bool in_place;
     std::vector<std::uint8_t> buffer;  // empty with in_place
 };
@@ -560,7 +578,10 @@ TBmpStatus DecodePlainRow(TBmpRead& read, TRowPlan& plan, std::int32_t file_row)
         return TBmpStatus::kNoMemory;
     }
     std::uint8_t* target = plan.in_place ? dest : plan.buffer.data();
-    if (ReadFully(plan.source, target, plan.row_bytes) != plan.row_bytes) {
+    // Some writers leave out what pads the last row.
+    const bool is_last = file_row == read.header.height - 1;
+    if (ReadFully(plan.source, target, plan.row_bytes) <
+        (is_last ? plan.pixel_bytes : plan.row_bytes)) {
         return TBmpStatus::kTruncated;
     }
     plan.decode(read, target, dest, y);
@@ -574,9 +595,11 @@ TBmpStatus DecodePlainRows(TBmpRead& read, TDecodeRow decode) {
     if (row_bytes < kDirectRowBytes) {
         buffered.emplace(&read.stream, kRowBufferBytes, /*use_relative_position=*/false);
     }
+    const std::int64_t pixel_bits = std::int64_t{read.header.width} * read.header.bit_count;
     TRowPlan plan{buffered ? *buffered : read.stream,
                   decode,
                   static_cast<std::size_t>(row_bytes),
+                  static_cast<std::size_t>((pixel_bits + 7) / 8),
                   in_place,
                   {}};
     plan.buffer.resize(in_place ? 0 : plan.row_bytes);
@@ -701,7 +724,8 @@ void ReadBMPStream(TStream& stream, TZmBitmap& bitmap, std::int64_t byte_limit, 
     TBmpStatus status = TBmpStatus::kNoMemory;
     try {
         status = ReadImage(read, no_file_header, params_only);
-    } catch (const std::bad_alloc&) {
+    } catch (...) {
+        // The memory or the stream gave up; readers report by the flag alone.
         status = TBmpStatus::kNoMemory;
         ClearRows(read, read.has_rows ? 0 : read.header.height);
     }

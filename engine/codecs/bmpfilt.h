@@ -21,8 +21,8 @@ void ReadBMPStream(TStream& stream, TZmBitmap& bitmap, std::int64_t byte_limit, 
                    TIOParams& params);
 
 /// Writes `bitmap` as `params` tells (depth, version, compression). Alpha goes to the file only
-/// with `handle_transparency`. The bitmap is left as it was. A short write sets
-/// `*progress.Aborting`.
+/// with `handle_transparency`. The bitmap is left as it was. A failed write sets
+/// `*progress.Aborting`; nothing is raised.
 void WriteBMPStream(TStream& stream, TZmBitmap& bitmap, TIOParams& params, bool handle_transparency,
                     TProgressRec& progress);
 

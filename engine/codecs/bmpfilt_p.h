@@ -39,6 +39,7 @@ inline constexpr std::uint32_t kBmpNone = 0;
 inline constexpr std::uint32_t kBmpRle8 = 1;
 inline constexpr std::uint32_t kBmpRle4 = 2;
 inline constexpr std::uint32_t kBmpBitFields = 3;
+inline constexpr std::uint32_t kBmpAlphaBitFields = 6;  // with a mask for alpha at every depth
 
 /// Bytes of an uncompressed row: whole 32-bit words.
 constexpr std::int64_t BmpRowBytes(std::int32_t width, std::int32_t bit_count) {

@@ -4,7 +4,6 @@
 
 #include <algorithm>
 #include <cstring>
-#include <new>
 #include <optional>
 
 #include "engine/bitmap/zmquantizer.h"
@@ -12,6 +11,7 @@
 #include "engine/bitmap/zmxBitmaps.h"
 #include "engine/codecs/bmpfilt.h"
 #include "engine/codecs/bmpfilt_p.h"
+#include "engine/codecs/colorcopy_p.h"
 #include "engine/foundation/zmbytereader.h"
 #include "engine/foundation/zmnumbers.h"
 #include "engine/foundation/zmstreams.h"
@@ -177,24 +177,6 @@ TBmpStatus WritePalette(TStream& output, const TBmpPlan& plan) {
 }
 
 // ---- 1 bit ----
-
-// Fills `copy`, of the same size, with the colours of a bitmap of any format.
-bool CopyColors(TZmBitmap& source, TZmBitmap& copy) {
-    if (!copy.Allocate(source.GetWidth(), source.GetHeight(), zm24RGB)) {
-        return false;
-    }
-    TZmRgbRows rows(source);
-    const std::size_t row_bytes = static_cast<std::size_t>(source.GetWidth()) * sizeof(TRGB);
-    for (std::int32_t y = 0; y < source.GetHeight(); ++y) {
-        const TRGB* from = rows.GetRow(y);
-        std::uint8_t* to = copy.GetScanLine(y);
-        if (from == nullptr || to == nullptr) {
-            return false;
-        }
-        std::memcpy(to, from, row_bytes);
-    }
-    return true;
-}
 
 // Black and white by threshold, for images of more than two colours. The conversion may change
 // the format of its source, so it gets a copy.
@@ -502,7 +484,8 @@ void WriteBMPStream(TStream& stream, TZmBitmap& bitmap, TIOParams& params, bool 
     TBmpStatus status = TBmpStatus::kNoMemory;
     try {
         status = WriteImage(stream, bitmap, params, with_alpha, progress);
-    } catch (const std::bad_alloc&) {
+    } catch (...) {
+        // The memory or the stream gave up: told by the flag, like any failed write.
         status = TBmpStatus::kNoMemory;
     }
     if (status != TBmpStatus::kOk) {

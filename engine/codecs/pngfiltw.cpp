@@ -1,21 +1,24 @@
 // PNG writer: an adapter around libpng. It decides colour type and depth from the file parameters
 // and hands over row after row; the image is never held a second time, except as the 1-bit copy
-// of a file of two colours.
+// of a file of two colours and while a palette is sought for colours of four bytes.
 
 #include <png.h>
 
 #include <algorithm>
+#include <array>
 #include <cstdlib>
 #include <cstring>
 #include <exception>
 #include <memory>
 #include <optional>
+#include <utility>
 #include <vector>
 
 #include "engine/bitmap/zmmask.h"
 #include "engine/bitmap/zmquantizer.h"
 #include "engine/bitmap/zmrgbrows.h"
 #include "engine/bitmap/zmxBitmaps.h"
+#include "engine/codecs/colorcopy_p.h"
 #include "engine/codecs/pngfilt.h"
 #include "engine/codecs/pngfilt_p.h"
 #include "engine/foundation/zmassert.h"
@@ -180,13 +183,15 @@ public:
 
 private:
     bool PrepareBits();
-    void PreparePalette();
+    bool PreparePalette();
+    void MapIndices();
+    std::int32_t NearestEntry(TRGB color) const;
     std::int32_t QuantizedIndex(TRGB color);
     std::uint8_t PaletteIndex(TRGB color);
     void SetHeaderChunks();
     void SetPalette();
     void SetBackground();
-    void SetTexts();
+    void CollectTexts();
     void LoopOverRows();
     const std::uint8_t* MakeRow(std::int32_t row);
     const std::uint8_t* MakeGrayRow(std::int32_t row);
@@ -209,6 +214,7 @@ private:
     std::unique_ptr<TZmQuantizer> quantizer_;
     std::vector<TRGB> color_map_;
     std::int32_t colors_used_ = 0;
+    std::array<std::uint8_t, 256> moved_index_{};  // of the indices of a zm8p image with alpha
     TRGB last_color_;
     std::int32_t last_index_ = -1;
     std::optional<TZmRgbRows> rgb_rows_;
@@ -257,8 +263,8 @@ bool TPngWriter::PrepareRows() {
     if (kind_ == PngRowKind::kBits) {
         return bitmap_.GetPixelFormat() == zm1g || PrepareBits();
     }
-    if (kind_ == PngRowKind::kIndices) {
-        PreparePalette();
+    if (kind_ == PngRowKind::kIndices && !PreparePalette()) {
+        return false;
     }
     rgb_rows_.emplace(bitmap_);
     const bool has_four = kind_ == PngRowKind::kColorsAndAlpha;
@@ -282,28 +288,46 @@ bool TPngWriter::PrepareBits() {
     return two_colors_->SetPixelFormat(zm1g);
 }
 
-/// With alpha entry 0 stands for what is transparent, and the others move up by one.
-void TPngWriter::PreparePalette() {
+/// With alpha entry 0 stands for what is transparent, and the others move up by one. Colours of
+/// four bytes count as those of three, of which the quantizer keeps each when they are few.
+bool TPngWriter::PreparePalette() {
+    const TZmPixelFormat format = bitmap_.GetPixelFormat();
+    TZmBitmap colors;
+    if (format == zm32RGB && !CopyColors(bitmap_, colors)) {
+        return false;
+    }
     const std::int32_t wanted = alpha_.IsThere() ? 255 : 256;
-    quantizer_ = std::make_unique<TZmQuantizer>(bitmap_, color_map_, wanted);
+    quantizer_ =
+        std::make_unique<TZmQuantizer>(format == zm32RGB ? colors : bitmap_, color_map_, wanted);
     const auto present = static_cast<std::int32_t>(color_map_.size());
-    const bool takes_all = bitmap_.GetPixelFormat() == zm8p;
-    const std::int32_t found = takes_all ? wanted : quantizer_->GetFoundColors();
+    const std::int32_t found = format == zm8p ? wanted : quantizer_->GetFoundColors();
     colors_used_ = std::max(1, std::min({found, wanted, present}));
     color_map_.resize(static_cast<std::size_t>(colors_used_));
+    if (format == zm8p && alpha_.IsThere()) {
+        MapIndices();
+    }
+    return true;
 }
 
-/// A colour that the quantizer does not know (a palette of more entries than were asked for)
-/// goes to the nearest one.
-std::int32_t TPngWriter::QuantizedIndex(TRGB color) {
-    const std::int32_t index = quantizer_->GetRGBIndex(color);
-    if (index >= 0 && index < colors_used_) {
-        return index;
+/// The last entry of a full palette has no place beside the transparent one.
+void TPngWriter::MapIndices() {
+    for (std::int32_t i = 0; i < 256; ++i) {
+        const std::int32_t entry = i < colors_used_ ? i : NearestEntry(bitmap_.GetPalette(i));
+        moved_index_[static_cast<std::size_t>(i)] = static_cast<std::uint8_t>(entry + 1);
     }
+}
+
+std::int32_t TPngWriter::NearestEntry(TRGB color) const {
     const auto nearest = std::min_element(
         color_map_.begin(), color_map_.end(),
         [color](TRGB a, TRGB b) { return ColorDistance(a, color) < ColorDistance(b, color); });
     return static_cast<std::int32_t>(nearest - color_map_.begin());
+}
+
+/// A colour that the quantizer does not know goes to the nearest one.
+std::int32_t TPngWriter::QuantizedIndex(TRGB color) {
+    const std::int32_t index = quantizer_->GetRGBIndex(color);
+    return index >= 0 && index < colors_used_ ? index : NearestEntry(color);
 }
 
 std::uint8_t TPngWriter::PaletteIndex(TRGB color) {
@@ -348,12 +372,6 @@ void TPngWriter::SetBackground() {
     png_set_bKGD(png_, info_, &background);
 }
 
-void TPngWriter::SetTexts() {
-    if (!texts_.empty()) {
-        png_set_text(png_, info_, texts_.data(), static_cast<int>(texts_.size()));
-    }
-}
-
 /// Runs inside the guard.
 void TPngWriter::SetHeaderChunks() {
     png_set_IHDR(png_, info_, static_cast<png_uint_32>(bitmap_.GetWidth()),
@@ -368,7 +386,9 @@ void TPngWriter::SetHeaderChunks() {
     png_set_filter(png_, PNG_FILTER_TYPE_BASE, FilterFlags(params_.fPNG_Filter));
     SetBackground();
     png_set_compression_level(png_, std::clamp(params_.fPNG_Compression, -1, 9));
-    SetTexts();
+    if (!texts_.empty()) {
+        png_set_text(png_, info_, texts_.data(), static_cast<int>(texts_.size()));
+    }
     png_write_info(png_, info_);
     if (kind_ == PngRowKind::kColors || kind_ == PngRowKind::kColorsAndAlpha) {
         png_set_bgr(png_);
@@ -378,19 +398,33 @@ void TPngWriter::SetHeaderChunks() {
     }
 }
 
-bool TPngWriter::WriteHeader() {
+/// Plain texts, in Latin-1; those that came from a file as international ones stay that.
+void TPngWriter::CollectTexts() {
     const std::size_t count =
         std::min(params_.fPNG_TextKeys.size(), params_.fPNG_TextValues.size());
     for (std::size_t i = 0; i < count; ++i) {
-        if (IsWritableKey(params_.fPNG_TextKeys[i])) {
-            png_text text = {};
-            text.compression = PNG_TEXT_COMPRESSION_NONE;
-            text.key = params_.fPNG_TextKeys[i].data();
-            text.text = params_.fPNG_TextValues[i].data();
-            text.text_length = params_.fPNG_TextValues[i].size();
-            texts_.push_back(text);
+        std::string& key = params_.fPNG_TextKeys[i];
+        std::string& value = params_.fPNG_TextValues[i];
+        if (!IsWritableKey(key)) {
+            continue;
         }
+        png_text text = {};
+        text.compression = PNG_TEXT_COMPRESSION_NONE;
+        text.key = key.data();
+        text.text = value.data();
+        text.text_length = value.size();
+        if (const TZmPngChunk* kept = params_.fPNG_Chunks.FindText(key, value); kept != nullptr) {
+            text.compression = PNG_ITXT_COMPRESSION_NONE;
+            text.itxt_length = std::exchange(text.text_length, 0);
+            text.lang = const_cast<png_charp>(kept->language.c_str());  // only read
+            text.lang_key = const_cast<png_charp>(kept->translated_key.c_str());
+        }
+        texts_.push_back(text);
     }
+}
+
+bool TPngWriter::WriteHeader() {
+    CollectTexts();
     return RunPngGuarded(png_, [this] { SetHeaderChunks(); });
 }
 
@@ -423,17 +457,21 @@ const std::uint8_t* TPngWriter::MakeGray16Row(std::int32_t row) {
 }
 
 const std::uint8_t* TPngWriter::MakeIndexRow(std::int32_t row) {
-    if (bitmap_.GetPixelFormat() == zm8p && !alpha_.IsThere()) {
-        return bitmap_.GetScanLine(row);
+    const bool has_indices = bitmap_.GetPixelFormat() == zm8p;
+    const std::uint8_t* indices = has_indices ? bitmap_.GetScanLine(row) : nullptr;
+    if (has_indices && !alpha_.IsThere()) {
+        return indices;
     }
-    const TRGB* colors = rgb_rows_->GetRow(row);
+    const TRGB* colors = has_indices ? nullptr : rgb_rows_->GetRow(row);
     const std::uint8_t* alpha_row = alpha_.IsThere() ? alpha_.GetRow(row) : nullptr;
-    if (colors == nullptr || (alpha_.IsThere() && alpha_row == nullptr)) {
+    if ((indices == nullptr && colors == nullptr) || (alpha_.IsThere() && alpha_row == nullptr)) {
         return nullptr;
     }
     for (std::size_t x = 0; x < row_.size(); ++x) {
         const bool is_opaque = alpha_row == nullptr || alpha_row[x] == 255;
-        row_[x] = is_opaque ? PaletteIndex(colors[x]) : 0;
+        row_[x] = !is_opaque    ? std::uint8_t{0}
+                  : has_indices ? moved_index_[indices[x]]
+                                : PaletteIndex(colors[x]);
     }
     return row_.data();
 }

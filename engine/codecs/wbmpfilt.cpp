@@ -9,7 +9,6 @@
 #include <array>
 #include <cstring>
 #include <memory>
-#include <new>
 #include <optional>
 
 #include "engine/bitmap/zmxBitmaps.h"
@@ -199,7 +198,8 @@ void ReadWBMPStream(TStream& stream, TZmBitmap& bitmap, TIOParams& params, bool 
     TWbmpStatus status = TWbmpStatus::kNoMemory;
     try {
         status = ReadImage(stream, bitmap, params, params_only, progress);
-    } catch (const std::bad_alloc&) {
+    } catch (...) {
+        // The memory or the stream gave up; readers report by the flag alone.
         status = TWbmpStatus::kNoMemory;
     }
     if (status != TWbmpStatus::kOk) {
@@ -212,7 +212,7 @@ void WriteWBMPStream(TStream& stream, TZmBitmap& bitmap, TProgressRec& progress)
     if (!bitmap.IsEmpty()) {
         try {
             status = WriteImage(stream, bitmap, progress);
-        } catch (const std::bad_alloc&) {
+        } catch (...) {
             status = TWbmpStatus::kNoMemory;
         }
     }

@@ -165,8 +165,12 @@ void TZmZalmoGlobalSettings::RemoveToolbar(TZmToolbar* toolbar) {
 }
 
 void TZmZalmoGlobalSettings::UpdateToolbars(bool full_update) {
-    for (TZmToolbar* const toolbar : toolbars_) {
-        toolbar->Update(full_update);
+    // A toolbar may add or remove toolbars while it updates.
+    const std::vector<TZmToolbar*> known = toolbars_;
+    for (TZmToolbar* const toolbar : known) {
+        if (std::count(toolbars_.begin(), toolbars_.end(), toolbar) != 0) {
+            toolbar->Update(full_update);
+        }
     }
 }
 

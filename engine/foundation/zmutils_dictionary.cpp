@@ -298,8 +298,8 @@ void TZmDictionary::InsertOrGather(std::u16string_view key, std::unique_ptr<TObj
     if (list == nullptr) {
         auto gathered = std::make_unique<TObjectList>();
         list = gathered.get();
-        list->Add(std::move(bucket->value));
-        bucket->value = std::move(gathered);
+        // The entry always holds a value, also when memory runs out in Add.
+        list->Add(std::exchange(bucket->value, std::move(gathered)));
     }
     list->Add(std::move(value));
 }

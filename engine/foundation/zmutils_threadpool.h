@@ -42,7 +42,10 @@ public:
     void WaitFor();
     /// Waits for the members in order, frees each, and empties the list.
     void Join();
-    TZmExecutor* GetThreads(std::size_t index) const { return fThreads[index].get(); }
+    /// The member, or nil for an index outside.
+    TZmExecutor* GetThreads(std::size_t index) const {
+        return index < fThreads.size() ? fThreads[index].get() : nullptr;
+    }
     std::size_t GetCount() const { return fThreads.size(); }
 
 private:

@@ -199,7 +199,7 @@ bool TZalmoIO::RunOrStart(std::function<bool()> work) {
 
 void TZalmoIO::WaitThreads(bool abort_all) {
     abort_all_ = abort_all;
-    if (abort_all && threads_.Count() > 0) {
+    if (abort_all) {
         fAborting = true;
     }
     threads_.Wait();

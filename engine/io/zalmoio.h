@@ -179,7 +179,7 @@ public:
     void SetAsyncMode(bool enabled) { fAsyncMode = enabled; }
     std::int32_t GetThreadsCount() const { return threads_.Count(); }
     /// Returns when no thread of the driver is at work; with `abort_all` the works end at their
-    /// next progress step. Suspended threads are resumed.
+    /// next progress step, and the flag is set even where none is. Suspended threads are resumed.
     void WaitThreads(bool abort_all);
     /// A pause: returns when each thread stands at a progress step of its work or has ended.
     void SuspendThreads() { threads_.Suspend(); }

@@ -16,7 +16,8 @@ bool Stretch(TZmBitmap& source, TZmBitmap& target, TResampleFilter filter) {
 
 }  // namespace
 
-/// The sizes are the file's own words: a file cannot ask for more pixels here than by its header.
+/// After a load to a wanted size the parameters hold that size: the bitmap's own counts. What the
+/// resolutions ask for is limited as what a file's header asks for.
 void TZalmoIO::AdjustDPI(std::int64_t file_bytes) {
     TIOParams& params = *GetParams();
     const std::int32_t dpi_x = params.GetDpiX();
@@ -25,22 +26,24 @@ void TZalmoIO::AdjustDPI(std::int64_t file_bytes) {
     if (!fAutoAdjustDPI || dpi_x == dpi_y || dpi_x <= 0 || dpi_y <= 0 || !has_sizes) {
         return;
     }
-    const bool is_wide = params.fWidth > params.fHeight;
-    const double exact = is_wide ? static_cast<double>(params.fHeight) / dpi_y * dpi_x
-                                 : static_cast<double>(params.fWidth) / dpi_x * dpi_y;
-    const std::int32_t side = TruncToInt(exact);
-    const std::int32_t width = is_wide ? fZmBitmap->GetWidth() : side;
-    const std::int32_t height = is_wide ? side : fZmBitmap->GetHeight();
+    std::int32_t width = fZmBitmap->GetWidth();
+    std::int32_t height = fZmBitmap->GetHeight();
+    const bool is_wide = width > height;
+    if (is_wide) {
+        height = TruncToInt(static_cast<double>(height) / dpi_y * dpi_x);
+    } else {
+        width = TruncToInt(static_cast<double>(width) / dpi_x * dpi_y);
+    }
     if (!ImageSizeIsAcceptable(width, height, fZmBitmap->GetBitCount(), file_bytes) ||
         !StretchBitmap(width, height)) {
         return;
     }
+    params.fWidth = width;
+    params.fHeight = height;
     if (is_wide) {
         params.SetDpiY(dpi_x);
-        params.fHeight = side;
     } else {
         params.SetDpiX(dpi_y);
-        params.fWidth = side;
     }
 }
 

@@ -47,30 +47,38 @@ bool ExchangeInFile(const std::u16string& file_name, const TExchange& exchange) 
 
 bool TZalmoIO::InjectJpegIPTC(const std::u16string& file_name) {
     fAborting = true;  // stands when the file cannot be opened
-    fAborting = !ExchangeInFile(file_name, [this](TStream& input, TStream& output) {
-        return InjectJpegIPTCStream(input, output);
+    return RunOrFail([&] {
+        fAborting = !ExchangeInFile(file_name, [this](TStream& input, TStream& output) {
+            return InjectJpegIPTCStream(input, output);
+        });
+        return !fAborting;
     });
-    return !fAborting;
 }
 
 bool TZalmoIO::InjectJpegIPTCStream(TStream& input, TStream& output) {
     fAborting = true;
-    fAborting = !ExchangeJpegBlock(input, output, kJpegBlockIptc, IptcBlock(*GetParams()));
-    return !fAborting;
+    return RunOrFail([&] {
+        fAborting = !ExchangeJpegBlock(input, output, kJpegBlockIptc, IptcBlock(*GetParams()));
+        return !fAborting;
+    });
 }
 
 bool TZalmoIO::InjectJpegEXIF(const std::u16string& file_name) {
     fAborting = true;
-    fAborting = !ExchangeInFile(file_name, [this](TStream& input, TStream& output) {
-        return InjectJpegEXIFStream(input, output);
+    return RunOrFail([&] {
+        fAborting = !ExchangeInFile(file_name, [this](TStream& input, TStream& output) {
+            return InjectJpegEXIFStream(input, output);
+        });
+        return !fAborting;
     });
-    return !fAborting;
 }
 
 bool TZalmoIO::InjectJpegEXIFStream(TStream& input, TStream& output) {
     fAborting = true;
-    fAborting = !ExchangeJpegBlock(input, output, kJpegBlockExif, ExifBlock(*GetParams()));
-    return !fAborting;
+    return RunOrFail([&] {
+        fAborting = !ExchangeJpegBlock(input, output, kJpegBlockExif, ExifBlock(*GetParams()));
+        return !fAborting;
+    });
 }
 
 bool TIOParams::UpdateEXIFThumbnail(std::int32_t Width, std::int32_t Height,

@@ -63,6 +63,16 @@ std::int32_t FindResourceName(const TZmResourceExtractor& module, std::int32_t t
     return -1;
 }
 
+/// None when there is no such resource.
+std::vector<std::uint8_t> ResourceBytes(const std::u16string& module_path,
+                                        const std::u16string& type_name,
+                                        const std::u16string& name) {
+    const TZmResourceExtractor module(module_path);
+    const std::int32_t type = module.IndexOfType(type_name);
+    const std::int32_t index = type < 0 ? -1 : FindResourceName(module, type, name);
+    return index < 0 ? std::vector<std::uint8_t>() : module.GetBuffer(type, index);
+}
+
 }  // namespace
 
 bool TZalmoIO::LoadFileAs(std::int32_t type, const std::u16string& name) {
@@ -186,7 +196,10 @@ bool TZalmoIO::RunRowLoad(const TZmFileFormatInfo& row, TStream& stream,
                           const std::u16string& name) {
     return RunToNotice(kAfterLoad, [&](bool& aborting) {
         TProgressRec progress = MakeProgress(aborting);
-        PrepareBitmap();
+        if (!PrepareBitmap()) {
+            aborting = true;
+            return;
+        }
         TIOParams& params = *GetParams();
         params.fFileName = name;
         params.fFileType = row.FileType;
@@ -210,6 +223,7 @@ bool TZalmoIO::LoadFromFile(const std::u16string& file_name, std::int32_t file_t
     if (IsUrl(file_name)) {
         return LoadFromURL(file_name);
     }
+    fAborting = true;  // stands when the file cannot be opened
     if (file_type == ioUnknown) {
         file_type = FindFileFormat(file_name, zmfmContentOnly);
     }
@@ -246,6 +260,7 @@ bool TZalmoIO::LoadFromFile(const std::u16string& file_name, bool check_unknown)
 }
 
 bool TZalmoIO::LoadFromFileAuto(const std::u16string& file_name) {
+    fAborting = true;  // stands when the file cannot be opened
     return LoadFromFile(file_name, FindFileFormat(file_name, zmfmContentElseExtension));
 }
 
@@ -282,11 +297,14 @@ bool TZalmoIO::LoadFromBuffer(const void* buffer, std::int64_t size_bytes, std::
 bool TZalmoIO::LoadFromResource(const std::u16string& module_path,
                                 const std::u16string& resource_type,
                                 const std::u16string& resource_name, std::int32_t file_type) {
-    const TZmResourceExtractor module(module_path);
-    const std::int32_t type = module.IndexOfType(resource_type);
-    const std::int32_t name = type < 0 ? -1 : FindResourceName(module, type, resource_name);
-    const std::vector<std::uint8_t> bytes =
-        name < 0 ? std::vector<std::uint8_t>() : module.GetBuffer(type, name);
+    std::vector<std::uint8_t> bytes;
+    const bool has_room = RunOrFail([&] {
+        bytes = ResourceBytes(module_path, resource_type, resource_name);
+        return true;
+    });
+    if (!has_room) {
+        return false;
+    }
     // The flag goes back also when the load raises.
     struct TFlag {
         TIOParams& params;
@@ -298,6 +316,9 @@ bool TZalmoIO::LoadFromResource(const std::u16string& module_path,
 
 bool TZalmoIO::LoadFromURL(const std::u16string& url) {
     CheckAttachedBitmap(ioUnknown);
+    if (!IsUrl(url)) {
+        return FailWithNotice();
+    }
     return RunOrFail([&] { return RunOrStart([this, url] { return LoadURLNow(url); }); });
 }
 

@@ -40,6 +40,7 @@ bool TZalmoIO::RunParams(std::int32_t type, TStream& stream, const std::u16strin
             TZmLoadCall call{
                 buffered, untouched, params, progress, fBackground, /*params_only=*/true, alpha};
             codec->read(call);
+            ApplyResolutionDefaults();
         } else {
             aborting = true;
         }
@@ -56,6 +57,7 @@ bool TZalmoIO::RunParams(std::int32_t type, TStream& stream, const std::u16strin
 }
 
 bool TZalmoIO::ParamsFromFile(const std::u16string& file_name, std::int32_t file_type) {
+    fAborting = true;  // stands when the file cannot be opened
     if (file_type == ioUnknown) {
         file_type = FindFileFormat(file_name, zmfmContentOnly);
     }
@@ -63,7 +65,6 @@ bool TZalmoIO::ParamsFromFile(const std::u16string& file_name, std::int32_t file
         GetParams()->fFileType = ioUnknown;
         return FailWithNotice();
     }
-    fAborting = true;  // stands when the file cannot be opened
     TFileStream stream(file_name, fmOpenRead);
     return RunParams(file_type, stream, file_name);
 }

@@ -127,8 +127,7 @@ bool TZalmoIO::SaveStreamNow(const TWriter& writer, TStream& stream) {
 void TZalmoIO::SaveSteps(const TWriter& writer, TStream& stream, bool& aborting) {
     TProgressRec progress = MakeProgress(aborting);
     std::unique_ptr<TZmBitmap> converted;
-    PrepareBitmap();
-    TZmBitmap* bitmap = BitmapToWrite(writer.accepted, converted);
+    TZmBitmap* bitmap = PrepareBitmap() ? BitmapToWrite(writer.accepted, converted) : nullptr;
     if (bitmap == nullptr) {
         aborting = true;
         return;
@@ -173,7 +172,15 @@ bool TZalmoIO::SaveToFile(const std::u16string& file_name, std::int32_t file_typ
             file_type = ioJPEG;
         }
     }
-    CheckAttachedBitmap(file_type);
+    if (file_type == ioLYR) {
+        return SaveToFileZMN(file_name);
+    }
+    if (file_type != ioPDF && file_type != ioSVG) {
+        CheckAttachedBitmap(file_type);
+    }
+    if (file_type == ioOtherWIC) {
+        return SaveToFileWIC(file_name, BuiltInSaveType(file_name));
+    }
     const TWriter writer = CodecWriter(file_type);
     if (writer || !is_by_name) {
         return SaveFileBy(writer ? writer : RowWriter(FindFormatInfo(file_type)), file_name);
@@ -194,17 +201,17 @@ bool TZalmoIO::SaveToText(TStream& stream, std::int32_t file_type, TZmTextFormat
     }
     TMemoryStream file;
     const TInPlace in_place(*this);
-    if (!SaveToStream(file, file_type)) {
-        return false;
-    }
-    const std::string text =
-        format == zmtfBase64 ? Base64Text(file.Bytes()) : HexText(file.Bytes());
-    stream.WriteBuffer(text.data(), text.size());
-    return true;
+    return SaveToStream(file, file_type) && RunOrFail([&] {
+               const std::string text =
+                   format == zmtfBase64 ? Base64Text(file.Bytes()) : HexText(file.Bytes());
+               stream.WriteBuffer(text.data(), text.size());
+               return true;
+           });
 }
 
 bool TZalmoIO::SaveToText(const std::u16string& file_name, std::int32_t file_type,
                           TZmTextFormat format) {
+    fAborting = true;  // stands when the file cannot be created
     TZmSaveFileStream stream(file_name);
     return SaveToText(stream, file_type, format) && (stream.Commit() || Fail());
 }

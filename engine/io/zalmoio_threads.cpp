@@ -1,7 +1,7 @@
 #include "engine/io/zalmoio_threads.h"
 
 #include <algorithm>
-#include <system_error>
+#include <exception>
 #include <utility>
 
 namespace zm {
@@ -31,7 +31,7 @@ bool TZmIOThreads::Start(std::function<void()> work) {
     TZmIOThread& self = fAsyncThreads.emplace_back();
     try {
         self.thread = std::thread([this, &self, task = std::move(work)] { Run(self, task); });
-    } catch (const std::system_error&) {
+    } catch (const std::exception&) {  // no thread, or no memory for one
         fAsyncThreads.pop_back();
         return false;
     }

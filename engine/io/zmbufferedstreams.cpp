@@ -137,6 +137,11 @@ std::int64_t TZmBufferedReadStream::Seek(std::int64_t offset, TSeekOrigin origin
     return fPosition - fRelativePosition;
 }
 
+std::int64_t TZmBufferedReadStream::GetSize() {
+    const std::int64_t end = fBufferSize == 0 ? fStream->GetSize() : fSize - fRelativePosition;
+    return std::max<std::int64_t>(end, 0);
+}
+
 TZmBufferedWriteStream::TZmBufferedWriteStream(TStream* output, std::int32_t buffer_size)
     : fStream(output), fMemory(BufferBytes(buffer_size)), fBufferSize(std::max(buffer_size, 0)) {}
 

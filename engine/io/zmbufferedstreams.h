@@ -23,7 +23,8 @@ public:
     /// A seek from the end counts backwards whatever the sign of `offset`. Targets are limited
     /// to the stream; one at or past the end sets OverPosition.
     std::int64_t Seek(std::int64_t offset, TSeekOrigin origin) override;
-    std::int64_t GetSize() override { return fSize; }
+    /// Counted from position 0.
+    std::int64_t GetSize() override;
     bool GetOverPosition() const { return fOverPosition; }
 
 private:

@@ -121,12 +121,17 @@ std::string BareExtension(std::u16string_view extension) {
     return text;
 }
 
+/// Extensions that the settings give to the platform's imaging component.
+std::string OtherWICExtensions() {
+    std::string text = ZmGlobalSettings().fWICFileTypes;
+    std::erase_if(text, [](char c) { return c == '*' || c == '.'; });
+    return AsciiUpper(text);
+}
+
 /// The row's extensions follow a setting that may change; the text is only touched when it did,
 /// so that concurrent look-ups merely read.
 void RebuildOtherWICExtensions(TZmFileFormatInfo& row) {
-    std::string text = ZmGlobalSettings().fWICFileTypes;
-    std::erase_if(text, [](char c) { return c == '*' || c == '.'; });
-    text = AsciiUpper(text);
+    const std::string text = OtherWICExtensions();
     if (row.Extensions != text) {
         row.Extensions = text;
     }
@@ -291,10 +296,13 @@ std::int32_t FileNameToFileType(std::u16string_view file_name) {
 }
 
 std::int32_t SaveExtensionToFileType(std::u16string_view file_name, bool allow_video) {
+    return MatchesExtensionList(file_name, ZmGlobalSettings().fWICFileTypes)
+               ? ioOtherWIC
+               : BuiltInSaveType(file_name, allow_video);
+}
+
+std::int32_t BuiltInSaveType(std::u16string_view file_name, bool allow_video) {
     const std::string bare = BareExtension(FileExtension(file_name));
-    if (BareExtensionIsIn(bare, ZmGlobalSettings().fWICFileTypes)) {
-        return ioOtherWIC;
-    }
     if (const std::int32_t type = TypeInTable(kSaveExtensionsBeforePdf, bare); type != ioUnknown) {
         return type;
     }
@@ -320,7 +328,8 @@ std::string FileFormatExtension(std::int32_t file_type, std::int32_t index) {
 }
 
 std::string FileFormatDefaultExtension(const TZmFileFormatInfo& row) {
-    const std::string lower = AsciiLower(row.Extensions);
+    const std::string lower =
+        AsciiLower(row.FileType == ioOtherWIC ? OtherWICExtensions() : row.Extensions);
     return lower.substr(0, lower.find(';'));
 }
 

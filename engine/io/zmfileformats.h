@@ -94,6 +94,8 @@ std::int32_t FileNameToFileType(std::u16string_view file_name);
 /// Type that a save under this name takes: a chain of its own, which differs from the registry.
 /// ioAVI only with `allow_video`. 0 when unknown.
 std::int32_t SaveExtensionToFileType(std::u16string_view file_name, bool allow_video = false);
+/// The same without the types that the settings give to the platform's imaging component.
+std::int32_t BuiltInSaveType(std::u16string_view file_name, bool allow_video = false);
 
 std::int32_t FileFormatExtensionCount(std::int32_t file_type);
 /// Extension by index, upper case; empty outside.

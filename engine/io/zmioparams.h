@@ -66,8 +66,8 @@ public:
     bool UpdateEXIFThumbnail(std::int32_t Width, std::int32_t Height,
                              TResampleFilter ResampleFilter);
 
-    /// Writes all persistent fields as a stream of their own format (magic, version, fields);
-    /// raises EFCreateError, EWriteError.
+    /// Writes all persistent fields as a stream of their own format (magic, version, fields); an
+    /// old file is replaced only by a complete one. Raises EFCreateError, EWriteError.
     void SaveToFile(const std::u16string& file_name);
     void SaveToStream(TStream& stream);
     /// Reads such a stream, of any version. Fields that its version does not have, and all that a

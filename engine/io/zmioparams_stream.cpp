@@ -34,8 +34,11 @@ void CheckMagic(TZmFieldReader& reader) {
 }  // namespace
 
 void TIOParams::SaveToFile(const std::u16string& file_name) {
-    TFileStream file(file_name, fmCreate);
+    TZmSaveFileStream file(file_name);
     SaveToStream(file);
+    if (!file.Commit()) {
+        throw EWriteError("Stream write error");
+    }
 }
 
 void TIOParams::SaveToStream(TStream& stream) {

@@ -43,9 +43,9 @@ void LoadColorMap(void* value, TZmFieldReader& reader) {
     if (count < 0) {
         return;
     }
-    std::vector<TRGB> colors(static_cast<std::size_t>(count));
-    for (TRGB& color : colors) {
-        LoadValue(reader, color);
+    std::vector<TRGB> colors;  // grows as they come: a stream may only claim to be long
+    for (std::int32_t i = 0; i < count && !reader.HasFailed(); ++i) {
+        LoadValue(reader, colors.emplace_back());
     }
     if (!reader.HasFailed()) {
         params.fColorMap = std::move(colors);

@@ -5,6 +5,7 @@
 #include <cstddef>
 #include <cstdint>
 #include <memory>
+#include <new>
 #include <string>
 #include <vector>
 
@@ -352,7 +353,7 @@ void WriteThroughMagick(TStream& stream, TZmBitmap& bitmap, TIOParams& params,
 
 /// The library goes by the contents before it goes by the name that it is given: what it found
 /// must be the type asked for.
-bool TryThroughMagick(TStream& stream, std::int32_t file_type) {
+bool IsOfType(TStream& stream, std::int32_t file_type) {
     const std::vector<std::uint8_t> bytes = RestOf(stream);
     const TWandHandle wand;
     TIOParams params;
@@ -363,6 +364,15 @@ bool TryThroughMagick(TStream& stream, std::int32_t file_type) {
                                                         Magick().relinquish);
     const std::vector<std::string> names = SplitText(ExtensionsOfType(file_type), ';');
     return found != nullptr && std::find(names.begin(), names.end(), found.get()) != names.end();
+}
+
+/// A file without room in memory is of no type: finding a type raises nothing.
+bool TryThroughMagick(TStream& stream, std::int32_t file_type) {
+    try {
+        return IsOfType(stream, file_type);
+    } catch (const std::bad_alloc&) {
+        return false;
+    }
 }
 
 std::shared_ptr<TZmFileFormatInfo> MakeRow(const TMagickRow& source) {

@@ -92,6 +92,14 @@ bool TZmBitmap::Read(const void* buffer, std::int64_t size_bytes, std::int32_t f
     return FinishRead(*this, *driver, {}, params);
 }
 
+bool TZmBitmap::LoadFromResource(const std::u16string& module_path,
+                                 const std::u16string& resource_type,
+                                 const std::u16string& resource_name, std::int32_t file_type) {
+    const auto driver = MakeReader(*this, nullptr);
+    driver->LoadFromResource(module_path, resource_type, resource_name, file_type);
+    return FinishRead(*this, *driver, {}, nullptr);
+}
+
 bool TZmBitmap::Write(const std::u16string& file_name, TIOParams* params) {
     return Write(file_name, 0, params);
 }

@@ -37,6 +37,8 @@ public:
     void Clear() { items_.clear(); }
     /// The first of a kind, or nil.
     const TZmPngChunk* Find(TZmPngChunkKind kind) const;
+    /// The text with this keyword and these very bytes, or nil.
+    const TZmPngChunk* FindText(std::string_view key, std::string_view value) const;
     /// The text that carries the XMP packet, or nil.
     const TZmPngChunk* FindXmp() const;
     void Delete(TZmPngChunkKind kind);

@@ -241,7 +241,7 @@ public:
     virtual TDrawMetafileHeader Header() const = 0;
 };
 /// The bytes of a metafile's file or of the memory form. Nil for other bytes, without the library,
-/// and on systems that have no reader.
+/// and for kinds that the system cannot play: Linux plays the enhanced ones' plain records alone.
 std::unique_ptr<TDrawMetafile> CreateMetafile(std::span<const std::uint8_t> bytes);
 
 /// How text is laid out. Typographic: the font's own metrics, nothing around them; in a limited

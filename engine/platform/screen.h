@@ -30,6 +30,10 @@ struct TScreenTraits {
 };
 TScreenTraits ScreenTraits();
 
+/// A colour of the system's scheme by its number, red in the low byte; black for other numbers.
+/// Where there is no scheme the values are those that Windows begins with.
+std::uint32_t SystemColor(std::uint8_t number);
+
 /// Whether the processor has the MMX instructions.
 bool ProcessorHasMMX();
 

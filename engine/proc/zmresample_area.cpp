@@ -352,9 +352,7 @@ std::array<double, 4> CubicWeights(double t) {
 }
 
 double LimitedCubic(double a, double b, double c, double d, double t, double limit) {
-    const std::array<double, 4> weights = CubicWeights(t);
-    const double value = a * weights[0] + b * weights[1] + c * weights[2] + d * weights[3];
-    return value < 0 ? 0 : value > limit ? limit : value;
+    return MixCubic({a, b, c, d}, CubicWeights(t), limit);
 }
 
 std::vector<double> MakeAreaPieces(double step, std::int32_t source_size,

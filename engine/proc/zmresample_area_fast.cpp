@@ -3,11 +3,11 @@
 //
 // The sums of the plain form separate by axis: each target row is a weighted sum of source rows,
 // each target pixel a weighted sum of columns of it. This form takes both sums in whatever order
-// is quick, in single precision for bytes and double for 16-bit samples. With a bound for what
-// that can differ from the stated double arithmetic, all pixels are decided but those near a
-// rounding tie; these are computed again, exactly as the plain form does. Where every weight is a
-// dyadic fraction of few bits (whole factors that are powers of 2, say) this is exact and
-// nothing is left to decide.
+// is quick, in single precision for bytes and double for 16-bit samples and for bytes of which so
+// many come together that single precision would not do. With a bound for what that can differ from
+// the stated double arithmetic, all pixels are decided but those near a rounding tie; these are
+// computed again, exactly as the plain form does. Where every weight is a dyadic fraction of few
+// bits (whole factors that are powers of 2, say) this is exact and nothing is left to decide.
 
 #include <algorithm>
 #include <cmath>
@@ -152,9 +152,9 @@ double TieMargin(const TFastAxis<Real>& columns, const TFastAxis<Real>& rows, do
     // of those roundings, and some for the scale, are a generous bound. In double precision the
     // stated form rounds as much again.
     const auto taps = static_cast<double>(columns.TapCount() + rows.TapCount());
-    const double stated = sizeof(Real) == sizeof(double)
-                              ? static_cast<double>(columns.TapCount() * rows.TapCount())
-                              : 0;
+    const double stated = sizeof(Real) == sizeof(double) ? static_cast<double>(columns.TapCount()) *
+                                                               static_cast<double>(rows.TapCount())
+                                                         : 0;
     return largest * scale * (4 * (taps + stated) + 16) * std::ldexp(1, -kDigits);
 }
 
@@ -172,7 +172,7 @@ bool RoundSamples(const Real* __restrict values, Sample* __restrict out, std::si
     return near_tie != 0;
 }
 
-template <typename Sample, std::size_t kChannels>
+template <typename Sample, std::size_t kChannels, typename Real>
 class TFastArea {
 public:
     TFastArea(TZmBitmap& source, TZmBitmap& target, const TResampleListener& listener)
@@ -189,7 +189,6 @@ public:
     void Run();
 
 private:
-    using Real = TAreaReal<Sample>;
     /// Source rows that are read side by side: more would crowd the cache.
     static constexpr std::size_t kMaxRowsAtOnce = 8;
     /// Numbers behind a row, for whole vector reads and writes.
@@ -222,14 +221,15 @@ private:
 };
 
 /// The row sums of a target row, in source columns.
-template <typename Sample, std::size_t kChannels>
-void TFastArea<Sample, kChannels>::SumSourceRows(std::size_t y) {
+template <typename Sample, std::size_t kChannels, typename Real>
+void TFastArea<Sample, kChannels, Real>::SumSourceRows(std::size_t y) {
     const typename TFastAxis<Real>::TTapRange taps = rows_.Taps(y);
     const std::size_t count = row_sums_.size() - kPadding;
     TSumStart start = TSumStart::kFresh;
     const auto add = [&] {
-        SumWeightedRows({summed_rows_.data(), summed_weights_.data(), summed_rows_.size()}, count,
-                        start, row_sums_.data());
+        const TSummedRows<Sample, Real> rows{summed_rows_.data(), summed_weights_.data(),
+                                             summed_rows_.size()};
+        SumWeightedRows(rows, count, start, row_sums_.data());
         summed_rows_.clear();
         summed_weights_.clear();
         start = TSumStart::kGoOn;
@@ -251,8 +251,8 @@ void TFastArea<Sample, kChannels>::SumSourceRows(std::size_t y) {
 }
 
 /// Target samples from the row sums.
-template <typename Sample, std::size_t kChannels>
-void TFastArea<Sample, kChannels>::SumColumns() {
+template <typename Sample, std::size_t kChannels, typename Real>
+void TFastArea<Sample, kChannels, Real>::SumColumns() {
     const auto scale = static_cast<Real>(scale_);
     if constexpr (kChannels == 3 && std::is_same_v<Real, float>) {
         SumPixels3(columns_.AllTaps(), row_sums_.data(), scale, values_.data());
@@ -278,8 +278,8 @@ void TFastArea<Sample, kChannels>::SumColumns() {
 }
 
 /// Notes the pixels of a stretch of samples that have a sample near a tie.
-template <typename Sample, std::size_t kChannels>
-void TFastArea<Sample, kChannels>::CollectTies(std::size_t first, std::size_t end) {
+template <typename Sample, std::size_t kChannels, typename Real>
+void TFastArea<Sample, kChannels, Real>::CollectTies(std::size_t first, std::size_t end) {
     const auto tie_start = static_cast<Real>(0.5 - margin_);
     for (std::size_t i = first; i < end; ++i) {
         const std::size_t pixel = i / kChannels;
@@ -291,8 +291,8 @@ void TFastArea<Sample, kChannels>::CollectTies(std::size_t first, std::size_t en
 }
 
 /// One vertical piece of all noted pixels, in the order and the arithmetic of the plain form.
-template <typename Sample, std::size_t kChannels>
-void TFastArea<Sample, kChannels>::AddTiePieces(const TAxisPiece& row) {
+template <typename Sample, std::size_t kChannels, typename Real>
+void TFastArea<Sample, kChannels, Real>::AddTiePieces(const TAxisPiece& row) {
     const Sample* current = SourceRow(row.index);
     if (current == nullptr) {
         return;
@@ -312,8 +312,8 @@ void TFastArea<Sample, kChannels>::AddTiePieces(const TAxisPiece& row) {
 }
 
 /// Computes the noted pixels of a row as the plain form does.
-template <typename Sample, std::size_t kChannels>
-void TFastArea<Sample, kChannels>::ComputeTies(std::size_t y, Sample* out) {
+template <typename Sample, std::size_t kChannels, typename Real>
+void TFastArea<Sample, kChannels, Real>::ComputeTies(std::size_t y, Sample* out) {
     tie_sums_.assign(ties_.size() * kChannels, 0.0);
     const typename TFastAxis<Real>::TPieceRange pieces = rows_.Pieces(y);
     for (const TAxisPiece* piece = pieces.begin; piece != pieces.end; ++piece) {
@@ -328,8 +328,8 @@ void TFastArea<Sample, kChannels>::ComputeTies(std::size_t y, Sample* out) {
     ties_.clear();
 }
 
-template <typename Sample, std::size_t kChannels>
-void TFastArea<Sample, kChannels>::FinishRow(std::size_t y) {
+template <typename Sample, std::size_t kChannels, typename Real>
+void TFastArea<Sample, kChannels, Real>::FinishRow(std::size_t y) {
     auto* out = reinterpret_cast<Sample*>(target_.GetScanLine(static_cast<std::int32_t>(y)));
     if (out == nullptr) {
         return;
@@ -348,8 +348,8 @@ void TFastArea<Sample, kChannels>::FinishRow(std::size_t y) {
     }
 }
 
-template <typename Sample, std::size_t kChannels>
-void TFastArea<Sample, kChannels>::Run() {
+template <typename Sample, std::size_t kChannels, typename Real>
+void TFastArea<Sample, kChannels, Real>::Run() {
     const auto channels = static_cast<std::int64_t>(kChannels);
     row_sums_ = MakeWorkBuffer<Real>(source_.GetWidth() * channels + std::int64_t{kPadding});
     values_ = MakeWorkBuffer<Real>(target_.GetWidth() * channels + std::int64_t{kPadding});
@@ -366,14 +366,20 @@ void TFastArea<Sample, kChannels>::Run() {
     }
 }
 
-template <typename Sample, std::size_t kChannels>
-bool Shrink(TZmBitmap& source, TZmBitmap& target, const TResampleListener& listener) {
-    TFastArea<Sample, kChannels> engine(source, target, listener);
+template <typename Sample, std::size_t kChannels, typename Real>
+bool ShrinkIn(TZmBitmap& source, TZmBitmap& target, const TResampleListener& listener) {
+    TFastArea<Sample, kChannels, Real> engine(source, target, listener);
     if (!engine.IsPrecise()) {
         return false;
     }
     engine.Run();
     return true;
+}
+
+template <typename Sample, std::size_t kChannels>
+bool Shrink(TZmBitmap& source, TZmBitmap& target, const TResampleListener& listener) {
+    return ShrinkIn<Sample, kChannels, TAreaReal<Sample>>(source, target, listener) ||
+           (sizeof(Sample) == 1 && ShrinkIn<Sample, kChannels, double>(source, target, listener));
 }
 
 }  // namespace
@@ -422,10 +428,7 @@ bool HasFastArea(TZmBitmap& source, TZmBitmap& target, TAreaInterpolation interp
     }
     const bool wider = target.GetWidth() > source.GetWidth();
     const bool higher = target.GetHeight() > source.GetHeight();
-    if (wider != higher) {
-        return false;
-    }
-    return !wider || interpolation == TAreaInterpolation::kCubic || format != zm32RGB;
+    return !wider || !higher || interpolation == TAreaInterpolation::kCubic || format != zm32RGB;
 }
 
 bool ResampleAreaFast(TZmBitmap& source, TZmBitmap& target, TZmBitmap* alpha,
@@ -433,9 +436,16 @@ bool ResampleAreaFast(TZmBitmap& source, TZmBitmap& target, TZmBitmap* alpha,
     if (!FitTargetFormat(target, source.GetPixelFormat())) {
         return false;
     }
-    const bool done = target.GetWidth() > source.GetWidth()
-                          ? EnlargeAreaFast(source, target, alpha, interpolation, listener)
-                          : ShrinkAreaFast(source, target, listener);
+    const bool wider = target.GetWidth() > source.GetWidth();
+    const bool higher = target.GetHeight() > source.GetHeight();
+    bool done = false;
+    if (wider != higher) {
+        done = MixAreaFast(source, target, interpolation, listener);
+    } else if (wider) {
+        done = EnlargeAreaFast(source, target, alpha, interpolation, listener);
+    } else {
+        done = ShrinkAreaFast(source, target, listener);
+    }
     return done || ResampleAreaPlain(source, target, alpha, interpolation, listener);
 }
 

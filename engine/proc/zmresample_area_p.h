@@ -59,7 +59,14 @@ using TAreaReal = std::conditional_t<std::is_same_v<Sample, std::uint8_t>, float
 
 /// Weights of the four-point cubic with parameter -1 at `t` between the second and third point.
 std::array<double, 4> CubicWeights(double t);
-/// The cubic, limited to 0 .. limit, in the stated order of operations.
+/// Four samples by their weights, limited to 0 .. limit, in the stated order of operations.
+inline double MixCubic(const std::array<double, 4>& samples, const std::array<double, 4>& weights,
+                       double limit) {
+    const double value = samples[0] * weights[0] + samples[1] * weights[1] +
+                         samples[2] * weights[2] + samples[3] * weights[3];
+    return value < 0 ? 0 : value > limit ? limit : value;
+}
+/// The cubic at `t`, limited.
 double LimitedCubic(double a, double b, double c, double d, double t, double limit);
 
 /// Two filtered rows and their weights in a target row.
@@ -147,15 +154,17 @@ struct TAxisTap {
 /// Whether sums start at 0 or are added to.
 enum class TSumStart : std::uint8_t { kFresh, kGoOn };
 /// Rows of samples with their weights.
-template <typename Sample>
+template <typename Sample, typename Real = TAreaReal<Sample>>
 struct TSummedRows {
     const Sample* const* rows;
-    const TAreaReal<Sample>* weights;
+    const Real* weights;
     std::size_t row_count;
 };
 /// sums[i] = (or +=) the rows' samples times their weights.
 void SumWeightedRows(const TSummedRows<std::uint8_t>& rows, std::size_t count, TSumStart start,
                      float* sums);
+void SumWeightedRows(const TSummedRows<std::uint8_t, double>& rows, std::size_t count,
+                     TSumStart start, double* sums);
 void SumWeightedRows(const TSummedRows<std::uint16_t>& rows, std::size_t count, TSumStart start,
                      double* sums);
 
@@ -176,6 +185,9 @@ void SumPixels3(const TAxisTaps& taps, const float* in, float scale, float* out)
 [[nodiscard]] bool EnlargeAreaFast(TZmBitmap& source, TZmBitmap& target, TZmBitmap* alpha,
                                    TAreaInterpolation interpolation,
                                    const TResampleListener& listener);
+/// One side shrinks, the other enlarges; always precise.
+[[nodiscard]] bool MixAreaFast(TZmBitmap& source, TZmBitmap& target,
+                               TAreaInterpolation interpolation, const TResampleListener& listener);
 
 /// Whether all values of a plane are 255.
 bool IsOpaquePlane(TZmBitmap& alpha);

@@ -175,7 +175,12 @@ void PlanSpread16(TSpreadPlan& plan) {
 template <class D>
 HWY_INLINE hn::Vec<D> LoadSamplesAt(D tag, const std::uint8_t* at) {
     const hn::Rebind<std::int32_t, D> int_tag;
-    return hn::ConvertTo(tag, hn::PromoteTo(int_tag, hn::LoadU(hn::Rebind<std::uint8_t, D>(), at)));
+    const auto numbers = hn::PromoteTo(int_tag, hn::LoadU(hn::Rebind<std::uint8_t, D>(), at));
+    if constexpr (sizeof(hn::TFromD<D>) == sizeof(double)) {
+        return hn::PromoteTo(tag, numbers);
+    } else {
+        return hn::ConvertTo(tag, numbers);
+    }
 }
 
 template <class D>
@@ -185,10 +190,10 @@ HWY_INLINE hn::Vec<D> LoadSamplesAt(D tag, const std::uint16_t* at) {
                          hn::PromoteTo(int_tag, hn::LoadU(hn::Rebind<std::uint16_t, D>(), at)));
 }
 
-template <typename Sample>
-HWY_INLINE void SumRows(const TSummedRows<Sample>& rows, std::size_t count, TSumStart start,
-                        TAreaReal<Sample>* sums) {
-    ForBlocks<TAreaReal<Sample>>(count, [&](auto tag, std::size_t i) HWY_ATTR {
+template <typename Sample, typename Real>
+HWY_INLINE void SumRows(const TSummedRows<Sample, Real>& rows, std::size_t count, TSumStart start,
+                        Real* sums) {
+    ForBlocks<Real>(count, [&](auto tag, std::size_t i) HWY_ATTR {
         auto sum = start == TSumStart::kFresh ? hn::Zero(tag) : hn::LoadU(tag, sums + i);
         for (std::size_t row = 0; row < rows.row_count; ++row) {
             sum = hn::MulAdd(hn::Set(tag, rows.weights[row]),
@@ -200,6 +205,10 @@ HWY_INLINE void SumRows(const TSummedRows<Sample>& rows, std::size_t count, TSum
 
 void SumRows8(const TSummedRows<std::uint8_t>& rows, std::size_t count, TSumStart start,
               float* sums) {
+    SumRows(rows, count, start, sums);
+}
+void SumRows8Precise(const TSummedRows<std::uint8_t, double>& rows, std::size_t count,
+                     TSumStart start, double* sums) {
     SumRows(rows, count, start, sums);
 }
 void SumRows16(const TSummedRows<std::uint16_t>& rows, std::size_t count, TSumStart start,
@@ -337,11 +346,17 @@ HWY_EXPORT(SpreadCubic8);
 HWY_EXPORT(SpreadCubic16);
 HWY_EXPORT(SumPixels);
 HWY_EXPORT(SumRows8);
+HWY_EXPORT(SumRows8Precise);
 HWY_EXPORT(SumRows16);
 
 void SumWeightedRows(const TSummedRows<std::uint8_t>& rows, std::size_t count, TSumStart start,
                      float* sums) {
     HWY_DYNAMIC_DISPATCH(SumRows8)(rows, count, start, sums);
+}
+
+void SumWeightedRows(const TSummedRows<std::uint8_t, double>& rows, std::size_t count,
+                     TSumStart start, double* sums) {
+    HWY_DYNAMIC_DISPATCH(SumRows8Precise)(rows, count, start, sums);
 }
 
 void SumWeightedRows(const TSummedRows<std::uint16_t>& rows, std::size_t count, TSumStart start,

@@ -12,6 +12,7 @@
 #include <algorithm>
 #include <array>
 #include <cstring>
+#include <iterator>
 #include <vector>
 
 #include "engine/proc/zmresample_p.h"
@@ -66,8 +67,11 @@ private:
     const std::vector<std::int32_t>& FilteredRow(std::int32_t index);
     void PrepareMeans();
     void PrepareWindows();
+    void PrepareShortSpans();
+    void FindPlaces(std::size_t reach_bytes, std::size_t longer_offset);
     void FilterRow(const Sample* in, std::int32_t* out);
     void ShrinkSpans(std::size_t first, const Sample* in, std::int32_t* out) const;
+    void ShrinkRowByShortSpans(const Sample* in, std::int32_t* out) const;
     void ShrinkRowByWindows(const Sample* in, std::int32_t* out);
     void EnlargeRow(const Sample* in, std::int32_t* out) const;
     void EnlargeRowFast(const Sample* in, std::int32_t* out) const;
@@ -93,8 +97,10 @@ private:
     std::vector<TMeanSpan> means_;        ///< fast form of shrinking zm24RGB far
     std::vector<std::uint8_t> row_copy_;  ///< for it: a row with a byte behind
     TMeanWindows windows_;                ///< fast form of shrinking bytes a little
-    std::vector<std::uint32_t> places_;   ///< in the window means, of the leading spans
+    std::vector<std::uint32_t> places_;   ///< of the leading spans, in the row or its window means
     std::vector<std::uint8_t> window_means_;
+    std::vector<std::uint32_t> factors_;  ///< these two for short spans of zm24RGB
+    std::vector<std::uint8_t> last_pairs_;
     std::vector<std::int32_t> fast_sums_;  ///< fast form of vertical means
     std::vector<std::int64_t> sums_;
     std::vector<Sample> output_;
@@ -125,7 +131,7 @@ TFastLinear<Sample, kChannels>::TFastLinear(TZmBitmap& source, TZmBitmap& target
                              target.GetWidth());
     }
     for (TFilteredRow& row : rows_) {
-        row.samples = MakeWorkBuffer<std::int32_t>(samples + 1);
+        row.samples = MakeWorkBuffer<std::int32_t>(samples + std::int64_t{kMeanPadding});
     }
     PrepareWindows();
     PrepareMeans();
@@ -133,39 +139,70 @@ TFastLinear<Sample, kChannels>::TFastLinear(TZmBitmap& source, TZmBitmap& target
     output_ = MakeWorkBuffer<Sample>(samples);
 }
 
+std::size_t LengthOf(const TColumnSpan& span) {
+    return static_cast<std::size_t>(span.right - span.left) + 1;
+}
+
 /// Neighbouring spans differ by a pixel in length. Where they are short, the means of all windows
-/// of both lengths are sooner made, by whole vectors, than those wanted one by one. Only the
-/// last span, or the last few, may be of another kind.
+/// of both lengths are sooner made, by whole vectors, than those wanted one by one; and very short
+/// ones are summed several at a time. Only the last span, or the last few, may be of another kind.
 template <typename Sample, std::size_t kChannels>
 void TFastLinear<Sample, kChannels>::PrepareWindows() {
-    const std::size_t row_bytes = static_cast<std::size_t>(source_width_) * kChannels;
-    if (!is_fast_ || sizeof(Sample) != 1 || scale_x_ > 1 || row_bytes < kMinWindowRow ||
-        spans_.size() < 2) {
+    if (!is_fast_ || sizeof(Sample) != 1 || scale_x_ > 1 || spans_.size() < 2) {
         return;
     }
-    const auto length = [](const TColumnSpan& span) {
-        return static_cast<std::size_t>(span.right - span.left) + 1;
-    };
-    const auto by_length = [&](const TColumnSpan& a, const TColumnSpan& b) {
-        return length(a) < length(b);
-    };
-    const auto ends = std::minmax_element(spans_.begin(), spans_.end() - 1, by_length);
-    windows_ = TMeanWindows{kChannels, length(*ends.first), length(*ends.second)};
+    const auto ends = std::minmax_element(
+        spans_.begin(), spans_.end() - 1,
+        [](const TColumnSpan& a, const TColumnSpan& b) { return LengthOf(a) < LengthOf(b); });
+    windows_ = TMeanWindows{kChannels, LengthOf(*ends.first), LengthOf(*ends.second)};
     if (windows_.shortest < 2 || windows_.longest > kMaxWindow ||
         windows_.longest > windows_.shortest + 1) {
         return;
     }
+    const std::size_t row_bytes = static_cast<std::size_t>(source_width_) * kChannels;
+    if (kChannels == 3 && windows_.longest <= kMaxShortSpan && HasShortSpans()) {
+        PrepareShortSpans();
+    } else if (row_bytes >= kMinWindowRow) {
+        FindPlaces(windows_.longest * kChannels, row_bytes);
+        window_means_ = MakeWorkBuffer<std::uint8_t>(static_cast<std::int64_t>(row_bytes) * 2 + 1);
+    }
+}
+
+/// Notes the leading spans behind whose start there are `reach_bytes`; those of the greater length
+/// lie `longer_offset` further.
+template <typename Sample, std::size_t kChannels>
+void TFastLinear<Sample, kChannels>::FindPlaces(std::size_t reach_bytes,
+                                                std::size_t longer_offset) {
+    const std::size_t row_bytes = static_cast<std::size_t>(source_width_) * kChannels;
     for (const TColumnSpan& span : spans_) {
-        const std::size_t left = static_cast<std::size_t>(span.left);
-        const bool is_short = length(span) == windows_.shortest;
-        if ((!is_short && length(span) != windows_.longest) ||
-            left + windows_.longest > static_cast<std::size_t>(source_width_)) {
+        const std::size_t place = static_cast<std::size_t>(span.left) * kChannels;
+        const bool is_short = LengthOf(span) == windows_.shortest;
+        if ((!is_short && LengthOf(span) != windows_.longest) || reach_bytes > row_bytes ||
+            place > row_bytes - reach_bytes) {
             break;
         }
-        places_.push_back(
-            static_cast<std::uint32_t>(left * kChannels + (is_short ? 0 : row_bytes)));
+        places_.push_back(static_cast<std::uint32_t>(place + (is_short ? 0 : longer_offset)));
     }
-    window_means_ = MakeWorkBuffer<std::uint8_t>(static_cast<std::int64_t>(row_bytes) * 2 + 1);
+}
+
+template <typename Sample, std::size_t kChannels>
+void TFastLinear<Sample, kChannels>::PrepareShortSpans() {
+    constexpr std::uint8_t kNone = 128;  // stands for a zero
+    FindPlaces(kPairBytes, 0);
+    const std::size_t first_pixel = (windows_.longest - 1) / 2 * 2;
+    for (std::size_t i = 0; i < places_.size(); ++i) {
+        const std::size_t length = LengthOf(spans_[i]);
+        factors_.insert(factors_.end(), 4, MeanFactor(length));
+        const auto byte_of = [&](std::size_t pixel, std::size_t channel) {
+            return pixel < length ? static_cast<std::uint8_t>(pixel * 3 + channel) : kNone;
+        };
+        for (std::size_t c = 0; c < 3; ++c) {
+            const std::uint8_t words[] = {byte_of(first_pixel, c), kNone,
+                                          byte_of(first_pixel + 1, c), kNone};
+            last_pairs_.insert(last_pairs_.end(), std::begin(words), std::end(words));
+        }
+        last_pairs_.insert(last_pairs_.end(), 4, kNone);
+    }
 }
 
 /// The spans for the vector loop, where that applies.
@@ -223,6 +260,16 @@ void TFastLinear<Sample, kChannels>::ShrinkRowByWindows(const Sample* in, std::i
 }
 
 template <typename Sample, std::size_t kChannels>
+void TFastLinear<Sample, kChannels>::ShrinkRowByShortSpans(const Sample* in,
+                                                           std::int32_t* out) const {
+    if constexpr (sizeof(Sample) == 1 && kChannels == 3) {
+        const TShortSpans spans{places_.data(), factors_.data(), last_pairs_.data(),
+                                windows_.longest, places_.size()};
+        ShrinkSpans(MeanShortSpans24(in, spans, out), in, out);
+    }
+}
+
+template <typename Sample, std::size_t kChannels>
 void TFastLinear<Sample, kChannels>::EnlargeRow(const Sample* in, std::int32_t* out) const {
     for (const TColumnSpan& span : spans_) {
         const std::int32_t next = std::min(span.left + 1, source_width_ - 1);
@@ -250,7 +297,9 @@ void TFastLinear<Sample, kChannels>::EnlargeRowFast(const Sample* in, std::int32
 
 template <typename Sample, std::size_t kChannels>
 void TFastLinear<Sample, kChannels>::FilterRow(const Sample* in, std::int32_t* out) {
-    if (!places_.empty()) {
+    if (!factors_.empty()) {
+        ShrinkRowByShortSpans(in, out);
+    } else if (!places_.empty()) {
         ShrinkRowByWindows(in, out);
     } else if (!means_.empty()) {
         std::memcpy(row_copy_.data(), in, row_copy_.size() - 1);

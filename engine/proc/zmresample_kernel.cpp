@@ -120,6 +120,7 @@ public:
     }
 
 private:
+    void ReserveTaps(std::int32_t target_size, double width);
     void AddTaps(const TKernel& kernel, double center, double width, double fscale);
     void AddTap(std::int64_t pixel, std::int32_t weight);
     void EndList(std::size_t list);
@@ -143,10 +144,26 @@ TTapTable::TTapTable(const TKernel& kernel, std::int32_t source_size, std::int32
     const double fscale = enlarging ? 1 : 1 / scale;
     starts_ = MakeWorkBuffer<std::size_t>(static_cast<std::int64_t>(target_size) + 1);
     divisors_ = MakeWorkBuffer<std::int32_t>(target_size);
+    // No kernel exceeds 1: from here on all weights round to 0.
+    constexpr double kNoWeights = 512;
+    if (fscale < kNoWeights) {
+        ReserveTaps(target_size, width);
+    }
     for (std::int32_t i = 0; i < target_size; ++i) {
-        AddTaps(kernel, i / scale, width, fscale);
+        if (fscale < kNoWeights) {
+            AddTaps(kernel, i / scale, width, fscale);
+        }
         EndList(static_cast<std::size_t>(i));
     }
+}
+
+/// Room for all taps at once, or none at all: lists of a row at the limit take gigabytes.
+void TTapTable::ReserveTaps(std::int32_t target_size, double width) {
+    const std::int64_t longest = std::int64_t{TruncToInt(2 * width)} + 3;
+    const std::int64_t count = target_size * longest;
+    RequireWorkMemory(count, sizeof(TContributor) + sizeof(float));
+    taps_.reserve(static_cast<std::size_t>(count));
+    weights_.reserve(static_cast<std::size_t>(count));
 }
 
 void TTapTable::EndList(std::size_t list) {
@@ -264,11 +281,10 @@ public:
         : table_(table),
           row_bytes_(static_cast<std::size_t>(width) * 3),
           pairs_((static_cast<std::size_t>(width) + 1) / 2),
-          area_(MakeWorkBuffer<std::int16_t>(static_cast<std::int64_t>(
-              pairs_ * PairRowsAtOnce() * kPairNumbers + kAlign / sizeof(std::int16_t)))),
+          area_(MakeWorkBuffer<std::int16_t>(AllRows(pairs_) * std::int64_t{kPairNumbers} +
+                                             std::int64_t{kAlign / sizeof(std::int16_t)})),
           out_step_(table.Row().count * 3 + 1),
-          out_(MakeWorkBuffer<std::uint8_t>(
-              static_cast<std::int64_t>(out_step_ * PairRowsAtOnce() + 1))) {
+          out_(MakeWorkBuffer<std::uint8_t>(AllRows(out_step_) + 1)) {
         const auto address = reinterpret_cast<std::uintptr_t>(area_.data());
         aligned_ = area_.data() + (kAlign - address % kAlign) % kAlign / sizeof(std::int16_t);
     }
@@ -282,6 +298,12 @@ public:
 
 private:
     static constexpr std::size_t kAlign = 64;
+
+    /// Of all rows that are filtered together; more than size_t holds is for the buffer to refuse.
+    static std::int64_t AllRows(std::size_t of_one) {
+        return static_cast<std::int64_t>(of_one) * static_cast<std::int64_t>(PairRowsAtOnce());
+    }
+
     const TPairTable& table_;
     std::size_t row_bytes_;
     std::size_t pairs_;

@@ -154,8 +154,8 @@ enum class TAreaInterpolation : std::uint8_t { kLinear, kCubic };
                                      TAreaInterpolation interpolation,
                                      const TResampleListener& listener);
 
-/// Whether a fast form stands for the plain one here: both sides shrinking, or both enlarging
-/// (not zm32RGB linearly).
+/// Whether a fast form stands for the plain one here: everywhere but for zm32RGB enlarged linearly
+/// both ways.
 bool HasFastArea(TZmBitmap& source, TZmBitmap& target, TAreaInterpolation interpolation);
 /// The fast form; gives the same bytes. Only where HasFastArea says so.
 [[nodiscard]] bool ResampleAreaFast(TZmBitmap& source, TZmBitmap& target, TZmBitmap* alpha,
@@ -229,6 +229,39 @@ struct TMeanSpan {
 void MeanSpans24(const std::uint8_t* in, const TMeanSpan* spans, std::size_t count,
                  std::int32_t* out);
 
+/// Longest window whose mean is a product with MeanFactor.
+inline constexpr std::size_t kMaxWindow = 9;
+static_assert(255 * kMaxWindow * kMaxWindow < 65536);
+
+/// Short spans of three-byte pixels, of `longest` or one pixel less. For each its place in the row,
+/// from where 16 bytes can be read; the factor of its mean, four times over; and which bytes stand
+/// for its last pair of pixels, the first of which is pixel (longest - 1) / 2 * 2.
+struct TShortSpans {
+    const std::uint32_t* places = nullptr;
+    const std::uint32_t* factors = nullptr;
+    const std::uint8_t* last_pairs = nullptr;
+    std::size_t longest = 0;
+    std::size_t count = 0;
+};
+/// Longest span that 16 bytes hold.
+inline constexpr std::size_t kMaxShortSpan = 5;
+/// Bytes of `last_pairs` for a span.
+inline constexpr std::size_t kPairBytes = 16;
+/// Numbers that MeanShortSpans24 may write behind the last mean.
+inline constexpr std::size_t kMeanPadding = 16;
+/// Whether this processor moves bytes about inside vectors.
+bool HasShortSpans();
+/// Truncating means of the first spans; returns how many.
+std::size_t MeanShortSpans24(const std::uint8_t* in, const TShortSpans& spans, std::int32_t* out);
+/// Factor of a mean of `length` numbers of 8 bits, at most kMaxWindow of them: the upper half of
+/// the product with their sum is the truncated quotient. It is 65536 / length rounded up, less
+/// than `length` too much a unit, so that a quotient is too large by less than
+/// 255 * length^2 / 65536 / length, which is below the 1 / length that would reach the next
+/// integer.
+constexpr std::uint16_t MeanFactor(std::size_t length) {
+    return static_cast<std::uint16_t>((65535 + length) / length);
+}
+
 /// Means of all the windows of a row: of `shortest` pixels and, if `longest` is one more, of
 /// that too. Lengths are 2 to kMaxWindow; a pixel is `step` bytes.
 struct TMeanWindows {
@@ -236,7 +269,6 @@ struct TMeanWindows {
     std::size_t shortest = 0;
     std::size_t longest = 0;
 };
-inline constexpr std::size_t kMaxWindow = 9;
 /// Bytes that a row must have for MeanWindowsOfRow.
 inline constexpr std::size_t kMinWindowRow = 128;
 /// out[i] = the truncating mean of the window that starts with in[i]; the longer windows follow
@@ -272,8 +304,11 @@ bool BlendIntRows(const TBlendRows& rows, std::size_t count, std::uint8_t* out);
 /// rfProjectBW and rfProjectWB: zm24RGB or zm1g to zm1g, keeping black (white) features.
 [[nodiscard]] bool ResampleProjection(TZmBitmap& source, TZmBitmap& target, TResampleFilter filter);
 
+/// Whether the platform's scaler is asked first, or ours does all.
+enum class TScalerChoice : std::uint8_t { kPlatform, kOwn };
 /// rfWICNearestNeighbor, rfWICLinear, rfWICCubic, rfWICFant: every format to itself, but zm1g
 /// and zm8p to zm24RGB.
-[[nodiscard]] bool ResampleScaler(TZmBitmap& source, TZmBitmap& target, TResampleFilter filter);
+[[nodiscard]] bool ResampleScaler(TZmBitmap& source, TZmBitmap& target, TResampleFilter filter,
+                                  TScalerChoice choice = TScalerChoice::kPlatform);
 
 }  // namespace zm

@@ -1,17 +1,20 @@
-// The scaler behind the four rfWIC filters, our own choice in the place of a platform's:
+// The scaler behind the four rfWIC filters: the platform's where it has one. Elsewhere, and for
+// zmCIELab, whose signed channels platforms do not know, it is our own choice:
 //   rfWICNearestNeighbor  the sample whose cell holds the target pixel's centre
 //   rfWICLinear           linear between the two samples around the centre
 //   rfWICCubic            four-point cubic (Catmull-Rom) around the centre
 //   rfWICFant             average over the target pixel's footprint, both ways
-// Pixels are cells and their centres are aligned, unlike in the other engines. Each channel is
-// filtered by itself in double precision, first down the columns, then along the row; only
+// Pixels are cells there and their centres are aligned, unlike in the other engines. Each channel
+// is filtered by itself in double precision, first down the columns, then along the row; only
 // rfWICFant takes more than four source pixels along an axis.
 
 #include <algorithm>
 #include <cmath>
 #include <cstring>
+#include <optional>
 #include <vector>
 
+#include "engine/platform/imagescaler.h"
 #include "engine/proc/zmresample_p.h"
 
 namespace zm {
@@ -88,11 +91,10 @@ private:
 };
 
 /// How the channels of a format lie in memory.
-enum TSampleKind : std::uint8_t { kBits, kBytes, kLab, kWords, kFloats };
+enum TSampleKind : std::uint8_t { kBytes, kLab, kWords, kFloats };
 
 TSampleKind SampleKind(TZmPixelFormat format) {
     switch (format) {
-        case zm1g: return kBits;
         case zmCIELab: return kLab;
         case zm16g:
         case zm48RGB: return kWords;
@@ -110,7 +112,6 @@ Sample ReadSample(const std::uint8_t* row, std::size_t index) {
 
 double SampleValue(const std::uint8_t* row, std::size_t index, TSampleKind kind) {
     switch (kind) {
-        case kBits: return (row[index >> 3] >> (7 - (index & 7)) & 1) != 0 ? 255 : 0;
         case kLab: return index % 3 == 0 ? row[index] : ReadSample<std::int8_t>(row, index);
         case kWords: return ReadSample<std::uint16_t>(row, index);
         case kFloats: return static_cast<double>(ReadSample<float>(row, index));
@@ -185,17 +186,8 @@ private:
                     value += sums_[static_cast<std::size_t>(tap.pixel) * channels_ + channel] *
                              tap.weight;
                 }
-                StorePixel(out, x, channel, value);
+                StoreSample(out, static_cast<std::size_t>(x) * channels_ + channel, kind_, value);
             }
-        }
-    }
-
-    void StorePixel(std::uint8_t* out, std::int32_t x, std::size_t channel, double value) const {
-        const auto pixel = static_cast<std::size_t>(x);
-        if (kind_ == kBits) {
-            std::fill_n(out + 3 * pixel, 3, Clamp8(RoundHalfEven(value)));
-        } else {
-            StoreSample(out, pixel * channels_ + channel, kind_, value);
         }
     }
 
@@ -208,30 +200,66 @@ private:
     std::vector<double> sums_;
 };
 
-/// Palette indices cannot be averaged: such an image goes through zm24RGB.
-bool ScalePalettedImage(TZmBitmap& source, TZmBitmap& target, TResampleFilter filter) {
+/// How the platform's scaler takes a format; nothing where it does not.
+std::optional<platform::TScalerLayout> PlatformLayout(TZmPixelFormat format) {
+    switch (format) {
+        case zm8g: return platform::TScalerLayout::kOneByte;
+        case zm16g: return platform::TScalerLayout::kOneWord;
+        case zm24RGB: return platform::TScalerLayout::kThreeBytes;
+        case zm32f: return platform::TScalerLayout::kOneFloat;
+        case zmCMYK:
+        case zm32RGB: return platform::TScalerLayout::kFourBytes;
+        case zm48RGB: return platform::TScalerLayout::kThreeWords;
+        default: return std::nullopt;
+    }
+}
+
+/// Both images in the format.
+bool ScaleByPlatform(TZmBitmap& source, TZmBitmap& target, TResampleFilter filter) {
+    const auto layout = PlatformLayout(source.GetPixelFormat());
+    if (!layout) {
+        return false;
+    }
+    platform::TScalerRequest request;
+    request.layout = *layout;
+    request.mode = static_cast<platform::TScalerMode>(filter - rfWICNearestNeighbor);
+    request.source_width = source.GetWidth();
+    request.source_height = source.GetHeight();
+    request.target_width = target.GetWidth();
+    request.target_height = target.GetHeight();
+    request.source_row = [&source](std::int32_t y) { return source.GetScanLine(y); };
+    request.target_row = [&target](std::int32_t y) { return target.GetScanLine(y); };
+    return platform::ScaleImage(request);
+}
+
+/// Palette indices and bits cannot be averaged: such an image goes through zm24RGB.
+bool ScaleAsColor(TZmBitmap& source, TZmBitmap& target, TResampleFilter filter,
+                  TScalerChoice choice) {
     TZmBitmap colors;
     if (!colors.Allocate(source.GetWidth(), source.GetHeight(), zm24RGB)) {
         return false;
     }
     colors.CopyAndConvertFormat(&source);
-    return ResampleScaler(colors, target, filter);
+    return ResampleScaler(colors, target, filter, choice);
 }
 
 }  // namespace
 
-bool ResampleScaler(TZmBitmap& source, TZmBitmap& target, TResampleFilter filter) {
+bool ResampleScaler(TZmBitmap& source, TZmBitmap& target, TResampleFilter filter,
+                    TScalerChoice choice) {
     if (source.IsEmpty() || target.IsEmpty()) {
         return false;
     }
     const TZmPixelFormat format = source.GetPixelFormat();
-    if (format == zm8p) {
-        return ScalePalettedImage(source, target, filter);
+    if (format == zm8p || format == zm1g) {
+        return ScaleAsColor(source, target, filter, choice);
     }
-    if (!FitTargetFormat(target, format == zm1g ? zm24RGB : format)) {
+    if (!FitTargetFormat(target, format)) {
         return false;
     }
-    TScaler(source, target, filter).Run();
+    if (choice == TScalerChoice::kOwn || !ScaleByPlatform(source, target, filter)) {
+        TScaler(source, target, filter).Run();
+    }
     return true;
 }
 

@@ -69,13 +69,9 @@ HWY_INLINE void AddToWindow(const std::uint8_t* in, TWindowSums& sums) {
     sums.odd = hn::Add(sums.odd, hn::ShiftRight<8>(bytes));
 }
 
-/// Divides by `length` with a factor of 65536 / length rounded up: less than `length` too much a
-/// unit, so that a quotient is too large by less than 255 * length^2 / 65536 / length, which is
-/// below the 1 / length that would reach the next integer.
 HWY_INLINE void StoreWindow(const TWindowSums& sums, std::size_t length, std::uint8_t* out) {
-    static_assert(255 * kMaxWindow * kMaxWindow < 65536);
     const TWordTag tag;
-    const auto factor = hn::Set(tag, static_cast<std::uint16_t>((65535 + length) / length));
+    const auto factor = hn::Set(tag, MeanFactor(length));
     const auto even = hn::MulHigh(hn::Sub(sums.all, hn::ShiftLeft<8>(sums.odd)), factor);
     const auto odd = hn::MulHigh(sums.odd, factor);
     const auto both = hn::Or(even, hn::ShiftLeft<8>(odd));
@@ -206,7 +202,85 @@ void FilterPairs(const TPairRow& row, const std::int16_t* area, std::uint8_t* ou
     }
 }
 
+// Short spans: a span lies in one block of 16 bytes, a vector takes as many spans as it has blocks.
+
+bool ShortSpansAreKnown() {
+    return true;
+}
+
+/// Bytes from as many places as the vector has blocks.
+template <class D>
+HWY_INLINE hn::Vec<D> LoadBlocks(D tag, const std::uint8_t* in, const std::uint32_t* places) {
+    if constexpr (hn::MaxLanes(D()) <= kPairBytes) {
+        return hn::LoadU(tag, in + places[0]);
+    } else {
+        const hn::Half<D> half;
+        constexpr std::size_t kBlocks = hn::MaxLanes(hn::Half<D>()) / kPairBytes;
+        return hn::Combine(tag, LoadBlocks(half, in, places + kBlocks),
+                           LoadBlocks(half, in, places));
+    }
+}
+
+/// Each channel's numbers of two pixels become one 32-bit lane of two words.
+template <std::size_t kFullPairs>
+std::size_t MeanShortSpansOf(const std::uint8_t* in, const TShortSpans& spans, std::int32_t* out) {
+    const hn::CappedTag<std::uint8_t, kMeanPadding * 4> tag;
+    const hn::Repartition<std::int16_t, decltype(tag)> word_tag;
+    const hn::Repartition<std::uint16_t, decltype(tag)> factor_tag;
+    const hn::Repartition<std::int32_t, decltype(tag)> int_tag;
+    alignas(16) static constexpr std::uint8_t kPairs[2][kPairBytes] = {
+        {0, 128, 3, 128, 1, 128, 4, 128, 2, 128, 5, 128, 128, 128, 128, 128},
+        {6, 128, 9, 128, 7, 128, 10, 128, 8, 128, 11, 128, 128, 128, 128, 128}};
+    alignas(64) std::int32_t three_of_four[kMeanPadding];
+    const std::size_t lanes = hn::Lanes(int_tag);
+    for (std::size_t i = 0; i < lanes; ++i) {
+        three_of_four[i] = static_cast<std::int32_t>(i < lanes / 4 * 3 ? i / 3 * 4 + i % 3 : i);
+    }
+    const auto packed = hn::SetTableIndices(int_tag, three_of_four);
+    const auto first = hn::LoadDup128(tag, kPairs[0]);
+    const auto second = hn::LoadDup128(tag, kPairs[1]);
+    const auto ones = hn::Set(word_tag, 1);
+    const std::size_t step = lanes / 4;
+    std::size_t x = 0;
+    for (; x + step <= spans.count; x += step, out += step * 3) {
+        const auto bytes = LoadBlocks(tag, in, spans.places + x);
+        const auto last = hn::LoadU(tag, spans.last_pairs + x * kPairBytes);
+        auto words = hn::BitCast(word_tag, hn::TableLookupBytesOr0(bytes, last));
+        if (kFullPairs > 0) {
+            words = hn::Add(words, hn::BitCast(word_tag, hn::TableLookupBytesOr0(bytes, first)));
+        }
+        if (kFullPairs > 1) {
+            words = hn::Add(words, hn::BitCast(word_tag, hn::TableLookupBytesOr0(bytes, second)));
+        }
+        auto unused = hn::Zero(int_tag);
+        const auto sums = hn::ReorderWidenMulAccumulate(int_tag, words, ones, unused, unused);
+        const auto factors =
+            hn::LoadU(hn::Repartition<std::uint32_t, decltype(tag)>(), spans.factors + x * 4);
+        const auto means =
+            hn::MulHigh(hn::BitCast(factor_tag, sums), hn::BitCast(factor_tag, factors));
+        hn::StoreU(hn::TableLookupLanes(hn::BitCast(int_tag, means), packed), int_tag, out);
+    }
+    return x;
+}
+
+std::size_t MeanShortSpans(const std::uint8_t* in, const TShortSpans& spans, std::int32_t* out) {
+    switch ((spans.longest - 1) / 2) {
+        case 0: return MeanShortSpansOf<0>(in, spans, out);
+        case 1: return MeanShortSpansOf<1>(in, spans, out);
+        default: return MeanShortSpansOf<2>(in, spans, out);
+    }
+}
+
 #else
+
+bool ShortSpansAreKnown() {
+    return false;
+}
+
+std::size_t MeanShortSpans(const std::uint8_t* /*in*/, const TShortSpans& /*spans*/,
+                           std::int32_t* /*out*/) {
+    return 0;
+}
 
 std::size_t RowsAtOnce() {
     return 1;
@@ -360,11 +434,13 @@ HWY_EXPORT(AddNumbers);
 HWY_EXPORT(BlendInts);
 HWY_EXPORT(DivideNumbers);
 HWY_EXPORT(FilterPairs);
+HWY_EXPORT(MeanShortSpans);
 HWY_EXPORT(MeanSpans);
 HWY_EXPORT(MeanWindows);
 HWY_EXPORT(MixRows);
 HWY_EXPORT(PickPixels);
 HWY_EXPORT(RowsAtOnce);
+HWY_EXPORT(ShortSpansAreKnown);
 HWY_EXPORT(SpreadPairs);
 
 std::size_t PairRowsAtOnce() {
@@ -388,6 +464,14 @@ void MixByteRows(const TWeightedRows& rows, std::size_t count, std::uint8_t* out
 void MeanSpans24(const std::uint8_t* in, const TMeanSpan* spans, std::size_t count,
                  std::int32_t* out) {
     HWY_DYNAMIC_DISPATCH(MeanSpans)(in, spans, count, out);
+}
+
+bool HasShortSpans() {
+    return HWY_DYNAMIC_DISPATCH(ShortSpansAreKnown)();
+}
+
+std::size_t MeanShortSpans24(const std::uint8_t* in, const TShortSpans& spans, std::int32_t* out) {
+    return HWY_DYNAMIC_DISPATCH(MeanShortSpans)(in, spans, out);
 }
 
 void MeanWindowsOfRow(const std::uint8_t* in, std::size_t bytes, const TMeanWindows& windows,

@@ -16,8 +16,8 @@ void TZmBitmap::SyncAlphaChannel(bool anti_alias) {
     plane.Resample(GetWidth(), fHeight, anti_alias ? rfBicubic : rfNone,
                    /*maintain_aspect_ratio=*/false, /*shrink_only=*/false);
     plane.SyncFull();
-    // Required: the mark of this bitmap itself is refreshed too, where it is one that has pixels
-    // of that kind; callers that treat a grey image as a plane look at it.
+    // Required: the mark of this bitmap itself is refreshed too, whatever its format; it goes into
+    // the raw form, and callers that treat a grey image as a plane look at it.
     SyncFull();
 }
 

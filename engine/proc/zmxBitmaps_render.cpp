@@ -170,11 +170,11 @@ bool StretchPixels(TZmBitmap& source, const TZmRenderCall& call) {
 /// made here in its final size, has its own.
 void TZmBitmapRendering::RenderScaled(const TZmRenderCall& call) {
     const TRect visible = FindVisibleRect(call);
-    const std::int32_t width = visible.right - visible.left;
-    const std::int32_t height = visible.bottom - visible.top;
     if (visible.left >= visible.right || visible.top >= visible.bottom) {
         return;
     }
+    const std::int32_t width = visible.right - visible.left;
+    const std::int32_t height = visible.bottom - visible.top;
     const bool has_plane = FindRenderPlane(*this, call.enable_alpha) != nullptr;
     TZmVirtualClippedBitmap view(
         Self(), FindSourceRect(call, visible, Self()),

@@ -37,6 +37,12 @@ TEST(AlphaPlane, SyncFullFindsTheLastPixelOnly) {
     bitmap.AlphaFill(254);
     EXPECT_FALSE(bitmap.GetAlphaChannelRaw()->GetFull());
     EXPECT_EQ(bitmap.GetAlpha(0, 0), 254);
+    bitmap.Fill(static_cast<double>(0x00FFFFFF));
+    bitmap.SyncFull();  // an image by the bytes of its pixels
+    EXPECT_TRUE(bitmap.GetFull());
+    bitmap.SetPixels_zm24RGB(4, 2, TRGB{255, 255, 254});
+    bitmap.SyncFull();
+    EXPECT_FALSE(bitmap.GetFull());
 }
 
 TEST(AlphaPlane, MergesWithTheBackground) {
@@ -59,20 +65,14 @@ TEST(AlphaPlane, MergesWithTheBackground) {
         EXPECT_FALSE(bitmap.HasAlphaChannel());
         EXPECT_EQ(bitmap.GetPixels_zm24RGB(0, 0), (TRGB{test.result, test.result, test.result}));
     }
-}
-
-TEST(AlphaPlane, MergeTakesTheChannelsOfTheColour) {
-    TZmBitmap bitmap(2, 1, zm24RGB);
-    bitmap.Fill(0.0);
-    bitmap.AlphaFill(0);
-    bitmap.RemoveAlphaChannel(true, 0x00302010);
-    EXPECT_EQ(bitmap.GetPixels_zm24RGB(1, 0), (TRGB{0x30, 0x20, 0x10}));
-    TZmBitmap gray(2, 1, zm8g);
-    gray.Fill(9.0);
-    gray.AlphaFill(0);
-    gray.RemoveAlphaChannel(true, 0);
-    EXPECT_EQ(gray.GetPixels_zm8(0, 0), 9);
-    EXPECT_FALSE(gray.HasAlphaChannel());
+    for (const TZmPixelFormat format : {zm24RGB, zm8g}) {  // others keep their pixels
+        TZmBitmap bitmap(2, 1, format);
+        bitmap.Fill(0.0);
+        bitmap.AlphaFill(0);
+        bitmap.RemoveAlphaChannel(true, 0x00302010);
+        EXPECT_FALSE(bitmap.HasAlphaChannel());
+        EXPECT_EQ(bitmap.GetPixels(1, 0), format == zm24RGB ? (TRGB{0x30, 0x20, 0x10}) : TRGB{});
+    }
 }
 
 TEST(AlphaPlane, IsReplacedAndDetached) {

@@ -2,6 +2,7 @@
 
 #include <gtest/gtest.h>
 
+#include <array>
 #include <vector>
 
 #include "engine/bitmap/zmblend_p.h"
@@ -10,96 +11,59 @@
 namespace zm {
 namespace {
 
-struct TChannelCase {
+struct TChannelCases {
     TZmRenderOperation operation;
-    int source;
-    int dest;
-    int expected;
+    std::vector<std::array<int, 3>> values;  // source, destination, result
 };
 
 // Worked by hand from the operations' formulas.
-constexpr TChannelCase kChannelCases[] = {
-    {zmlNormal, 200, 10, 200},
-    {zmlAdd, 100, 100, 200},
-    {zmlAdd, 200, 100, 255},
-    {zmlSub, 200, 50, 150},
-    {zmlSub, 50, 200, 150},
-    {zmlDiv, 3, 200, 66},
-    {zmlDiv, 255, 255, 1},
-    {zmlDiv, 0, 77, 77},      // divides by 1
-    {zmlMul, 255, 255, 254},  // 65025 / 256
-    {zmlMul, 100, 200, 78},
-    {zmlOR, 0x3C, 0xF0, 0xFC},
-    {zmlAND, 0x3C, 0xF0, 0x30},
-    {zmlXOR, 0x3C, 0xF0, 0xCC},
-    {zmlMAX, 9, 200, 200},
-    {zmlMAX, 201, 200, 201},
-    {zmlMIN, 9, 200, 9},
-    {zmlMIN, 201, 200, 200},
-    {zmlAverage, 255, 254, 254},
-    {zmlScreen, 100, 200, 221},  // 255 - 8525 / 255 = 221.57
-    {zmlScreen, 0, 51, 51},      // the quotient is whole
-    {zmlScreen, 255, 17, 255},
-    {zmlScreen, 0, 0, 0},
-    {zmlNegation, 100, 100, 200},
-    {zmlNegation, 200, 200, 110},
-    {zmlExclusion, 100, 100, 122},
-    {zmlExclusion, 200, 200, 88},  // 144 - 312 wraps
-    {zmlOverlay, 100, 200, 189},
-    {zmlOverlay, 200, 100, 156},
-    {zmlOverlay, 255, 127, 253},
-    {zmlOverlay, 0, 128, 2},
-    {zmlHardLight, 200, 100, 189},
-    {zmlHardLight, 100, 200, 156},
-    {zmlHardLight, 128, 0, 2},
-    {zmlXFader, 100, 200, 190},  // M = 78; ((255 - 33 - 78) * 200 >> 8) + 78
-    {zmlXFader, 255, 255, 254},
-    {zmlColorEdge, 50, 200, 249},
-    {zmlColorEdge, 254, 10, 255},
-    {zmlColorEdge, 255, 0, 255},
-    {zmlColorBurn, 100, 200, 115},
-    {zmlColorBurn, 10, 100, 0},
-    {zmlColorBurn, 0, 255, 0},
-    {zmlInverseColorDodge, 50, 200, 232},
-    {zmlInverseColorDodge, 10, 255, 255},
-    {zmlInverseColorBurn, 200, 100, 115},
-    {zmlInverseColorBurn, 200, 0, 0},
-    {zmlSoftDodge, 200, 100, 185},
-    {zmlSoftDodge, 100, 120, 99},
-    {zmlSoftDodge, 255, 0, 255},
-    {zmlSoftBurn, 200, 100, 156},
-    {zmlSoftBurn, 100, 120, 94},
-    {zmlSoftBurn, 0, 255, 255},
-    {zmlReflect, 50, 200, 195},
-    {zmlReflect, 200, 200, 255},
-    {zmlReflect, 255, 0, 255},
-    {zmlGlow, 50, 200, 45},
-    {zmlGlow, 3, 255, 255},
-    {zmlFreeze, 100, 200, 225},
-    {zmlFreeze, 10, 100, 0},
-    {zmlFreeze, 0, 255, 0},
-    {zmlEat, 100, 200, 135},
-    {zmlEat, 200, 0, 0},
-    {zmlSubtractive, 200, 100, 44},
-    {zmlSubtractive, 100, 100, 0},
-    {zmlInterpolation, 85, 170, 128},   // 32 + 96: cosines of 60 and 120 degrees
-    {zmlInterpolation, 255, 255, 255},  // 128 + 128
-    {zmlInterpolation, 0, 255, 128},
-    {zmlStamp, 100, 100, 44},
-    {zmlStamp, 200, 200, 255},
-    {zmlStamp, 50, 100, 0},
+const TChannelCases kChannelCases[] = {
+    {zmlNormal, {{200, 10, 200}}},
+    {zmlAdd, {{100, 100, 200}, {200, 100, 255}}},
+    {zmlSub, {{200, 50, 150}, {50, 200, 150}}},
+    {zmlDiv, {{3, 200, 66}, {255, 255, 1}, {0, 77, 77}}},  // the last divides by 1
+    {zmlMul, {{255, 255, 254}, {100, 200, 78}}},           // 65025 / 256
+    {zmlOR, {{0x3C, 0xF0, 0xFC}}},
+    {zmlAND, {{0x3C, 0xF0, 0x30}}},
+    {zmlXOR, {{0x3C, 0xF0, 0xCC}}},
+    {zmlMAX, {{9, 200, 200}, {201, 200, 201}}},
+    {zmlMIN, {{9, 200, 9}, {201, 200, 200}}},
+    {zmlAverage, {{255, 254, 254}}},
+    // 255 - 8525 / 255 = 221.57; the second quotient is whole
+    {zmlScreen, {{100, 200, 221}, {0, 51, 51}, {255, 17, 255}, {0, 0, 0}}},
+    {zmlNegation, {{100, 100, 200}, {200, 200, 110}}},
+    {zmlExclusion, {{100, 100, 122}, {200, 200, 88}}},  // 144 - 312 wraps
+    {zmlOverlay, {{100, 200, 189}, {200, 100, 156}, {255, 127, 253}, {0, 128, 2}}},
+    {zmlHardLight, {{200, 100, 189}, {100, 200, 156}, {128, 0, 2}}},
+    {zmlXFader, {{100, 200, 190}, {255, 255, 254}}},  // M = 78; ((255 - 33 - 78) * 200 >> 8) + 78
+    {zmlColorEdge, {{50, 200, 249}, {254, 10, 255}, {255, 0, 255}}},
+    {zmlColorBurn, {{100, 200, 115}, {10, 100, 0}, {0, 255, 0}}},
+    {zmlInverseColorDodge, {{50, 200, 232}, {10, 255, 255}}},
+    {zmlInverseColorBurn, {{200, 100, 115}, {200, 0, 0}}},
+    {zmlSoftDodge, {{200, 100, 185}, {100, 120, 99}, {255, 0, 255}}},
+    {zmlSoftBurn, {{200, 100, 156}, {100, 120, 94}, {0, 255, 255}}},
+    {zmlReflect, {{50, 200, 195}, {200, 200, 255}, {255, 0, 255}}},
+    {zmlGlow, {{50, 200, 45}, {3, 255, 255}}},
+    {zmlFreeze, {{100, 200, 225}, {10, 100, 0}, {0, 255, 0}}},
+    {zmlEat, {{100, 200, 135}, {200, 0, 0}}},
+    {zmlSubtractive, {{200, 100, 44}, {100, 100, 0}}},
+    // 32 + 96, the cosines of 60 and 120 degrees; 128 + 128
+    {zmlInterpolation, {{85, 170, 128}, {255, 255, 255}, {0, 255, 128}}},
+    {zmlStamp, {{100, 100, 44}, {200, 200, 255}, {50, 100, 0}}},
 };
 
 TEST(Blend, ChannelOperationsGiveTheWorkedValues) {
-    for (const TChannelCase& sample : kChannelCases) {
-        const auto source = static_cast<std::uint8_t>(sample.source);
-        const auto dest = static_cast<std::uint8_t>(sample.dest);
-        // The other channels hold other values: each channel has to look at its own.
-        TRGB pixel{dest, 0, dest};
-        ZmBlendPixel(TRGB{source, 255, source}, pixel, sample.operation, 0);
-        EXPECT_EQ(sample.expected, pixel.b) << "operation " << int{sample.operation} << ": "
-                                            << sample.source << ", " << sample.dest;
-        EXPECT_EQ(pixel.b, pixel.r) << "operation " << int{sample.operation};
+    for (const auto& [operation, values] : kChannelCases) {
+        for (const auto& [a, b, expected] : values) {
+            const auto source = static_cast<std::uint8_t>(a);
+            const auto dest = static_cast<std::uint8_t>(b);
+            // The other channels hold other values: each channel has to look at its own.
+            TRGB pixel{dest, 0, dest};
+            ZmBlendPixel(TRGB{source, 255, source}, pixel, operation, 0);
+            EXPECT_EQ(expected, pixel.b)
+                << "operation " << int{operation} << ": " << a << ", " << b;
+            EXPECT_EQ(pixel.b, pixel.r) << "operation " << int{operation};
+        }
     }
 }
 
@@ -151,7 +115,7 @@ TEST(Blend, PixelOperationsGiveTheWorkedValues) {
 
 TEST(Blend, EveryOperationHasAWorkedValue) {
     std::vector<bool> seen(kRenderOperationCount);
-    for (const TChannelCase& sample : kChannelCases) {
+    for (const TChannelCases& sample : kChannelCases) {
         seen[sample.operation] = true;
     }
     for (const TPixelCase& sample : kPixelCases) {

@@ -7,14 +7,13 @@
 #include "engine/bitmap/zmxBitmaps.h"
 #include "engine/foundation/zmstreams.h"
 #include "engine/io/zmfiletypes.h"
+#include "tests/bitmap/place_support.h"
 #include "tests/support/testfiles.h"
 #include "tests/support/testimages.h"
 
 namespace zm::test {
 namespace {
 
-constexpr TZmPixelFormat kAllFormats[] = {zm1g,  zm8p,   zm8g,    zm16g,    zm24RGB,
-                                          zm32f, zmCMYK, zm48RGB, zmCIELab, zm32RGB};
 constexpr std::int32_t kMin = std::numeric_limits<std::int32_t>::min();
 constexpr std::int32_t kMax = std::numeric_limits<std::int32_t>::max();
 
@@ -43,6 +42,21 @@ TValues LineOf(TZmBitmap& bitmap, bool is_alpha) {
     return values;
 }
 
+/// Changes a row and a column of the values and expects others; a 9 has the alpha `fill_alpha`.
+template <typename TChange>
+void ExpectLine(const TValues& before, const TValues& after, int fill_alpha, TChange change) {
+    TValues alphas;
+    for (const int value : after) {
+        alphas.push_back(value == 9 ? fill_alpha : 2 * value + 1);
+    }
+    for (const bool is_column : {false, true}) {
+        const auto bitmap = MakeLine(before, is_column);
+        change(*bitmap, is_column);
+        EXPECT_EQ(LineOf(*bitmap, false), after);
+        EXPECT_EQ(LineOf(*bitmap, true), alphas);
+    }
+}
+
 TEST(CanvasResize, AlignsThePicture) {
     struct TCase {
         std::int32_t new_size;
@@ -60,19 +74,13 @@ TEST(CanvasResize, AlignsThePicture) {
         {5, 2, {1, 2, 3, 4, 5}},
     };
     for (const TCase& test : kCases) {
-        TValues alphas;
-        for (const int value : test.values) {
-            alphas.push_back(value == 9 ? 44 : 2 * value + 1);
-        }
-        for (const bool is_column : {false, true}) {
-            const auto bitmap = MakeLine({1, 2, 3, 4, 5}, is_column);
+        SCOPED_TRACE(test.new_size);
+        ExpectLine({1, 2, 3, 4, 5}, test.values, 44, [&](TZmBitmap& bitmap, bool is_column) {
             const auto horiz = static_cast<TZmHorizAlign>(is_column ? 0 : test.align);
             const auto vert = static_cast<TZmVertAlign>(is_column ? test.align : 0);
-            ASSERT_TRUE(bitmap->Resize(is_column ? 1 : test.new_size, is_column ? test.new_size : 1,
-                                       9.0, 44, horiz, vert));
-            EXPECT_EQ(LineOf(*bitmap, false), test.values) << test.new_size;
-            EXPECT_EQ(LineOf(*bitmap, true), alphas) << test.new_size;
-        }
+            EXPECT_TRUE(bitmap.Resize(is_column ? 1 : test.new_size, is_column ? test.new_size : 1,
+                                      9.0, 44, horiz, vert));
+        });
     }
 }
 
@@ -87,30 +95,11 @@ TEST(CanvasResize, AddsToTheSides) {
         {0, 0, {1, 2, 3}},
     };
     for (const TCase& test : kCases) {
-        TValues alphas;
-        for (const int value : test.values) {
-            alphas.push_back(value == 9 ? 0 : 2 * value + 1);
-        }
-        for (const bool is_column : {false, true}) {
-            const auto bitmap = MakeLine({1, 2, 3}, is_column);
-            ASSERT_TRUE(is_column ? bitmap->Resize(0, test.before, 0, test.after, 9.0, 0)
-                                  : bitmap->Resize(test.before, 0, test.after, 0, 9.0, 0));
-            EXPECT_EQ(LineOf(*bitmap, false), test.values) << test.before << ", " << test.after;
-            EXPECT_EQ(LineOf(*bitmap, true), alphas);
-        }
-    }
-}
-
-TEST(CanvasResize, EqualsACropInAllFormats) {
-    for (const TZmPixelFormat format : kAllFormats) {
-        const auto bitmap = MakeNoise(format, 21, 9, 4);
-        AddNoiseAlpha(*bitmap, 5);
-        TZmBitmap expected(*bitmap);
-        // A value that means the same byte, word or colour to both.
-        ASSERT_TRUE(expected.Crop(-4, 2, 25, 6, 0x21));
-        ASSERT_TRUE(bitmap->Resize(30, 5, 33.0, 255, zmhCenter, zmvCenter));
-        ExpectSamePixels(expected, *bitmap);
-        ExpectSameAlpha(expected, *bitmap);
+        SCOPED_TRACE(::testing::Message() << test.before << ", " << test.after);
+        ExpectLine({1, 2, 3}, test.values, 0, [&](TZmBitmap& bitmap, bool is_column) {
+            EXPECT_TRUE(is_column ? bitmap.Resize(0, test.before, 0, test.after, 9.0, 0)
+                                  : bitmap.Resize(test.before, 0, test.after, 0, 9.0, 0));
+        });
     }
 }
 
@@ -175,32 +164,11 @@ TEST(MoveRegion, MovesPixelsAndAlpha) {
         {3, 2, 0, true, {1, 2, 3, 4, 5}},    {5, 8, 0, true, {1, 2, 3, 4, 5}},
     };
     for (const TCase& test : kCases) {
-        TValues alphas;
-        for (const int value : test.values) {
-            alphas.push_back(value == 9 ? 77 : 2 * value + 1);
-        }
-        for (const bool is_column : {false, true}) {
-            const auto bitmap = MakeLine({1, 2, 3, 4, 5}, is_column);
-            if (is_column) {
-                bitmap->MoveRegion(0, test.x1, 0, test.x2, 0, test.dst, 9.0, 77, test.clear);
-            } else {
-                bitmap->MoveRegion(test.x1, 0, test.x2, 0, test.dst, 0, 9.0, 77, test.clear);
-            }
-            EXPECT_EQ(LineOf(*bitmap, false), test.values) << test.x1 << " to " << test.dst;
-            EXPECT_EQ(LineOf(*bitmap, true), alphas) << test.x1 << " to " << test.dst;
-        }
-    }
-}
-
-TEST(MoveRegion, WorksInAllFormats) {
-    for (const TZmPixelFormat format : kAllFormats) {
-        const auto bitmap = MakeNoise(format, 21, 9, 6);
-        TZmBitmap expected(*bitmap);
-        expected.FillRect(3, 1, 14, 6, 0x40);
-        bitmap->CopyRectTo(&expected, 3, 1, 8, 3, 12, 6, false);
-        bitmap->MoveRegion(3, 1, 14, 6, 8, 3, 0x40, 0, true);
-        ExpectSamePixels(expected, *bitmap);
-        EXPECT_FALSE(bitmap->HasAlphaChannel());
+        SCOPED_TRACE(::testing::Message() << test.x1 << " to " << test.dst);
+        ExpectLine({1, 2, 3, 4, 5}, test.values, 77, [&](TZmBitmap& bitmap, bool is_column) {
+            is_column ? bitmap.MoveRegion(0, test.x1, 0, test.x2, 0, test.dst, 9.0, 77, test.clear)
+                      : bitmap.MoveRegion(test.x1, 0, test.x2, 0, test.dst, 0, 9.0, 77, test.clear);
+        });
     }
 }
 
@@ -303,10 +271,6 @@ TEST(Construction, FromAFileLoadsIt) {
     TZmBitmap loaded(folder.Name("a.bmp"), nullptr);
     ExpectSamePixels(*saved, loaded);
     EXPECT_EQ(loaded.GetFilename(), folder.Name("a.bmp"));
-    // A wrong extension is no hindrance.
-    std::filesystem::copy_file(folder.File("a.bmp"), folder.File("b.png"));
-    TZmBitmap renamed(folder.Name("b.png"), nullptr);
-    ExpectSamePixels(*saved, renamed);
     WriteFileBytes(folder.File("c.bmp"), {1, 2, 3});
     TZmBitmap broken(folder.Name("c.bmp"), nullptr);
     EXPECT_TRUE(broken.IsEmpty());

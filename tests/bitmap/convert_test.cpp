@@ -1,21 +1,19 @@
 #include <gtest/gtest.h>
 
+#include <algorithm>
 #include <cmath>
 #include <cstring>
+#include <fstream>
 #include <limits>
+#include <sstream>
 
-#include "engine/bitmap/zmbitmapmemory_p.h"
 #include "engine/bitmap/zmonebit_p.h"
 #include "engine/bitmap/zmrowconvert.h"
-#include "engine/bitmap/zmxBitmaps.h"
-#include "engine/foundation/zmsettings.h"
+#include "tests/bitmap/place_support.h"
 #include "tests/support/testimages.h"
 
 namespace zm::test {
 namespace {
-
-constexpr TZmPixelFormat kAllFormats[] = {zm1g,  zm8p,   zm8g,    zm16g,    zm24RGB,
-                                          zm32f, zmCMYK, zm48RGB, zmCIELab, zm32RGB};
 
 /// Sets the channels of a pixel from a list in memory order.
 void SetChannels(TZmBitmap& bitmap, const std::vector<double>& values) {
@@ -38,156 +36,72 @@ void SetChannels(TZmBitmap& bitmap, const std::vector<double>& values) {
 }
 
 struct TCell {
-    TZmPixelFormat to;
-    std::vector<double> expected;  ///< channels in memory order; for zm8p blue, green, red
+    TZmPixelFormat format;
+    std::vector<double> channels;
 };
 
-struct TMatrixRow {
-    TZmPixelFormat from;
-    std::vector<double> source;
+// Every cell of the matrix by a value that is worked out by hand from its formula: a source pixel,
+// then what it becomes in each other format, channels in memory order. zm8p stands with blue,
+// green and red of its entry; as the source it is the index of the colour that the test sets. The
+// colour is red 200, green 100, blue 50 where the source can hold it: grey (4200 + 7100 + 400) /
+// 100 = 117, 16-bit grey 30184650 / 1000, float (42.52 + 71.52 + 3.61) / 255, inks against K = 200.
+constexpr const char* kMatrix[] = {
+    "zm1g 1  zm8p 255 255 255  zm8g 255  zm16g 65535  zm24RGB 255 255 255  zm32f 1"
+    " zmCMYK 255 255 255 255  zm48RGB 65535 65535 65535  zmCIELab 255 0 0  zm32RGB 255 255 255 255",
+    "zm1g 0  zm8p 0 0 0  zm8g 0  zm16g 0  zm24RGB 0 0 0  zm32f 0"
+    " zmCMYK 255 255 255 0  zm48RGB 0 0 0  zmCIELab 0 0 0  zm32RGB 0 0 0 255",
+    "zm8p 3  zm1g 1  zm8g 117  zm16g 30184  zm24RGB 50 100 200  zm32f 0.4613725490196"
+    " zmCMYK 255 128 64 200  zm48RGB 51400 25700 12850  zmCIELab 136 36 45  zm32RGB 50 100 200 255",
+    "zm8g 100  zm1g 1  zm8p 100 100 100  zm16g 25700  zm24RGB 100 100 100  zm32f 0.3921568627451"
+    " zmCMYK 255 255 255 100  zm48RGB 25700 25700 25700  zmCIELab 108 0 0  zm32RGB 100 100 100 255",
+    // 64 7F in bytes.
+    "zm16g 25727  zm1g 1  zm8p 100 100 100  zm8g 100  zm24RGB 100 100 100  zm32f 0.3925688563363"
+    " zmCMYK 255 255 255 100  zm48RGB 25727 25727 25727  zmCIELab 108 0 0  zm32RGB 100 100 100 255",
+    "zm24RGB 50 100 200  zm1g 1  zm8p 50 100 200  zm8g 117  zm16g 30184  zm32f 0.4613725490196"
+    " zmCMYK 255 128 64 200  zm48RGB 51400 25700 12850  zmCIELab 136 36 45  zm32RGB 50 100 200 255",
+    // White: 255 * 257000 / 1000.
+    "zm24RGB 255 255 255  zm1g 1  zm8p 255 255 255  zm8g 255  zm16g 65535  zm32f 1"
+    " zmCMYK 255 255 255 255  zm48RGB 65535 65535 65535  zmCIELab 255 0 0  zm32RGB 255 255 255 255",
+    "zm32f 0.5  zm1g 1  zm8p 127 127 127  zm8g 127  zm16g 32767  zm24RGB 127 127 127"
+    " zmCMYK 255 255 255 127  zm48RGB 32767 32767 32767  zmCIELab 135 0 0  zm32RGB 127 127 127 255",
+    // 200 * 255 / 255, 200 * 128 / 255 = 100, 200 * 64 / 255 = 50
+    "zmCMYK 255 128 64 200  zm1g 1  zm8p 50 100 200  zm8g 117  zm16g 30184  zm24RGB 50 100 200"
+    " zm32f 0.4613725490196  zm48RGB 51400 25700 12850  zmCIELab 136 36 45  zm32RGB 50 100 200 255",
+    // High bytes 200, 100, 50. Grey (10908460 + 18253513 + 969600) / 1000, float by words.
+    "zm48RGB 51455 25601 12928  zm1g 1  zm8p 50 100 200  zm8g 117  zm16g 30131  zm24RGB 50 100 200"
+    " zm32f 0.4623555422794  zmCMYK 255 128 64 200  zmCIELab 136 36 45  zm32RGB 50 100 200 255",
+    // Red 199, green 100, blue 50: grey 11679 / 100, 30130166 / 1000, 117.4374 / 255.
+    "zmCIELab 136 36 45  zm1g 1  zm8p 50 100 199  zm8g 116  zm16g 30130  zm24RGB 50 100 199"
+    " zm32f 0.4605388235294  zmCMYK 255 129 65 199  zm48RGB 51143 25700 12850"
+    " zm32RGB 50 100 199 255",
+    "zm32RGB 50 100 200 9  zm1g 1  zm8p 50 100 200  zm8g 117  zm16g 30184  zm24RGB 50 100 200"
+    " zm32f 0.4613725490196  zmCMYK 255 128 64 200  zm48RGB 51400 25700 12850"
+    " zmCIELab 136 36 45"};
+
+/// The source's pixel first.
+std::vector<TCell> CellsOf(const char* row) {
     std::vector<TCell> cells;
-};
-
-// Every cell of the matrix by a value that is worked out by hand from its formula. The colour is
-// red 200, green 100, blue 50 where the source can hold it: grey (4200 + 7100 + 400) / 100 = 117,
-// 16-bit grey 30184650 / 1000, float (42.52 + 71.52 + 3.61) / 255, inks against K = 200.
-const std::vector<TMatrixRow>& Matrix() {
-    static const std::vector<TMatrixRow> matrix = {
-        {zm1g,
-         {1},
-         {{zm8p, {255, 255, 255}},
-          {zm8g, {255}},
-          {zm16g, {65535}},
-          {zm24RGB, {255, 255, 255}},
-          {zm32f, {1}},
-          {zmCMYK, {255, 255, 255, 255}},
-          {zm48RGB, {65535, 65535, 65535}},
-          {zmCIELab, {255, 0, 0}},
-          {zm32RGB, {255, 255, 255, 255}}}},
-        {zm1g,
-         {0},
-         {{zm8p, {0, 0, 0}},
-          {zm8g, {0}},
-          {zm16g, {0}},
-          {zm24RGB, {0, 0, 0}},
-          {zm32f, {0}},
-          {zmCMYK, {255, 255, 255, 0}},
-          {zm48RGB, {0, 0, 0}},
-          {zmCIELab, {0, 0, 0}},
-          {zm32RGB, {0, 0, 0, 255}}}},
-        {zm8p,
-         {3},
-         {{zm1g, {1}},
-          {zm8g, {117}},
-          {zm16g, {30184}},
-          {zm24RGB, {50, 100, 200}},
-          {zm32f, {0.4613725490196}},
-          {zmCMYK, {255, 128, 64, 200}},
-          {zm48RGB, {51400, 25700, 12850}},
-          {zmCIELab, {136, 36, 45}},
-          {zm32RGB, {50, 100, 200, 255}}}},
-        {zm8g,
-         {100},
-         {{zm1g, {1}},
-          {zm8p, {100, 100, 100}},
-          {zm16g, {25700}},
-          {zm24RGB, {100, 100, 100}},
-          {zm32f, {0.3921568627451}},
-          {zmCMYK, {255, 255, 255, 100}},
-          {zm48RGB, {25700, 25700, 25700}},
-          {zmCIELab, {108, 0, 0}},
-          {zm32RGB, {100, 100, 100, 255}}}},
-        {zm16g,
-         {25727},
-         {{zm1g, {1}},
-          {zm8p, {100, 100, 100}},
-          {zm8g, {100}},  // 64 7F
-          {zm24RGB, {100, 100, 100}},
-          {zm32f, {0.3925688563363}},
-          {zmCMYK, {255, 255, 255, 100}},
-          {zm48RGB, {25727, 25727, 25727}},
-          {zmCIELab, {108, 0, 0}},
-          {zm32RGB, {100, 100, 100, 255}}}},
-        {zm24RGB,
-         {50, 100, 200},
-         {{zm1g, {1}},
-          {zm8p, {50, 100, 200}},
-          {zm8g, {117}},
-          {zm16g, {30184}},
-          {zm32f, {0.4613725490196}},
-          {zmCMYK, {255, 128, 64, 200}},
-          {zm48RGB, {51400, 25700, 12850}},
-          {zmCIELab, {136, 36, 45}},
-          {zm32RGB, {50, 100, 200, 255}}}},
-        {zm32f,
-         {0.5},
-         {{zm1g, {1}},
-          {zm8p, {127, 127, 127}},
-          {zm8g, {127}},
-          {zm16g, {32767}},
-          {zm24RGB, {127, 127, 127}},
-          {zmCMYK, {255, 255, 255, 127}},
-          {zm48RGB, {32767, 32767, 32767}},
-          {zmCIELab, {135, 0, 0}},
-          {zm32RGB, {127, 127, 127, 255}}}},
-        // 200 * 255 / 255, 200 * 128 / 255 = 100, 200 * 64 / 255 = 50
-        {zmCMYK,
-         {255, 128, 64, 200},
-         {{zm1g, {1}},
-          {zm8p, {50, 100, 200}},
-          {zm8g, {117}},
-          {zm16g, {30184}},
-          {zm24RGB, {50, 100, 200}},
-          {zm32f, {0.4613725490196}},
-          {zm48RGB, {51400, 25700, 12850}},
-          {zmCIELab, {136, 36, 45}},
-          {zm32RGB, {50, 100, 200, 255}}}},
-        // High bytes 200, 100, 50. Grey (10908460 + 18253513 + 969600) / 1000, float by words.
-        {zm48RGB,
-         {51455, 25601, 12928},
-         {{zm1g, {1}},
-          {zm8p, {50, 100, 200}},
-          {zm8g, {117}},
-          {zm16g, {30131}},
-          {zm24RGB, {50, 100, 200}},
-          {zm32f, {0.4623555422794}},
-          {zmCMYK, {255, 128, 64, 200}},
-          {zmCIELab, {136, 36, 45}},
-          {zm32RGB, {50, 100, 200, 255}}}},
-        // Red 199, green 100, blue 50: grey 11679 / 100, 30130166 / 1000, 117.4374 / 255.
-        {zmCIELab,
-         {136, 36, 45},
-         {{zm1g, {1}},
-          {zm8p, {50, 100, 199}},
-          {zm8g, {116}},
-          {zm16g, {30130}},
-          {zm24RGB, {50, 100, 199}},
-          {zm32f, {0.4605388235294}},
-          {zmCMYK, {255, 129, 65, 199}},
-          {zm48RGB, {51143, 25700, 12850}},
-          {zm32RGB, {50, 100, 199, 255}}}},
-        {zm32RGB,
-         {50, 100, 200, 9},
-         {{zm1g, {1}},
-          {zm8p, {50, 100, 200}},
-          {zm8g, {117}},
-          {zm16g, {30184}},
-          {zm24RGB, {50, 100, 200}},
-          {zm32f, {0.4613725490196}},
-          {zmCMYK, {255, 128, 64, 200}},
-          {zm48RGB, {51400, 25700, 12850}},
-          {zmCIELab, {136, 36, 45}}}},
-    };
-    return matrix;
+    std::istringstream words(row);
+    for (std::string word; words >> word;) {
+        if (word[0] == 'z') {
+            const auto* const format =
+                std::find_if(std::begin(kAllFormats), std::end(kAllFormats),
+                             [&word](auto each) { return word == PixelFormatInfo(each).name; });
+            cells.push_back({*format, {}});
+        } else {
+            cells.back().channels.push_back(std::stod(word));
+        }
+    }
+    return cells;
 }
 
-void MakeSource(TZmBitmap& bitmap, const TMatrixRow& row) {
-    ASSERT_TRUE(bitmap.Allocate(1, 1, row.from));
+void MakeSource(TZmBitmap& bitmap, const TCell& cell) {
+    ASSERT_TRUE(bitmap.Allocate(1, 1, cell.format));
     bitmap.Fill(0.0);
-    if (row.from == zm8p) {
+    if (cell.format == zm8p) {
         bitmap.SetPalette(3, TRGB{50, 100, 200});
     }
-    SetChannels(bitmap, row.source);
+    SetChannels(bitmap, cell.channels);
 }
 
 void ExpectChannels(TZmBitmap& bitmap, const std::vector<double>& expected) {
@@ -206,22 +120,23 @@ void ExpectChannels(TZmBitmap& bitmap, const std::vector<double>& expected) {
 }
 
 TEST(ConversionMatrix, GivesTheStatedValueInEveryCell) {
-    for (const TMatrixRow& row : Matrix()) {
-        ASSERT_EQ(row.cells.size(), std::size(kAllFormats) - 1);
-        for (const TCell& cell : row.cells) {
-            SCOPED_TRACE(std::string(PixelFormatInfo(row.from).name) + " to " +
-                         PixelFormatInfo(cell.to).name);
+    for (const char* const row : kMatrix) {
+        const std::vector<TCell> cells = CellsOf(row);
+        ASSERT_EQ(cells.size(), std::size(kAllFormats)) << row;
+        for (std::size_t i = 1; i < cells.size(); ++i) {
+            SCOPED_TRACE(std::string(PixelFormatInfo(cells[0].format).name) + " to " +
+                         PixelFormatInfo(cells[i].format).name);
             TZmBitmap source;
-            MakeSource(source, row);
-            TZmBitmap dest(1, 1, cell.to);
+            MakeSource(source, cells[0]);
+            TZmBitmap dest(1, 1, cells[i].format);
             dest.SetDefaultDitherMethod(zmOrdered);
             dest.CopyAndConvertFormat(&source);
-            ExpectChannels(dest, cell.expected);
+            ExpectChannels(dest, cells[i].channels);
             TZmBitmap property;
-            MakeSource(property, row);
+            MakeSource(property, cells[0]);
             property.SetDefaultDitherMethod(zmOrdered);
-            EXPECT_TRUE(property.SetPixelFormat(cell.to));
-            ExpectChannels(property, cell.expected);
+            EXPECT_TRUE(property.SetPixelFormat(cells[i].format));
+            ExpectChannels(property, cells[i].channels);
         }
     }
 }
@@ -300,16 +215,118 @@ TEST(ConversionMatrix, TakesEveryRowAlone) {
     }
 }
 
-// Grey.
+/// A provider of a picture that it does not have.
+class TNoRows : public TZmVirtualBitmapProvider {
+public:
+    std::uint8_t* GetRow(TZmBitmap*, std::int32_t, std::int32_t, std::int32_t) override {
+        return nullptr;
+    }
+};
 
-TEST(Gray, OfWhiteIsTheTopOfTheScale) {
-    TZmBitmap white(1, 1, zm24RGB);
-    white.Fill(static_cast<double>(0x00FFFFFF));
-    TZmBitmap gray(1, 1, zm16g);
-    gray.CopyAndConvertFormat(&white);
-    EXPECT_EQ(gray.GetPixels_zm16g(0, 0), 65535);  // 255 * 257000 / 1000
-    EXPECT_EQ(GrayByCoef(TRGB{255, 255, 255}, TZmRowContext{}), 255);
+TEST(ConversionMatrix, LeavesPixelsOfWhichNoRowIsToBeHad) {
+    for (const TZmPixelFormat from : {zm8p, zm8g, zm16g, zm24RGB, zm32f, zm48RGB}) {
+        for (const TZmPixelFormat to : {zm1g, zm24RGB}) {
+            for (const TZmDitherMethod method : {zmOrdered, zmThreshold}) {
+                TNoRows no_rows;
+                TZmBitmap source;
+                source.SetVirtualProvider(&no_rows);
+                ASSERT_TRUE(source.Allocate(20, 3, from));
+                const auto dest = MakeNoise(to, 20, 3, 1);
+                TZmBitmap before(*dest);
+                dest->SetDefaultDitherMethod(method);
+                dest->SetWhiteValue(100);
+                dest->CopyAndConvertFormat(&source);
+                if (from != zm48RGB || to != zm1g) {  // which goes through a copy of black
+                    ExpectSamePixels(before, *dest);
+                }
+                EXPECT_EQ(source.IsGrayScale(), from != zm24RGB && from != zm48RGB);
+            }
+        }
+    }
 }
+
+TEST(LargeConversion, GivesTheBytesOfItsRows) {
+    // So large that rows go past the caches, into rows that begin anywhere in a line of 64 bytes.
+    constexpr std::pair<TZmPixelFormat, TZmPixelFormat> kPairs[] = {
+        {zm8g, zm24RGB}, {zm24RGB, zm32RGB}, {zm24RGB, zm48RGB}, {zm32RGB, zm24RGB}};
+    for (const auto& [from, to] : kPairs) {
+        const auto noise = MakeNoise(from, 1701, 1, 5);
+        TZmBitmap source(1701, 1700, from);
+        for (std::int32_t y = 0; y < 1700; ++y) {
+            noise->CopyRectTo(&source, 0, 0, 0, y, 1701, 1, false);
+            *source.GetScanLine(y) = static_cast<std::uint8_t>(y);
+        }
+        const auto row_bytes =
+            static_cast<std::size_t>(CalcRowLen(1701, PixelFormatInfo(to).bit_count, 32).value());
+        std::vector<std::uint8_t> memory(row_bytes * 1700 + 128, 0xC3);
+        TZmBitmap dest;
+        dest.EncapsulateMemory(memory.data() + 60, 1701, 1700, to, true, zmboBOTTOMLEFT);
+        dest.CopyAndConvertFormat(&source);
+        std::vector<std::uint8_t> row(row_bytes, 0xC3);
+        for (std::int32_t y = 0; y < 1700; ++y) {
+            FindPlainRowFunction(from, to)(source.GetScanLine(y), row.data(), 1701,
+                                           TZmRowContext{});
+            ASSERT_EQ(std::memcmp(row.data(), dest.GetScanLine(y), row_bytes), 0)
+                << PixelFormatInfo(from).name << " row " << y;
+        }
+        EXPECT_EQ(memory[59], 0xC3);
+        EXPECT_EQ(memory[60 + row_bytes * 1700], 0xC3);
+    }
+}
+
+/// Anonymous memory of this process in bytes; nothing where the system does not tell.
+std::optional<std::int64_t> AnonymousBytes() {
+    std::ifstream status("/proc/self/status");
+    for (std::string line; std::getline(status, line);) {
+        if (line.rfind("RssAnon:", 0) == 0) {
+            return std::stoll(line.substr(8)) * 1024;
+        }
+    }
+    return std::nullopt;
+}
+
+/// Looks at the process's memory in the middle of conversions.
+class TMemoryWatch : public TZmCMYKTransform {
+public:
+    void Transform(const std::uint16_t*, std::uint16_t* colors, std::int32_t count) const override {
+        std::fill_n(colors, 3 * count, std::uint16_t{65535});
+        if (calls_++ % 1000 == 0) {
+            most_ = std::max(most_, AnonymousBytes().value_or(0));
+        }
+    }
+    std::int64_t Most() const { return most_; }
+
+private:
+    mutable std::int64_t most_ = 0;
+    mutable std::int64_t calls_ = 0;
+};
+
+TEST(LargeConversion, OnDiskTakesConstantMemory) {
+    if (!AnonymousBytes().has_value()) {
+        GTEST_SKIP() << "this system does not tell";
+    }
+#ifdef __SANITIZE_THREAD__
+    GTEST_SKIP() << "the sanitizer keeps a shadow of what was read";
+#endif
+    // Through zm24RGB to grey: 24 MB, 18 MB and 6 MB, each of which would show.
+    const TForcedPlace on_disk(kInFile, zmCMYK, 4000, 1500);
+    TZmBitmap bitmap(4000, 1500, zmCMYK);
+    TZmBitmap wide(4000, 1500, zm32RGB);
+    ASSERT_EQ(bitmap.GetLocation(), zmFile);
+    const std::int64_t before = *AnonymousBytes();
+    const TMemoryWatch watch;
+    SetCMYKTransform(&watch);
+    wide.CopyAndConvertFormat(&bitmap);
+    EXPECT_TRUE(bitmap.SetPixelFormat(zm8g));
+    SetCMYKTransform(nullptr);
+    EXPECT_EQ(bitmap.GetLocation(), zmFile);
+    EXPECT_EQ(bitmap.GetPixels_zm8(3999, 1499), 255);
+    EXPECT_GT(watch.Most(), 0);
+    EXPECT_LT(watch.Most() - before, 4 << 20);
+    EXPECT_LT(*AnonymousBytes() - before, 4 << 20);
+}
+
+// Grey.
 
 TEST(Gray, TakesItsWeightsFromTheSettings) {
     struct TCase {
@@ -323,18 +340,19 @@ TEST(Gray, TakesItsWeightsFromTheSettings) {
                                 {2000000000, 0, 0, 0}};  // 4000000000: low 8 bits 0
     TZmZalmoGlobalSettings& settings = ZmGlobalSettings();
     for (const TCase& test : kCases) {
-        settings.fRedToGrayCoef = test.red;
-        settings.fGreenToGrayCoef = test.green;
-        settings.fBlueToGrayCoef = test.blue;
+        const TSettingGuard red(settings.fRedToGrayCoef, test.red);
+        const TSettingGuard green(settings.fGreenToGrayCoef, test.green);
+        const TSettingGuard blue(settings.fBlueToGrayCoef, test.blue);
         TZmBitmap color(3, 1, zm24RGB);
         color.Fill(static_cast<double>(0x003264C8));
         TZmBitmap gray(3, 1, zm8g);
         gray.CopyAndConvertFormat(&color);
         EXPECT_EQ(gray.GetPixels_zm8(2, 0), test.gray);
     }
-    settings.fRedToGrayCoef = 21;
-    settings.fGreenToGrayCoef = 71;
-    settings.fBlueToGrayCoef = 8;
+    // 255 * 8 / 100, 255 * 71 / 100 and 255 * 21 / 100, each rounded down.
+    EXPECT_EQ(GrayByCoef(TRGB{255, 0, 0}, TZmRowContext{}), 20);
+    EXPECT_EQ(GrayByCoef(TRGB{0, 255, 0}, TZmRowContext{}), 181);
+    EXPECT_EQ(GrayByCoef(TRGB{0, 0, 255}, TZmRowContext{}), 53);
 }
 
 TEST(GrayRange, StretchesOnceAndIsUsedUp) {
@@ -563,10 +581,9 @@ TEST(Inks, GoThroughTheColourTransformWhenSet) {
     SetCMYKTransform(&transform);
     TZmBitmap rgb(600, 2, zm24RGB);
     rgb.CopyAndConvertFormat(inks.get());
-    ZmGlobalSettings().fUseCMYKProfile = false;
+    const TSettingGuard no_profile(ZmGlobalSettings().fUseCMYKProfile, false);
     TZmBitmap plain(600, 2, zm24RGB);
     plain.CopyAndConvertFormat(inks.get());
-    ZmGlobalSettings().fUseCMYKProfile = true;
     SetCMYKTransform(nullptr);
     for (std::int32_t x = 0; x < 600; ++x) {
         const TCMYK ink = inks->GetPixels_zmCMYK(x, 1);
@@ -612,15 +629,12 @@ TEST(PixelFormatProperty, KeepsThePlaneAndSurvivesAFullHeap) {
     const auto bitmap = MakeNoise(zmCMYK, 40, 30, 1);
     AddNoiseAlpha(*bitmap, 2);
     TZmBitmap before(*bitmap);
-    ZmGlobalSettings().fAutoLocateOnDisk = false;
-    ZmGlobalSettings().fAutoFragmentBitmap = false;
-    for (const std::int64_t limit : {100, 40 * 30 * 2}) {
-        SetLargestBitmapBlock(limit);  // no room for the goal; room for it but not for 24 bits
-        EXPECT_FALSE(bitmap->SetPixelFormat(limit == 100 ? zm24RGB : zm8g));
+    const TSettingGuard no_disk(ZmGlobalSettings().fAutoLocateOnDisk, false);
+    const TSettingGuard no_fragments(ZmGlobalSettings().fAutoFragmentBitmap, false);
+    for (const std::int64_t bytes : {100, 40 * 30 * 2}) {
+        const TBlockLimit limit(bytes);  // no room for the goal; room for it but not for 24 bits
+        EXPECT_FALSE(bitmap->SetPixelFormat(bytes == 100 ? zm24RGB : zm8g));
     }
-    SetLargestBitmapBlock(-1);
-    ZmGlobalSettings().fAutoLocateOnDisk = true;
-    ZmGlobalSettings().fAutoFragmentBitmap = true;
     ExpectSamePixels(before, *bitmap);
     ExpectSameAlpha(before, *bitmap);
     EXPECT_TRUE(bitmap->SetPixelFormat(zm8g));

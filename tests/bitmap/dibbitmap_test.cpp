@@ -148,68 +148,63 @@ bool Take(TZmBitmap& bitmap, const std::vector<std::uint8_t>& dib) {
     return bitmap.CopyFromDIB(dib.data(), static_cast<std::int64_t>(dib.size()));
 }
 
-TEST(Dib, TakesColoursBottomUpAndTopDown) {
-    std::vector<std::uint8_t> dib = Header(40, 1, 2, 24);
-    Append(dib, {0, 0, 255, 0, 0, 255, 0, 0});  // red below green
-    TZmBitmap bitmap;
-    ASSERT_TRUE(Take(bitmap, dib));
-    EXPECT_EQ(bitmap.GetPixelFormat(), zm24RGB);
-    EXPECT_EQ(bitmap.GetPixels_zm24RGB(0, 0), kGreen);
-    EXPECT_EQ(bitmap.GetPixels_zm24RGB(0, 1), kRed);
-    PutU32LE(&dib[8], static_cast<std::uint32_t>(-2));
-    ASSERT_TRUE(Take(bitmap, dib));
-    EXPECT_EQ(bitmap.GetPixels_zm24RGB(0, 0), kRed);
-}
-
-TEST(Dib, TakesThePaletteDepths) {
-    std::vector<std::uint8_t> bits = Header(40, 3, 1, 1);
-    Append(bits, {255, 255, 255, 0, 0, 0, 0, 0});  // white is 0
-    Append(bits, {0xA0, 0, 0, 0});                 // 1 0 1
-    TZmBitmap bitmap;
-    ASSERT_TRUE(Take(bitmap, bits));
-    EXPECT_EQ(bitmap.GetPixelFormat(), zm1g);
-    EXPECT_FALSE(bitmap.GetPixels_zm1g(0, 0));
-    EXPECT_TRUE(bitmap.GetPixels_zm1g(1, 0));
-    bits[42] = 254;  // a palette of other colours
-    ASSERT_TRUE(Take(bitmap, bits));
-    EXPECT_EQ(bitmap.GetPixelFormat(), zm24RGB);
-    EXPECT_EQ(bitmap.GetPixels_zm24RGB(1, 0), (TRGB{255, 255, 254}));
-
-    std::vector<std::uint8_t> nibbles = Header(40, 3, 1, 4);
-    PutU32LE(&nibbles[32], 2);  // two colours of sixteen; the others are black
-    Append(nibbles, {1, 2, 3, 0, 4, 5, 6, 0, 0x10, 0xF0, 0, 0});
-    ASSERT_TRUE(Take(bitmap, nibbles));
-    EXPECT_EQ(bitmap.GetPixels_zm24RGB(0, 0), (TRGB{4, 5, 6}));
-    EXPECT_EQ(bitmap.GetPixels_zm24RGB(1, 0), (TRGB{1, 2, 3}));
-    EXPECT_EQ(bitmap.GetPixels_zm24RGB(2, 0), TRGB{});
-
-    std::vector<std::uint8_t> core = {12, 0, 0, 0, 1, 0, 1, 0, 1, 0, 1, 0};
-    Append(core, {0, 0, 255, 0, 255, 0, 0x80, 0, 0, 0});  // entries of three bytes
-    ASSERT_TRUE(Take(bitmap, core));
-    EXPECT_EQ(bitmap.GetPixels_zm24RGB(0, 0), kGreen);
-}
-
-TEST(Dib, TakesMasks) {
-    std::vector<std::uint8_t> dib = Header(40, 2, 1, 16);
-    Append(dib, {0xFF, 0x7F, 0x00, 0x7C});  // 5-5-5: white, red
-    TZmBitmap bitmap;
-    ASSERT_TRUE(Take(bitmap, dib));
-    EXPECT_EQ(bitmap.GetPixels_zm24RGB(0, 0), (TRGB{255, 255, 255}));
-    EXPECT_EQ(bitmap.GetPixels_zm24RGB(1, 0), kRed);
-
-    dib = Header(40, 2, 1, 16, 3);  // 5-6-5, the masks behind the header
-    Append(dib, {0, 0xF8, 0, 0, 0xE0, 0x07, 0, 0, 0x1F, 0, 0, 0});
-    Append(dib, {0x00, 0x04, 0x10, 0x00});  // green 32 of 63, blue 16 of 31
-    ASSERT_TRUE(Take(bitmap, dib));
-    EXPECT_EQ(bitmap.GetPixels_zm24RGB(0, 0), (TRGB{0, 130, 0}));  // 32 * 255 / 63 = 129.5
-    EXPECT_EQ(bitmap.GetPixels_zm24RGB(1, 0), (TRGB{132, 0, 0}));  // 16 * 255 / 31 = 131.6
-
-    dib = Header(40, 1, 1, 32, 3);  // three masks, not four
-    Append(dib, {0xFF, 0, 0, 0, 0, 0xFF, 0, 0, 0, 0, 0xFF, 0});
-    Append(dib, {1, 2, 3, 4});
-    ASSERT_TRUE(Take(bitmap, dib));
-    EXPECT_EQ(bitmap.GetPixels_zm24RGB(0, 0), (TRGB{3, 2, 1}));
-    EXPECT_FALSE(bitmap.HasAlphaChannel());
+TEST(Dib, TakesEveryDepth) {
+    struct TCase {
+        const char* name;
+        std::vector<std::uint8_t> header, bytes;
+        TZmPixelFormat format;
+        std::vector<TRGB> pixels;  // row by row
+    };
+    constexpr TRGB kWhite{255, 255, 255};
+    const std::vector<std::uint8_t> core = {12, 0, 0, 0, 1, 0, 1, 0, 1, 0, 1, 0};
+    const std::vector<std::uint8_t> red_green = {0, 0, 255, 0, 0, 255, 0, 0};
+    std::vector<std::uint8_t> two_colours = Header(40, 3, 1, 4);
+    two_colours[32] = 2;  // of sixteen; the others are black
+    const TCase cases[] = {
+        {"bottom up", Header(40, 1, 2, 24), red_green, zm24RGB, {kGreen, kRed}},
+        {"top down", Header(40, 1, -2, 24), red_green, zm24RGB, {kRed, kGreen}},
+        {"bits of which 0 is white",
+         Header(40, 3, 1, 1),
+         {255, 255, 255, 0, 0, 0, 0, 0, 0xA0, 0, 0, 0},
+         zm1g,
+         {TRGB{}, kWhite, TRGB{}}},
+        {"bits of other colours",
+         Header(40, 2, 1, 1),
+         {255, 255, 254, 0, 0, 0, 0, 0, 0x80, 0, 0, 0},
+         zm24RGB,
+         {TRGB{}, TRGB{255, 255, 254}}},
+        {"nibbles",
+         two_colours,
+         {1, 2, 3, 0, 4, 5, 6, 0, 0x10, 0xF0, 0, 0},
+         zm24RGB,
+         {TRGB{4, 5, 6}, TRGB{1, 2, 3}, TRGB{}}},
+        {"entries of three bytes", core, {0, 0, 255, 0, 255, 0, 0x80, 0, 0, 0}, zm24RGB, {kGreen}},
+        {"5-5-5", Header(40, 2, 1, 16), {0xFF, 0x7F, 0x00, 0x7C}, zm24RGB, {kWhite, kRed}},
+        {"5-6-5, masks behind the header",  // 32 * 255 / 63 = 129.5, 16 * 255 / 31 = 131.6
+         Header(40, 2, 1, 16, 3),
+         {0, 0xF8, 0, 0, 0xE0, 0x07, 0, 0, 0x1F, 0, 0, 0, 0x00, 0x04, 0x10, 0x00},
+         zm24RGB,
+         {TRGB{0, 130, 0}, TRGB{132, 0, 0}}},
+        {"three masks, not four",
+         Header(40, 1, 1, 32, 3),
+         {0xFF, 0, 0, 0, 0, 0xFF, 0, 0, 0, 0, 0xFF, 0, 1, 2, 3, 4},
+         zm24RGB,
+         {TRGB{3, 2, 1}}},
+    };
+    for (const TCase& test : cases) {
+        SCOPED_TRACE(test.name);
+        std::vector<std::uint8_t> dib = test.header;
+        Append(dib, test.bytes);
+        TZmBitmap bitmap;
+        ASSERT_TRUE(Take(bitmap, dib));
+        EXPECT_EQ(bitmap.GetPixelFormat(), test.format);
+        EXPECT_FALSE(bitmap.HasAlphaChannel());
+        for (std::size_t i = 0; i < test.pixels.size(); ++i) {
+            const auto at = static_cast<std::int32_t>(i);
+            const std::int32_t width = bitmap.GetWidth();
+            EXPECT_EQ(bitmap.GetPixels(at % width, at / width), test.pixels[i]) << i;
+        }
+    }
 }
 
 TEST(Dib, TakesAlphaOfALongHeader) {
@@ -268,12 +263,12 @@ TEST(Dib, BringsBackWhatItCanHold) {
 TEST(Dib, HoldsARectangle) {
     const auto source = MakeNoise(zm24RGB, 9, 7, 5);
     TZmBitmap copy;
-    ASSERT_TRUE(Take(copy, source->CreateDIB(TRect{2, 1, 4, 100}, 0, 0)));
+    ASSERT_TRUE(Take(copy, source->CreateDIB(2, 1, 4, 100)));
     EXPECT_EQ(copy.GetWidth(), 3);
     EXPECT_EQ(copy.GetHeight(), 6);
     EXPECT_EQ(copy.GetPixels_zm24RGB(0, 0), source->GetPixels_zm24RGB(2, 1));
     EXPECT_EQ(copy.GetPixels_zm24RGB(2, 5), source->GetPixels_zm24RGB(4, 6));
-    EXPECT_TRUE(source->CreateDIB(TRect{9, 0, 12, 3}, 0, 0).empty());
+    EXPECT_TRUE(source->CreateDIB(9, 0, 12, 3).empty());
 }
 
 TEST(Dib, MayComeInTwoParts) {

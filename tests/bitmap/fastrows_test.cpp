@@ -46,7 +46,7 @@ std::size_t RowBytes(TZmPixelFormat format, std::int32_t width) {
 /// Converts one row both ways. The source lies at the very end of its block, `shift` bytes off
 /// its start, the target between guards, `shift` bytes off an even address.
 void ExpectSameRow(const TPair& pair, std::int32_t width, std::size_t shift,
-                   const TZmRowContext& context) {
+                   const TZmRowContext& context, TZmRowFunction convert = nullptr) {
     const std::vector<std::uint8_t> source =
         Noise(shift + RowBytes(pair.from, width), static_cast<std::uint32_t>(width) + 7);
     const std::size_t dest_bytes = RowBytes(pair.to, width);
@@ -55,8 +55,8 @@ void ExpectSameRow(const TPair& pair, std::int32_t width, std::size_t shift,
     std::vector<std::uint8_t> actual = expected;
     FindPlainRowFunction(pair.from, pair.to)(source.data() + shift, expected.data() + begin, width,
                                              context);
-    FindRowFunction(pair.from, pair.to)(source.data() + shift, actual.data() + begin, width,
-                                        context);
+    convert = convert != nullptr ? convert : FindRowFunction(pair.from, pair.to);
+    convert(source.data() + shift, actual.data() + begin, width, context);
     for (std::size_t i = 0; i < expected.size(); ++i) {
         ASSERT_EQ(expected[i], actual[i])
             << PixelFormatInfo(pair.from).name << " to " << PixelFormatInfo(pair.to).name
@@ -85,6 +85,21 @@ TEST(FastRows, GiveTheBytesOfThePlainOnes) {
             }
             for (const std::int32_t width : {127, 128, 129, 191, 255, 256, 257, 1001}) {
                 ASSERT_NO_FATAL_FAILURE(ExpectSameRow(pair, width, 1, context));
+            }
+        }
+    });
+}
+
+TEST(FastRows, GoPastTheCachesWithTheSameBytes) {
+    constexpr TPair kPairs[] = {{zm24RGB, zm32RGB}, {zm32RGB, zm24RGB}, {zm8g, zm32RGB}};
+    ForEachInstructionSet([&] {
+        for (const TPair& pair : kPairs) {
+            const TZmRowFunction stream = FindStreamingRowFunction(pair.from, pair.to);
+            for (const std::int32_t width :
+                 {0, 1, 15, 16, 17, 18, 28, 33, 63, 64, 65, 90, 127, 128, 129, 192, 193, 300}) {
+                for (std::size_t shift = 0; stream != nullptr && shift < 64; ++shift) {
+                    ASSERT_NO_FATAL_FAILURE(ExpectSameRow(pair, width, shift, {}, stream));
+                }
             }
         }
     });
@@ -141,41 +156,21 @@ TEST(FastGray, OfAllReds_AllGreensAndEveryThirdBlue) {
     std::vector<std::uint8_t> actual(expected.size());
     const auto width = static_cast<std::int32_t>(expected.size());
     const TZmRowContext context;
-    ForEachInstructionSet([&] {
-        for (int red = 0; red < 256; ++red) {
-            row.clear();
-            for (int green = 0; green < 256; ++green) {
-                for (int blue = 0; blue < 256; blue += 3) {
-                    row.push_back(static_cast<std::uint8_t>(blue));
-                    row.push_back(static_cast<std::uint8_t>(green));
-                    row.push_back(static_cast<std::uint8_t>(red));
-                }
+    for (int red = 0; red < 256; ++red) {
+        row.clear();
+        for (int green = 0; green < 256; ++green) {
+            for (int blue = 0; blue < 256; blue += 3) {
+                row.push_back(static_cast<std::uint8_t>(blue));
+                row.push_back(static_cast<std::uint8_t>(green));
+                row.push_back(static_cast<std::uint8_t>(red));
             }
-            FindPlainRowFunction(zm24RGB, zm8g)(row.data(), expected.data(), width, context);
+        }
+        FindPlainRowFunction(zm24RGB, zm8g)(row.data(), expected.data(), width, context);
+        ForEachInstructionSet([&] {
             FindRowFunction(zm24RGB, zm8g)(row.data(), actual.data(), width, context);
             ASSERT_EQ(expected, actual) << "red " << red;
-        }
-    });
-}
-
-TEST(FastGray, OfPureColoursIsTheirWeight) {
-    // 255 * 21 / 100 = 53, 255 * 71 / 100 = 181, 255 * 8 / 100 = 20, each rounded down; white is
-    // 255 and not the sum of the three.
-    const std::vector<std::uint8_t> colors = {0, 0, 255, 0, 255, 0, 255, 0, 0, 255, 255, 255};
-    std::vector<std::uint8_t> row;
-    for (int i = 0; i < 64; ++i) {
-        row.insert(row.end(), colors.begin(), colors.end());
+        });
     }
-    std::vector<std::uint8_t> gray(256);
-    ForEachInstructionSet([&] {
-        FindRowFunction(zm24RGB, zm8g)(row.data(), gray.data(), 256, TZmRowContext{});
-        for (std::size_t i = 0; i < gray.size(); i += 4) {
-            ASSERT_EQ(gray[i], 53);
-            ASSERT_EQ(gray[i + 1], 181);
-            ASSERT_EQ(gray[i + 2], 20);
-            ASSERT_EQ(gray[i + 3], 255);
-        }
-    });
 }
 
 using TBitRow = void (*)(const std::uint8_t*, std::uint8_t*, std::int32_t, std::int32_t);

@@ -4,17 +4,16 @@
 #include <cstring>
 #include <limits>
 
-#include "engine/bitmap/zmbitmapmemory_p.h"
 #include "engine/bitmap/zmbitrow_p.h"
+#include "engine/bitmap/zmrunmover_p.h"
 #include "engine/bitmap/zmxBitmaps.h"
-#include "engine/foundation/zmsettings.h"
+#include "tests/bitmap/place_support.h"
+#include "tests/support/instructionsets.h"
 #include "tests/support/testimages.h"
 
 namespace zm::test {
 namespace {
 
-constexpr TZmPixelFormat kAllFormats[] = {zm1g,  zm8p,   zm8g,    zm16g,    zm24RGB,
-                                          zm32f, zmCMYK, zm48RGB, zmCIELab, zm32RGB};
 constexpr std::int32_t kMin = std::numeric_limits<std::int32_t>::min();
 constexpr std::int32_t kMax = std::numeric_limits<std::int32_t>::max();
 
@@ -66,6 +65,34 @@ TEST(BitRuns, FillAtEveryOffset) {
             }
         }
     }
+}
+
+// Runs past the caches.
+
+TEST(RunMover, MovesTheSameBytesPastTheCaches) {
+    TZmBitmap dest(1, 1, zm8g);
+    const TRunMover mover(dest, kStreamedBytes);
+    std::vector<std::uint8_t> source(6000);
+    for (std::size_t i = 0; i < source.size(); ++i) {
+        source[i] = static_cast<std::uint8_t>(i * i / 5);
+    }
+    ForEachInstructionSet([&] {
+        for (const std::size_t count : {0, 1, 1023, 1024, 1025, 1087, 4099}) {
+            for (std::size_t offset = 0; offset < 130; offset += 9) {
+                std::vector<std::uint8_t> moved(6000, 0x5A);
+                auto expected = moved;
+                std::copy_n(source.begin() + 3, count,
+                            expected.begin() + static_cast<std::ptrdiff_t>(offset));
+                mover.Move(moved.data() + offset, source.data() + 3, count);
+                ASSERT_TRUE(moved == expected) << count << " bytes to " << offset;
+            }
+        }
+        for (const std::size_t to : {99, 101}) {  // runs that overlap
+            auto moved = source;
+            mover.Move(moved.data() + to, moved.data() + 100, 5000);
+            ASSERT_EQ(std::memcmp(moved.data() + to, source.data() + 100, 5000), 0) << to;
+        }
+    });
 }
 
 // Copies of rectangles.
@@ -274,14 +301,6 @@ TEST(Crop, KeepsThePlaneInStep) {
     EXPECT_EQ(bitmap.GetAlpha(1, 7), 255);
 }
 
-TEST(Crop, WithTheSentinelStillKeepsThePicture) {
-    TZmBitmap bitmap(2, 2, zm8g);
-    bitmap.Fill(5.0);
-    ASSERT_TRUE(bitmap.Crop(-1, 0, 1, 1, kCropNoFill));
-    EXPECT_EQ(bitmap.GetWidth(), 3);
-    EXPECT_EQ(bitmap.GetPixels_zm8(1, 1), 5);
-}
-
 TEST(Crop, WithoutRoomLeavesTheImage) {
     TZmBitmap bitmap(8, 8, zm24RGB);
     bitmap.Fill(5.0);
@@ -295,11 +314,11 @@ TEST(Crop, WithoutRoomLeavesTheImage) {
         EXPECT_EQ(copy.GetWidth(), is_one_pixel ? 1 : 8);
         EXPECT_EQ(copy.GetAlpha(0, 0), is_one_pixel ? 255 : 6);
     }
-    SetLargestBitmapBlock(200);
-    ZmGlobalSettings().fAutoLocateOnDisk = false;
-    EXPECT_FALSE(bitmap.Crop(-50, -50, 50, 50, 0));
-    ZmGlobalSettings().fAutoLocateOnDisk = true;
-    SetLargestBitmapBlock(-1);
+    {
+        const TBlockLimit small_blocks(200);
+        const TSettingGuard no_disk(ZmGlobalSettings().fAutoLocateOnDisk, false);
+        EXPECT_FALSE(bitmap.Crop(-50, -50, 50, 50, 0));
+    }
     EXPECT_EQ(bitmap.GetWidth(), 8);
     EXPECT_EQ(bitmap.GetPixels_zm24RGB(7, 7), (TRGB{0, 0, 5}));
     EXPECT_EQ(bitmap.GetAlpha(7, 7), 6);
@@ -307,12 +326,15 @@ TEST(Crop, WithoutRoomLeavesTheImage) {
     EXPECT_FALSE(empty.Crop(0, 0, 5, 5, 0));
 }
 
-TEST(Crop, LeavesTheEventsAndTheName) {
+TEST(Crop, WithTheSentinelKeepsPictureEventsAndName) {
     TZmBitmap bitmap(4, 4, zm8g);
+    bitmap.Fill(5.0);
     int calls = 0;
     bitmap.SetOnChanged([&calls](void*) { ++calls; });
     bitmap.SetFilename(u"a");
-    ASSERT_TRUE(bitmap.Crop(1, 1, 2, 2, 0));
+    ASSERT_TRUE(bitmap.Crop(-1, 1, 2, 2, kCropNoFill));
+    EXPECT_EQ(bitmap.GetWidth(), 4);
+    EXPECT_EQ(bitmap.GetPixels_zm8(1, 1), 5);
     bitmap.Changed();
     EXPECT_EQ(calls, 2);
     EXPECT_EQ(bitmap.GetFilename(), u"a");

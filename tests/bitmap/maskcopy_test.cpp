@@ -7,13 +7,12 @@
 
 #include "engine/bitmap/zmmask.h"
 #include "engine/bitmap/zmxBitmaps.h"
+#include "tests/bitmap/place_support.h"
 #include "tests/support/testimages.h"
 
 namespace zm::test {
 namespace {
 
-constexpr TZmPixelFormat kAllFormats[] = {zm1g,  zm8p,   zm8g,    zm16g,    zm24RGB,
-                                          zm32f, zmCMYK, zm48RGB, zmCIELab, zm32RGB};
 constexpr std::int32_t kMin = std::numeric_limits<std::int32_t>::min();
 constexpr std::int32_t kMax = std::numeric_limits<std::int32_t>::max();
 
@@ -264,6 +263,8 @@ TEST(MaskCombine, BringsTheRectangleUpToDateWhenAsked) {
     TZmBitmap plane(4, 3, zm8g);
     plane.Fill(0.0);
     plane.SetPixels_zm8(2, 1, 7);
+    TZmBitmap colors(4, 3, zm24RGB);
+    colors.Fill(0.0);
     TZmMask mask;
     ASSERT_TRUE(mask.AllocateBits(4, 3, 8));
     mask.Fill(255);
@@ -272,8 +273,6 @@ TEST(MaskCombine, BringsTheRectangleUpToDateWhenAsked) {
     mask.CombineWithAlpha(&plane, 0, 0, true);
     EXPECT_EQ(mask.GetX1(), 2);
     EXPECT_EQ(mask.GetY2(), 1);
-    TZmBitmap colors(4, 3, zm24RGB);
-    colors.Fill(0.0);
     mask.CombineWithAlpha(&colors, 0, 0, true);
     mask.CombineWithAlpha(&plane, kMin, kMax, true);
     mask.CombineWithAlpha(nullptr, 0, 0, true);

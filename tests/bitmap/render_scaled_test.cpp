@@ -10,6 +10,7 @@
 #include "engine/bitmap/zmvirtualbitmaps.h"
 #include "engine/bitmap/zmxBitmaps.h"
 #include "engine/proc/zmresample.h"
+#include "tests/bitmap/place_support.h"
 #include "tests/bitmap/render_support.h"
 #include "tests/support/testimages.h"
 
@@ -23,9 +24,6 @@ using test::MakeFilled;
 using test::MakeGradient;
 using test::MakeMap;
 using test::MakeNoise;
-
-constexpr TZmPixelFormat kFormats[] = {zm1g,  zm8p,   zm8g,    zm16g,    zm24RGB,
-                                       zm32f, zmCMYK, zm48RGB, zmCIELab, zm32RGB};
 
 // The scaled path.
 
@@ -131,7 +129,7 @@ TEST(Render, ShrunkBitsAreTheShareOfWhite) {
 }
 
 TEST(Render, ScalesEveryFormatByEveryFilter) {
-    for (const TZmPixelFormat format : kFormats) {
+    for (const TZmPixelFormat format : test::kAllFormats) {
         auto source = MakeNoise(format, 11, 9, 3);
         source->Fill(TRGBA{255, 255, 255, 255});
         if (format == zm8p) {
@@ -281,8 +279,9 @@ std::unique_ptr<TZmBitmap> MakeAnyPicture(std::minstd_rand& random, TZmPixelForm
 TEST(RenderAnything, NeverLeavesTheRows) {
     std::minstd_rand random(20);
     for (int round = 0; round < 3000; ++round) {
-        auto source = MakeAnyPicture(random, kFormats[random() % 10]);
-        auto dest = MakeAnyPicture(random, random() % 4 == 0 ? kFormats[random() % 10] : zm24RGB);
+        auto source = MakeAnyPicture(random, test::kAllFormats[random() % 10]);
+        auto dest =
+            MakeAnyPicture(random, random() % 4 == 0 ? test::kAllFormats[random() % 10] : zm24RGB);
         std::array<std::int32_t, 8> at{};
         for (std::int32_t& coordinate : at) {
             coordinate = AnyCoordinate(random);

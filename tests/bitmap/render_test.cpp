@@ -15,11 +15,15 @@ namespace zm {
 namespace {
 
 using test::AddNoiseAlpha;
+using test::ExpectSamePixels;
 using test::kUntouched;
 using test::kWhite;
 using test::MakeFilled;
 using test::MakeMap;
 using test::MakeNoise;
+
+constexpr std::int32_t kMin = std::numeric_limits<std::int32_t>::min();
+constexpr std::int32_t kMax = std::numeric_limits<std::int32_t>::max();
 
 /// Draws one source pixel over one destination pixel.
 struct TOnePixel {
@@ -46,82 +50,58 @@ TRGB DrawOnePixel(const TOnePixel& sample) {
 }
 
 // Rectangles. One axis a row: destination position and size, source position and size on images
-// of 16 pixels; then the source columns that the destination shows, -1 where nothing is drawn.
+// of 16 pixels; then how many destination columns stay untouched on the left, and the source
+// columns that are shown from there on.
 
 struct TAxisCase {
     const char* name;
-    std::int32_t dest, dest_size, source, source_size;
+    std::int32_t dest, dest_size, source, source_size, skipped;
     std::vector<int> columns;
 };
 
+const std::vector<int> kSixteen = {0, 1, 2, 3, 4, 5, 6, 7, 8, 9, 10, 11, 12, 13, 14, 15};
 const std::vector<TAxisCase> kAxisCases = {
-    {"whole", 0, 16, 0, 16, {0, 1, 2, 3, 4, 5, 6, 7, 8, 9, 10, 11, 12, 13, 14, 15}},
-    {"left of the destination", -10, 16, 0, 16, {10, 11, 12, 13, 14, 15}},
-    {"over its right edge",
-     12,
-     16,
-     0,
-     16,
-     {-1, -1, -1, -1, -1, -1, -1, -1, -1, -1, -1, -1, 0, 1, 2, 3}},
-    {"left of the source",
-     0,
-     16,
-     -12,
-     16,
-     {-1, -1, -1, -1, -1, -1, -1, -1, -1, -1, -1, -1, 0, 1, 2, 3}},
-    {"over the source's right edge", 0, 16, 10, 16, {10, 11, 12, 13, 14, 15}},
-    {"enlarged", 3, 6, 5, 3, {-1, -1, -1, 5, 5, 6, 6, 7, 7}},
-    {"enlarged by a fraction", 0, 5, 0, 3, {0, 0, 1, 1, 2}},
-    {"shrunk", 0, 4, 2, 12, {2, 5, 8, 11}},
+    {"whole", 0, 16, 0, 16, 0, kSixteen},
+    {"left of the destination", -10, 16, 0, 16, 0, {10, 11, 12, 13, 14, 15}},
+    {"over its right edge", 12, 16, 0, 16, 12, {0, 1, 2, 3}},
+    {"left of the source", 0, 16, -12, 16, 12, {0, 1, 2, 3}},
+    {"over the source's right edge", 0, 16, 10, 16, 0, {10, 11, 12, 13, 14, 15}},
+    {"enlarged", 3, 6, 5, 3, 3, {5, 5, 6, 6, 7, 7}},
+    {"enlarged by a fraction", 0, 5, 0, 3, 0, {0, 0, 1, 1, 2}},
+    {"shrunk", 0, 4, 2, 12, 0, {2, 5, 8, 11}},
     // -5 * 0.5 = 2.5 goes to the even 2: the table then runs from column 2 in halves.
-    {"enlarged, half a pixel cut", -5, 16, 0, 8, {2, 2, 3, 3, 4, 4, 5, 5, 6, 6, 7}},
+    {"enlarged, half a pixel cut", -5, 16, 0, 8, 0, {2, 2, 3, 3, 4, 4, 5, 5, 6, 6, 7}},
     // 3 / 2 = 1.5 goes to the even 2.
-    {"shrunk, left of the source", 0, 8, -3, 16, {-1, -1, 0, 2, 4, 6, 8, 10}},
-    {"shrunk, over the source's right edge", 0, 8, 6, 16, {6, 8, 10, 12, 14}},
-    {"beside the destination", 16, 4, 0, 4, {}},
-    {"beside the source", 0, 4, 16, 4, {}},
-    {"no source size", 0, 4, 0, 0, {}},
-    {"negative size", 8, -4, 0, 4, {}},
-    {"far to the left", std::numeric_limits<std::int32_t>::min(), 16, 0, 16, {}},
-    {"far to the right", std::numeric_limits<std::int32_t>::max(), 16, 0, 16, {}},
-    {"source far to the left", 0, 16, std::numeric_limits<std::int32_t>::min(), 16, {}},
-    {"largest sizes",
-     0,
-     std::numeric_limits<std::int32_t>::max(),
-     0,
-     std::numeric_limits<std::int32_t>::max(),
-     {0, 1, 2, 3, 4, 5, 6, 7, 8, 9, 10, 11, 12, 13, 14, 15}},
+    {"shrunk, left of the source", 0, 8, -3, 16, 2, {0, 2, 4, 6, 8, 10}},
+    {"shrunk, over the source's right edge", 0, 8, 6, 16, 0, {6, 8, 10, 12, 14}},
+    {"beside the destination", 16, 4, 0, 4, 0, {}},
+    {"beside the source", 0, 4, 16, 4, 0, {}},
+    {"no source size", 0, 4, 0, 0, 0, {}},
+    {"negative size", 8, -4, 0, 4, 0, {}},
+    {"far to the left", kMin, 16, 0, 16, 0, {}},
+    {"far to the right", kMax, 16, 0, 16, 0, {}},
+    {"source far to the left", 0, 16, kMin, 16, 0, {}},
+    {"largest sizes", 0, kMax, 0, kMax, 0, kSixteen},
 };
 
-TEST(Render, ClipsColumns) {
-    auto source = MakeMap(16, 2);
-    for (const TAxisCase& sample : kAxisCases) {
-        auto dest = MakeFilled(16, 2, kUntouched);
-        source->RenderToTZmBitmapEx(dest.get(), sample.dest, 0, sample.dest_size, 2, sample.source,
-                                    0, sample.source_size, 2, true, 255, rfNone, zmlNormal, 1.0);
-        for (std::size_t x = 0; x < 16; ++x) {
-            const int column = x < sample.columns.size() ? sample.columns[x] : -1;
-            const TRGB expected =
-                column < 0 ? kUntouched : TRGB{static_cast<std::uint8_t>(column), 1, 77};
-            ASSERT_EQ(expected, dest->GetPixels_zm24RGB(static_cast<std::int32_t>(x), 1))
-                << sample.name << ", column " << x;
-        }
-    }
-}
-
-TEST(Render, ClipsRows) {
-    auto source = MakeMap(2, 16);
-    for (const TAxisCase& sample : kAxisCases) {
-        auto dest = MakeFilled(2, 16, kUntouched);
-        source->RenderToTZmBitmapEx(dest.get(), 0, sample.dest, 2, sample.dest_size, 0,
-                                    sample.source, 2, sample.source_size, true, 255, rfNone,
-                                    zmlNormal, 1.0);
-        for (std::size_t y = 0; y < 16; ++y) {
-            const int row = y < sample.columns.size() ? sample.columns[y] : -1;
-            const TRGB expected =
-                row < 0 ? kUntouched : TRGB{1, static_cast<std::uint8_t>(row), 77};
-            ASSERT_EQ(expected, dest->GetPixels_zm24RGB(1, static_cast<std::int32_t>(y)))
-                << sample.name << ", row " << y;
+TEST(Render, ClipsColumnsAndRows) {
+    for (const TAxisCase& test : kAxisCases) {
+        auto across = MakeFilled(16, 2, kUntouched);
+        auto down = MakeFilled(2, 16, kUntouched);
+        MakeMap(16, 2)->RenderToTZmBitmapEx(across.get(), test.dest, 0, test.dest_size, 2,
+                                            test.source, 0, test.source_size, 2, true, 255, rfNone,
+                                            zmlNormal, 1.0);
+        MakeMap(2, 16)->RenderToTZmBitmapEx(down.get(), 0, test.dest, 2, test.dest_size, 0,
+                                            test.source, 2, test.source_size, true, 255, rfNone,
+                                            zmlNormal, 1.0);
+        for (std::int32_t i = 0; i < 16; ++i) {
+            const auto index = static_cast<std::size_t>(i - test.skipped);
+            const bool is_drawn = i >= test.skipped && index < test.columns.size();
+            const auto from = static_cast<std::uint8_t>(is_drawn ? test.columns[index] : 0);
+            ASSERT_EQ(is_drawn ? (TRGB{from, 1, 77}) : kUntouched, across->GetPixels(i, 1))
+                << test.name << ", column " << i;
+            ASSERT_EQ(is_drawn ? (TRGB{1, from, 77}) : kUntouched, down->GetPixels(1, i))
+                << test.name << ", row " << i;
         }
     }
 }
@@ -143,6 +123,20 @@ TEST(Render, UpdateRectangleExcludesRightAndBottom) {
             }
         }
     }
+}
+
+TEST(Render, UpdateRectanglesBesideTheDrawingDrawNothing) {
+    auto source = MakeMap(8, 8);
+    auto dest = MakeFilled(16, 16, kUntouched);
+    for (const TRect& update : {TRect{12, 0, 16, 16}, TRect{-9, 0, -1, 16}, TRect{0, 12, 16, 16},
+                                TRect{5, 0, 2, 16}, TRect{kMax, kMax, kMin, kMin}}) {
+        for (const TResampleFilter filter : {rfNone, rfBilinear}) {
+            const std::int32_t size = filter == rfNone ? 8 : 7;
+            source->RenderToTZmBitmap(dest.get(), nullptr, nullptr, &update, 0, 0, size, size, 0, 0,
+                                      8, 8, true, false, 255, filter, true, zmlNormal, 1.0);
+        }
+    }
+    ExpectSamePixels(*MakeFilled(16, 16, kUntouched), *dest);
 }
 
 // Tables.
@@ -339,10 +333,8 @@ TEST(Render, ColorsTakeTheDisplayAdjustments) {
         {"range", 0, false, 0, 50, 150, 100, 127, 127},
         {"range, ends", 0, false, 0, 50, 150, 40, 0, 0},
         {"contrast before range", 0, false, 10, 50, 150, 100, 56, 56},  // 72: 22 / 100
-        {"largest values", std::numeric_limits<std::int32_t>::max(), true,
-         std::numeric_limits<std::int32_t>::max(), 0, 0, 100, 255, 0},
-        {"smallest values", std::numeric_limits<std::int32_t>::min(), true,
-         std::numeric_limits<std::int32_t>::min(), 0, 0, 100, 255, 255},
+        {"largest values", kMax, true, kMax, 0, 0, 100, 255, 0},
+        {"smallest values", kMin, true, kMin, 0, 0, 100, 255, 255},
     };
     for (const TCase& sample : cases) {
         for (const TZmPixelFormat format : {zm24RGB, zm48RGB}) {

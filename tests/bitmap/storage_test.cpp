@@ -3,9 +3,7 @@
 #include <cstring>
 #include <limits>
 
-#include "engine/bitmap/zmbitmapmemory_p.h"
-#include "engine/bitmap/zmxBitmaps.h"
-#include "engine/foundation/zmsettings.h"
+#include "engine/bitmap/zmvirtualbitmaps.h"
 #include "tests/bitmap/place_support.h"
 #include "tests/support/testimages.h"
 
@@ -79,10 +77,8 @@ TEST(Allocate, OfTheSameSizeKeepsThePixels) {
     EXPECT_TRUE(bitmap.Allocate(4, 4, zm8g));
     EXPECT_EQ(calls, 1);
     EXPECT_EQ(bitmap.GetPixels_zm8(3, 3), 77);
-    const std::uint8_t* const memory = bitmap.GetMemory();
     EXPECT_TRUE(bitmap.Allocate(4, 4, zm8p));
     EXPECT_EQ(bitmap.GetPaletteLen(), 256);
-    EXPECT_TRUE(memory != nullptr);
 }
 
 TEST(Allocate, RejectsWhatIsNoImage) {
@@ -131,7 +127,11 @@ TEST(Allocate, TakesTheHeapOfTheAllocator) {
     EXPECT_EQ(TZmBitmapStorageTest::Block(large)[-4], 1);  // system heap
     EXPECT_EQ(TZmBitmapStorageTest::Block(system)[-4], 1);
     EXPECT_EQ(system.GetPixels_zm8(3, 3), 0);  // which is zero-filled
-    system.SetMemoryAllocator(zmmaVCL);        // the block knows where it came from
+    EXPECT_FALSE(WasBlockFilled(TZmBitmapStorageTest::Block(large), zmmaAuto));
+    TZmBitmap words(1024, 1024, zm16g);
+    large.CopyAndConvertFormat(&words);
+    EXPECT_TRUE(WasBlockFilled(TZmBitmapStorageTest::Block(large), zmmaAuto));
+    system.SetMemoryAllocator(zmmaVCL);  // the block knows where it came from
     ASSERT_TRUE(system.Allocate(5, 4, zm8g));
     system.Fill(1.0);
 }
@@ -235,7 +235,9 @@ TEST(PlatformBitmapPlace, RefusesFourFormatsByTheirTexts) {
         EXPECT_EQ(bitmap.GetHeight(), 4);
         EXPECT_TRUE(bitmap.IsEmpty());
         bitmap.Fill(1.0);  // no pixels to be reached
-        ASSERT_TRUE(bitmap.Allocate(6, 4, zm24RGB));
+        ASSERT_TRUE(bitmap.SetPixelFormat(zm24RGB));
+        bitmap.Fill(1.0);
+        EXPECT_EQ(bitmap.GetPixels_zm24RGB(5, 3).r, 1);
     }
 }
 
@@ -325,7 +327,9 @@ TEST(SwitchTo, HandsOverWithoutACopy) {
 TEST(SaveState, StacksImages) {
     TZmBitmap bitmap(4, 3, zm8g);
     bitmap.Fill(1.0);
+    bitmap.SetWhiteValue(9);
     bitmap.SaveState();
+    EXPECT_EQ(bitmap.GetWhiteValue(), 9);
     bitmap.Fill(2.0);
     bitmap.SaveState();
     bitmap.Clear();
@@ -382,6 +386,11 @@ TEST(Assign, OfARectangleCutsItOut) {
     }
     TZmBitmap none(*source, TRect{5, 5, 5, 9});
     EXPECT_TRUE(none.IsEmpty());
+    std::vector<std::uint8_t> row(16, 3);  // a copy of a view reads no byte behind it
+    TZmBitmap borrowed(row.data(), 5, 1, zm24RGB);
+    TZmVirtualClippedBitmap view(borrowed, TRect{2, 0, 5, 1});
+    TZmBitmap copy(view);
+    EXPECT_EQ(copy.GetPixels_zm24RGB(2, 0), (TRGB{3, 3, 3}));
 }
 
 TEST(Sides, KeepWhatBothSizesHave) {
@@ -405,6 +414,18 @@ TEST(Sides, KeepWhatBothSizesHave) {
     bitmap.Fill(1.0);
     bitmap.SetHeight(0);
     EXPECT_TRUE(bitmap.IsEmpty());
+    TZmBitmap sides_first;
+    sides_first.SetWidth(5);
+    sides_first.SetHeight(4);
+    const TSettingGuard no_disk(ZmGlobalSettings().fAutoLocateOnDisk, false);
+    {
+        const TBlockLimit no_room(10);
+        EXPECT_FALSE(sides_first.SetPixelFormat(zm24RGB));
+        EXPECT_TRUE(sides_first.IsEmpty());
+    }
+    ASSERT_TRUE(sides_first.SetPixelFormat(zm24RGB));
+    sides_first.Fill(7.0);
+    EXPECT_EQ(sides_first.GetPixels_zm24RGB(4, 3).r, 7);
 }
 
 TEST(Place, ChangesWithThePixels) {
@@ -435,6 +456,11 @@ TEST(Palette, IgnoresIndexesOutside) {
 }
 
 TEST(Pixels, LieInMemoryAsDeclared) {
+    constexpr TRGB kColor{1, 2, 3};
+    constexpr TRGBA kRgba{1, 2, 3, 4};
+    constexpr TCMYK kInks{1, 2, 3, 4};
+    constexpr TRGB48 kWords{0x0102, 0x0304, 0x0506};
+    constexpr TCIELab kLab{9, -1, 1};
     struct TCase {
         TZmPixelFormat format;
         void (*set)(TZmBitmap&);
@@ -443,41 +469,19 @@ TEST(Pixels, LieInMemoryAsDeclared) {
     const TCase kCases[] = {
         {zm8g, [](TZmBitmap& b) { b.SetPixels_zm8(1, 0, 7); }, {7}},
         {zm16g, [](TZmBitmap& b) { b.SetPixels_zm16g(1, 0, 0x1234); }, {0x34, 0x12}},
-        {zm24RGB,
-         [](TZmBitmap& b) {
-             b.SetPixels_zm24RGB(1, 0, {1, 2, 3});
-         },
-         {1, 2, 3}},
+        {zm24RGB, [](TZmBitmap& b) { b.SetPixels_zm24RGB(1, 0, kColor); }, {1, 2, 3}},
         {zm32f, [](TZmBitmap& b) { b.SetPixels_zm32f(1, 0, 1.0f); }, {0, 0, 0x80, 0x3F}},
-        {zmCMYK,
-         [](TZmBitmap& b) {
-             b.SetPixels_zmCMYK(1, 0, {1, 2, 3, 4});
-         },
-         {1, 2, 3, 4}},
-        {zm48RGB,
-         [](TZmBitmap& b) {
-             b.SetPixels_zm48RGB(1, 0, {0x0102, 0x0304, 0x0506});
-         },
-         {2, 1, 4, 3, 6, 5}},
-        {zmCIELab,
-         [](TZmBitmap& b) {
-             b.SetPixels_zmCIELab(1, 0, {9, -1, 1});
-         },
-         {9, 255, 1}},
-        {zm32RGB,
-         [](TZmBitmap& b) {
-             b.SetPixels_zm32RGB(1, 0, {1, 2, 3, 4});
-         },
-         {1, 2, 3, 4}},
+        {zmCMYK, [](TZmBitmap& b) { b.SetPixels_zmCMYK(1, 0, kInks); }, {1, 2, 3, 4}},
+        {zm48RGB, [](TZmBitmap& b) { b.SetPixels_zm48RGB(1, 0, kWords); }, {2, 1, 4, 3, 6, 5}},
+        {zmCIELab, [](TZmBitmap& b) { b.SetPixels_zmCIELab(1, 0, kLab); }, {9, 255, 1}},
+        {zm32RGB, [](TZmBitmap& b) { b.SetPixels_zm32RGB(1, 0, kRgba); }, {1, 2, 3, 4}},
     };
     for (const TCase& test : kCases) {
         TZmBitmap bitmap(3, 1, test.format);
         bitmap.Fill(0.0);
         test.set(bitmap);
-        EXPECT_EQ(std::memcmp(bitmap.GetScanLine(0) + test.bytes.size(), test.bytes.data(),
-                              test.bytes.size()),
-                  0)
-            << PixelFormatInfo(test.format).name;
+        const std::uint8_t* const pixel = bitmap.GetScanLine(0) + test.bytes.size();
+        EXPECT_EQ(std::vector<std::uint8_t>(pixel, pixel + test.bytes.size()), test.bytes);
     }
     TZmBitmap bits(10, 1, zm1g);
     bits.Fill(0.0);

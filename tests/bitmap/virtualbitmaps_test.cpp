@@ -4,6 +4,7 @@
 
 #include <vector>
 
+#include "tests/bitmap/place_support.h"
 #include "tests/support/testimages.h"
 
 namespace zm {
@@ -14,9 +15,6 @@ using test::ExpectSamePixels;
 using test::MakeGradient;
 using test::MakeNoise;
 
-constexpr TZmPixelFormat kFormats[] = {zm1g,  zm8p,   zm8g,    zm16g,    zm24RGB,
-                                       zm32f, zmCMYK, zm48RGB, zmCIELab, zm32RGB};
-
 /// A bitmap with pixels of its own from a view.
 std::unique_ptr<TZmBitmap> CopyOf(TZmBitmap& view) {
     auto copy = std::make_unique<TZmBitmap>();
@@ -25,7 +23,7 @@ std::unique_ptr<TZmBitmap> CopyOf(TZmBitmap& view) {
 }
 
 TEST(ClippedView, ShowsTheRectangleInEveryFormat) {
-    for (const TZmPixelFormat format : kFormats) {
+    for (const TZmPixelFormat format : test::kAllFormats) {
         auto source = MakeNoise(format, 37, 9, 4);
         test::AddNoiseAlpha(*source, 5);
         const TRect rect{11, 2, 31, 7};
@@ -59,6 +57,9 @@ TEST(ClippedView, FollowsItsSource) {
     EXPECT_EQ((TRGB{9, 8, 7}), view.GetPixels(1, 2));
     source->SetPixelFormat(zm48RGB);  // the caller's mistake: no row rather than a wrong one
     EXPECT_EQ(nullptr, view.GetScanLine(0));
+    TBitmap dest;
+    view.CopyToTBitmap(&dest);
+    EXPECT_EQ(0, dest.GetScanLine(1)[2]);
 }
 
 TEST(ClippedView, PlanesOfAnotherSizeEndOpaque) {
@@ -87,7 +88,7 @@ TEST(ClippedView, ReadsFileBackedSourcesAndViews) {
 }
 
 TEST(RotatedView, TurnsCounterClockwise) {
-    for (const TZmPixelFormat format : kFormats) {
+    for (const TZmPixelFormat format : test::kAllFormats) {
         auto source = MakeNoise(format, 5, 3, 6);
         test::AddNoiseAlpha(*source, 7);
         for (const std::int32_t turns : {0, 1, 2, 3, -1, 5}) {

@@ -10,16 +10,16 @@ process that ended has put there. Ends with status 77 when Xvfb or xclip is miss
 
 import os
 import pathlib
-import select
 import shutil
 import subprocess
 import sys
 import time
 
 from run_example import on_this_machine
+from with_display import Display
 
 SKIPPED = 77
-PATIENCE = 30  # seconds for anything that has to happen
+PATIENCE = 100  # seconds for anything that has to happen
 # Longer than a pipe holds: qvrun, which reports each missing file, stays alive until it is read.
 MISSING_FILES = 3000
 COPY = "[Open Image]\nimage_file={file}\n[Save Image]\ndest=1\n"
@@ -34,29 +34,6 @@ def fail(text):
 
 def run(*command, **options):
     return subprocess.run(command, timeout=PATIENCE, capture_output=True, **options)
-
-
-class Display:
-    """An X server on a display number that it finds free itself."""
-
-    def __enter__(self):
-        reader, writer = os.pipe()
-        self.server = subprocess.Popen(
-            ["Xvfb", "-displayfd", str(writer), "-screen", "0", "640x480x24", "-nolisten", "tcp"],
-            pass_fds=[writer], stdout=subprocess.DEVNULL, stderr=subprocess.DEVNULL)
-        os.close(writer)
-        with os.fdopen(reader) as number:
-            ready = select.select([number], [], [], PATIENCE)[0]
-            name = number.readline().strip() if ready else ""
-        if not name:
-            self.__exit__()
-            fail("Xvfb does not start")
-        os.environ["DISPLAY"] = ":" + name
-        return self
-
-    def __exit__(self, *_):
-        self.server.terminate()
-        self.server.wait()
 
 
 def pixels(name):

@@ -37,6 +37,16 @@ double TDrawing::CoveredArea() {
     return sum / 255;
 }
 
+bool TDrawing::IsAllOrNothing() {
+    for (std::int32_t i = 0; i < bitmap.GetWidth() * bitmap.GetHeight(); ++i) {
+        const std::uint8_t alpha = PixelAt(i % bitmap.GetWidth(), i / bitmap.GetWidth()).a;
+        if (alpha != 0 && alpha != 255) {
+            return false;
+        }
+    }
+    return true;
+}
+
 TRect TDrawing::InkBounds() {
     TRect bounds{bitmap.GetWidth(), bitmap.GetHeight(), 0, 0};
     for (std::int32_t y = 0; y < bitmap.GetHeight(); ++y) {
@@ -48,6 +58,15 @@ TRect TDrawing::InkBounds() {
         }
     }
     return bounds.left < bounds.right ? bounds : TRect{};
+}
+
+bool ShapesHaveCoverage() {
+    static const bool has_coverage = [] {
+        TDrawing drawing(10, 10);
+        drawing.zm_canvas->DrawLine(0, 4.5, 10, 4.5);
+        return !drawing.IsAllOrNothing();
+    }();
+    return has_coverage;
 }
 
 }  // namespace zm::test

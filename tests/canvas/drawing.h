@@ -22,6 +22,8 @@ public:
     std::uint32_t ColorAt(std::int32_t x, std::int32_t y);
     /// Sum of the alpha bytes of a 32-bit picture, in whole pixels.
     double CoveredArea();
+    /// Whether no alpha byte lies between 0 and 255.
+    bool IsAllOrNothing();
     /// Bounds of the pixels that are not all zero; empty when there are none.
     TRect InkBounds();
 

@@ -105,17 +105,6 @@ TEST_F(TDrawingTest, SingleBitTextIsAllOrNothing) {
     EXPECT_EQ(values, (std::set<std::uint32_t>{0, kHalfRed}));
 }
 
-TEST_F(TDrawingTest, TextFarAwayIsNothingAndNoFailure) {
-    for (const float end : {kFarEnd, -kFarEnd}) {
-        EXPECT_TRUE(graphics_->DrawString(u"x", kFont, {}, {end, end, 0, 0}, kOpaqueWhite));
-    }
-    EXPECT_EQ(PixelAt(5, 5), 0U);
-    TDrawFont unknown = kFont;
-    unknown.family = std::u16string(10000, u'q');
-    unknown.height = 0x7FFFFFFF;
-    EXPECT_TRUE(graphics_->MeasureString(u"x", unknown, {}, {}));
-}
-
 /// A metafile of 1000 by 500 hundredths of a millimetre that is black all over.
 std::vector<std::uint8_t> BlackMetafile() {
     const RECT frame{0, 0, 1000, 500};

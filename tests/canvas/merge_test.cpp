@@ -104,16 +104,16 @@ TEST(MergeTest, FormatsChangeOnlyWhereSomethingCoversThem) {
         }
         overlay->SetPixels_zm32RGB(3, 1, {0, 0, 0, 255});
         image->MergeWithAlpha(overlay.get(), 0, 0, 255, kWhole);
-        for (std::int32_t x = 100; x < 650; ++x) {
-            before.SetPixels(x, 0, {255, 255, 255});
+        const auto expect = [&](std::int32_t x, std::int32_t y, TRGB color) {
+            before.SetPixels(x, y, color);
             if (format == zm32RGB) {
-                before.GetPPixels_zm32RGB(x, 0)->a = image->GetPixels_zm32RGB(x, 0).a;
+                before.GetPPixels_zm32RGB(x, y)->a = image->GetPixels_zm32RGB(x, y).a;
             }
+        };
+        for (std::int32_t x = 100; x < 650; ++x) {
+            expect(x, 0, {255, 255, 255});
         }
-        before.SetPixels(3, 1, {0, 0, 0});
-        if (format == zm32RGB) {
-            before.GetPPixels_zm32RGB(3, 1)->a = image->GetPixels_zm32RGB(3, 1).a;
-        }
+        expect(3, 1, {0, 0, 0});
         ExpectSamePixels(before, *image);
     }
 }

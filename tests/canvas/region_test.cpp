@@ -34,12 +34,11 @@ TEST(RegionTest, ATransparentRegionComesBackByItsAlpha) {
     EXPECT_EQ(image.GetAlpha(0, 1), 200);
     image.SetPixels(0, 1, {});
     image.SetAlpha(0, 1, 0);
-    for (std::int32_t y = 0; y < 6; ++y) {
-        for (std::int32_t x = 0; x < 8; ++x) {
-            EXPECT_EQ(image.GetPixels(x, y), TRGB{});
-            EXPECT_EQ(image.GetAlpha(x, y), 0);
-        }
-    }
+    TZmBitmap blank(8, 6, zm24RGB);
+    blank.Fill(0.0);
+    blank.AlphaFill(0);
+    ExpectSamePixels(blank, image);
+    ExpectSameAlpha(blank, image);
 }
 
 TEST(RegionTest, ACopiedRegionReplacesPixelsAndLeavesThePlane) {

@@ -13,6 +13,7 @@
 #include "engine/foundation/zmsettings.h"
 #include "engine/foundation/zmstreams.h"
 #include "engine/io/zmioparams.h"
+#include "tests/codecs/codecstreams.h"
 #include "tests/support/testimages.h"
 
 namespace zm {
@@ -240,17 +241,26 @@ TEST(BmpReader, PaletteImagesBecomeColoursOrStayIndices) {
     EXPECT_EQ(native.bitmap.GetPixels_zm8(1, 0), 7);
     EXPECT_EQ(native.bitmap.GetPalette(1), (TRGB{4, 5, 6}));
     EXPECT_EQ(native.bitmap.GetPalette(7), kBlack);
-}
-
-TEST(BmpReader, FourBitNativeUnpacksNibbles) {
-    const TBytes bytes = Join(
-        {MakeHeader({.width = 3, .bits = 4, .colors_used = 1}), {1, 2, 3, 0}, {0xF1, 0x50, 0, 0}});
-    TReadResult result;
-    Read(bytes, result, {.native = true});
-    ASSERT_FALSE(result.failed);
-    EXPECT_EQ(result.bitmap.GetPixels_zm8(0, 0), 15);
-    EXPECT_EQ(result.bitmap.GetPixels_zm8(1, 0), 1);
-    EXPECT_EQ(result.bitmap.GetPixels_zm8(2, 0), 5);
+    TReadResult nibbles;
+    Read(Join({MakeHeader({.width = 3, .bits = 4, .colors_used = 1}),
+               {1, 2, 3, 0},
+               {0xF1, 0x50, 0, 0}}),
+         nibbles, {.native = true});
+    const std::uint8_t* row = nibbles.bitmap.GetScanLine(0);
+    EXPECT_EQ(TBytes(row, row + 3), (TBytes{15, 1, 5}));
+    // Two bits have colours only, five pixels 3 0 2 1 3.
+    TReadResult pairs;
+    Read(Join({MakeHeader({.width = 5, .bits = 2}),
+               {1, 2, 3, 0, 4, 5, 6, 0, 7, 8, 9, 0, 10, 11, 12, 0},
+               {0xC9, 0xC0, 0, 0}}),
+         pairs, {.native = true});
+    ASSERT_EQ(pairs.bitmap.GetPixelFormat(), zm24RGB);
+    EXPECT_EQ(pairs.At(0, 0), (TRGB{10, 11, 12}));
+    EXPECT_EQ(pairs.At(1, 0), (TRGB{1, 2, 3}));
+    EXPECT_EQ(pairs.At(2, 0), (TRGB{7, 8, 9}));
+    EXPECT_EQ(pairs.At(3, 0), (TRGB{4, 5, 6}));
+    EXPECT_EQ(pairs.At(4, 0), (TRGB{10, 11, 12}));
+    EXPECT_EQ(pairs.params.fBitsPerSample, 2);
 }
 
 TEST(BmpReader, SixteenBitMasksGiveTheShifts) {
@@ -293,19 +303,22 @@ TEST(BmpReader, SixteenBitMasksGiveTheShifts) {
 }
 
 TEST(BmpReader, MasksLieInLongHeadersAndBehindShortOnes) {
-    const TBytes masks = MakeMasks(0xF800, 0x07E0, 0x1F);
-    for (const std::uint32_t size : {40u, 52u, 56u, 64u, 108u, 124u}) {
-        SCOPED_TRACE(size);
-        TBytes bytes = MakeHeader({.size = size, .bits = 16, .compression = 3});
-        if (size == 40 || size == 64) {
-            bytes.insert(bytes.end(), masks.begin(), masks.end());
-        } else {
-            std::copy(masks.begin(), masks.end(), bytes.begin() + 14 + 40);
+    const TBytes three = MakeMasks(0xF800, 0x07E0, 0x1F);
+    for (const std::uint32_t compression : {3u, 6u}) {
+        const TBytes masks = compression == 3 ? three : Join({three, Dword(0)});
+        for (const std::uint32_t size : {40u, 52u, 56u, 64u, 108u, 124u}) {
+            SCOPED_TRACE(testing::Message() << compression << ", header " << size);
+            TBytes bytes = MakeHeader({.size = size, .bits = 16, .compression = compression});
+            if (size == 40 || size == 64) {
+                bytes.insert(bytes.end(), masks.begin(), masks.end());
+            } else {
+                std::copy(three.begin(), three.end(), bytes.begin() + 14 + 40);
+            }
+            TReadResult result;
+            Read(Join({bytes, {0xE0, 0x07, 0, 0}}), result);
+            ASSERT_FALSE(result.failed);
+            EXPECT_EQ(result.At(0, 0), (TRGB{0, 0xFC, 0}));
         }
-        TReadResult result;
-        Read(Join({bytes, {0xE0, 0x07, 0, 0}}), result);
-        ASSERT_FALSE(result.failed);
-        EXPECT_EQ(result.At(0, 0), (TRGB{0, 0xFC, 0}));
     }
 }
 
@@ -351,6 +364,16 @@ TEST(BmpReader, MasksOf32BitFiles) {
     EXPECT_EQ(result.alpha.GetWidth(), 0);
 }
 
+TBytes FromHex(const std::string& text) {
+    TBytes bytes;
+    for (std::size_t at = 0; at + 1 < text.size(); at += text[at] == ' ' ? 1 : 2) {
+        if (text[at] != ' ') {
+            bytes.push_back(static_cast<std::uint8_t>(std::stoi(text.substr(at, 2), nullptr, 16)));
+        }
+    }
+    return bytes;
+}
+
 // An RLE file of 4 x 3 pixels whose palette entry i is (i, i, i), i to 15.
 TBytes MakeRle(std::uint8_t bits, const TBytes& data, std::uint32_t height = 3) {
     TBytes palette;
@@ -387,59 +410,34 @@ TEST(BmpReader, DecodesRunLengthData) {
     const struct {
         const char* name;
         std::uint8_t bits;
-        TBytes data;
+        const char* data;  // hexadecimal
         const char* expected;
-        bool failed;
+        bool failed = false;
     } cases[] = {
-        {"runs and ends of line",
-         8,
-         {4, 1, 0, 0, 2, 2, 2, 3, 0, 0, 4, 4, 0, 1},
-         "4444/2233/1111",
-         false},
-        {"literals, odd ones padded",
-         8,
-         {0, 3, 1, 2, 3, 9, 1, 4, 0, 0, 0, 4, 5, 6, 7, 8, 0, 1},
-         "0000/5678/1234",
-         false},
-        {"uncovered pixels take entry 0",
-         8,
-         {1, 5, 0, 0, 0, 0, 1, 6, 0, 1},
-         "6000/0000/5000",
-         false},
-        {"past the row's end: the last pixel",
-         8,
-         {3, 1, 3, 2, 0, 0, 0, 5, 3, 4, 5, 6, 7, 0, 0, 1},
-         "0000/3457/1112",
-         false},
-        {"delta", 8, {0, 2, 2, 1, 1, 7, 0, 0, 4, 1, 0, 1}, "1111/0070/0000", false},
-        {"delta past the row's end", 8, {0, 2, 200, 0, 1, 7, 0, 1}, "0000/0000/0007", false},
-        {"delta past the last row", 8, {1, 3, 0, 2, 1, 9, 4, 5, 4, 6}, "0000/0000/3000", false},
-        {"lines past the last row", 8, {0, 0, 0, 0, 0, 0, 4, 1}, "0000/0000/0000", false},
-        {"early end mark is complete", 8, {4, 1, 0, 1}, "0000/0000/1111", false},
-        {"data end in the first row", 8, {4, 1}, "0000/0000/1111", true},
-        {"data end in the last row", 8, {0, 0, 0, 0, 2, 1}, "1100/0000/0000", false},
-        {"literals cut short", 8, {0, 4, 1, 2}, "0000/0000/1200", true},
-        {"delta cut short", 8, {0, 2, 1}, "0000/0000/0000", true},
-        {"a count without a value", 8, {4}, "0000/0000/0000", true},
-        {"nibbles alternate",
-         4,
-         {4, 0x12, 0, 0, 3, 0x34, 0, 0, 1, 0x5F, 0, 1},
-         "5000/3430/1212",
-         false},
-        {"nibble literals",
-         4,
-         {0, 3, 0x12, 0x30, 0, 0, 0, 4, 0x45, 0x67, 0, 1},
-         "0000/4567/1230",
-         false},
-        {"five nibbles: three bytes and a pad",
-         4,
-         {0, 5, 0x12, 0x34, 0x50, 0, 0, 0, 4, 0x66, 0, 1},
-         "0000/6666/1235",
-         false},
+        {"runs, ends of line", 8, "0401 0000 0202 0203 0000 0404 0001", "4444/2233/1111"},
+        {"literals, odd ones padded", 8, "0003 010203 09 0104 0000 0004 05060708 0001",
+         "0000/5678/1234"},
+        {"uncovered pixels take entry 0", 8, "0105 0000 0000 0106 0001", "6000/0000/5000"},
+        {"past the row's end: the last pixel", 8, "0301 0302 0000 0005 0304050607 00 0001",
+         "0000/3457/1112"},
+        {"delta", 8, "0002 0201 0107 0000 0401 0001", "1111/0070/0000"},
+        {"delta past the row's end", 8, "0002 C800 0107 0001", "0000/0000/0007"},
+        {"delta past the last row", 8, "0103 0002 0109 0405 0406", "0000/0000/3000"},
+        {"lines past the last row", 8, "0000 0000 0000 0401", "0000/0000/0000"},
+        {"early end mark is complete", 8, "0401 0001", "0000/0000/1111"},
+        {"data end in the first row", 8, "0401", "0000/0000/1111", true},
+        {"data end in the last row", 8, "0000 0000 0201", "1100/0000/0000"},
+        {"literals cut short", 8, "0004 0102", "0000/0000/1200", true},
+        {"delta cut short", 8, "0002 01", "0000/0000/0000", true},
+        {"a count without a value", 8, "04", "0000/0000/0000", true},
+        {"nibbles alternate", 4, "0412 0000 0334 0000 015F 0001", "5000/3430/1212"},
+        {"nibble literals", 4, "0003 1230 0000 0004 4567 0001", "0000/4567/1230"},
+        {"five nibbles: three bytes and a pad", 4, "0005 123450 00 0000 0466 0001",
+         "0000/6666/1235"},
     };
     for (const auto& c : cases) {
         SCOPED_TRACE(c.name);
-        ExpectRle(MakeRle(c.bits, c.data), c.expected, c.failed);
+        ExpectRle(MakeRle(c.bits, FromHex(c.data)), c.expected, c.failed);
     }
 }
 
@@ -459,21 +457,26 @@ TEST(BmpReader, ByteLimitEndsTheCompressedData) {
     std::copy(size.begin(), size.end(), bytes.begin() + 2);
     Read(bytes, result);
     EXPECT_TRUE(result.failed);
+    // But not one that ends before the pixels, which begin at 118.
+    bytes[10] = 118;
+    bytes[2] = 50;
+    Read(bytes, result);
+    EXPECT_FALSE(result.failed);
+    EXPECT_EQ(result.At(0, 0), (TRGB{3, 3, 3}));
 }
 
 TEST(BmpReader, TruncationAtEveryByteFails) {
     for (std::size_t size = 0; size < kFile24.size(); ++size) {
         SCOPED_TRACE(size);
         TReadResult result;
-        Read(TBytes(kFile24.begin(), kFile24.begin() + static_cast<std::ptrdiff_t>(size)), result);
-        EXPECT_TRUE(result.failed);
+        Read(test::FirstBytes(kFile24, size), result);
+        EXPECT_EQ(result.failed, size < kFile24.size() - 2);  // the last row's padding may lack
     }
     constexpr std::size_t kLastRowReached = 66;  // behind the first row's end of line
     for (std::size_t size = 0; size < kFileRle8.size(); ++size) {
         SCOPED_TRACE(size);
         TReadResult result;
-        Read(TBytes(kFileRle8.begin(), kFileRle8.begin() + static_cast<std::ptrdiff_t>(size)),
-             result);
+        Read(test::FirstBytes(kFileRle8, size), result);
         EXPECT_EQ(result.failed, size < kLastRowReached);
     }
 }
@@ -492,44 +495,27 @@ TEST(BmpReader, UndeliveredRowsAreCleared) {
 
 TEST(BmpReader, HeaderFieldsAtTheirLimits) {
     constexpr std::uint32_t kSign = 0x80000000;
+    constexpr std::uint32_t kMax = 0xFFFFFFFF;
+    constexpr std::uint32_t kMost = 0x7FFFFFFF;
     const struct {
-        const char* name;
         std::size_t at;
         std::uint32_t value;
         bool failed;
     } cases[] = {
-        {"offset 1: the headers read as pixels", 10, 1, false},
-        {"offset past the end", 10, 0xFFFFFFFF, true},
-        {"offset sign bit", 10, kSign, true},
-        {"offset at the end", 10, 70, true},
-        {"header size 0", 14, 0, true},
-        {"header size 1", 14, 1, true},
-        {"header size beyond the file", 14, 71, true},
-        {"header size max", 14, 0xFFFFFFFF, true},
-        {"width 0", 18, 0, false},
-        {"width max", 18, 0x7FFFFFFF, true},
-        {"width negative", 18, 0xFFFFFFFF, true},
-        {"width sign bit", 18, kSign, true},
-        {"height 0", 22, 0, false},
-        {"height 1", 22, 1, false},
-        {"height max", 22, 0x7FFFFFFF, true},
-        {"height -1", 22, 0xFFFFFFFF, false},
-        {"height sign bit", 22, kSign, true},
-        {"bits 0", 26, 0x00000001, true},
-        {"bits 2", 26, 0x00020001, true},
-        {"bits 64", 26, 0x00400001, true},
-        {"bits 280", 26, 0x01180001, true},
-        {"bits max", 26, 0xFFFF0001, true},
-        {"compression 1 at 24 bits", 30, 1, true},
-        {"compression 3 at 24 bits", 30, 3, true},
-        {"compression 4", 30, 4, true},
-        {"compression max", 30, 0xFFFFFFFF, true},
-        {"resolution max", 38, 0x7FFFFFFF, false},
-        {"resolution sign bit", 38, kSign, false},
-        {"colours used max", 46, 0xFFFFFFFF, false},
-    };
+        // Offset (1 takes the headers as pixels), header size, width, height, planes and bits,
+        // compression, resolution, colours used.
+        {10, 1, false},         {10, kMax, true},       {10, kSign, true},
+        {10, 70, true},         {14, 0, true},          {14, 1, true},
+        {14, 71, true},         {14, kMax, true},       {18, 0, false},
+        {18, kMost, true},      {18, kMax, true},       {18, kSign, true},
+        {22, 0, false},         {22, 1, false},         {22, kMost, true},
+        {22, kMax, false},      {22, kSign, true},      {26, 0x00000001, true},
+        {26, 0x00030001, true}, {26, 0x01180001, true}, {26, 0xFFFF0001, true},
+        {30, 1, true},          {30, 3, false},         {30, 4, true},
+        {30, kMax, true},       {38, kMost, false},     {38, kSign, false},
+        {46, kMax, false}};
     for (const auto& c : cases) {
-        SCOPED_TRACE(c.name);
+        SCOPED_TRACE(testing::Message() << c.value << " at " << c.at);
         TBytes bytes = kFile24;
         const TBytes value = Dword(c.value);
         std::copy(value.begin(), value.end(), bytes.begin() + static_cast<std::ptrdiff_t>(c.at));
@@ -544,8 +530,8 @@ TEST(BmpReader, CompressionMustFitTheDepth) {
     const struct {
         std::uint8_t bits;
         std::uint32_t compression;
-    } cases[] = {{1, 1}, {1, 2},  {1, 3},  {4, 1},  {4, 3},  {8, 2},
-                 {8, 3}, {16, 1}, {16, 2}, {32, 1}, {32, 2}, {32, 6}};
+    } cases[] = {{1, 1}, {1, 2},  {1, 3},  {2, 1},  {4, 1},  {4, 3},  {8, 2},
+                 {8, 3}, {16, 1}, {16, 2}, {24, 6}, {32, 1}, {32, 2}, {32, 5}};
     for (const auto& c : cases) {
         TReadResult result;
         Read(Join({MakeHeader({.bits = c.bits, .compression = c.compression}), TBytes(2000, 0)}),
@@ -571,16 +557,13 @@ TEST(BmpReader, SizesAreRefusedBeforeAllocation) {
     }
 }
 
-TEST(BmpReader, EmptySizesLeaveTheBitmapAlone) {
-    TReadResult result;
-    Read(kFile24, result);
-    Read(Join({MakeHeader({.width = 0}), {0, 0, 0, 0}}), result);
-    EXPECT_FALSE(result.failed);
-    EXPECT_EQ(result.bitmap.GetWidth(), 2);
-    EXPECT_EQ(result.params.fWidth, 0);
-}
-
-TEST(BmpReader, ParamsOnlyLeavesTheBitmapAlone) {
+TEST(BmpReader, ParamsOnlyAndEmptySizesLeaveTheBitmapAlone) {
+    TReadResult empty;
+    Read(kFile24, empty);
+    Read(Join({MakeHeader({.width = 0}), {0, 0, 0, 0}}), empty);
+    EXPECT_FALSE(empty.failed);
+    EXPECT_EQ(empty.bitmap.GetWidth(), 2);
+    EXPECT_EQ(empty.params.fWidth, 0);
     TReadResult result;
     TBytes bytes = kFileRle8;
     bytes.resize(62);  // no pixels are needed
@@ -634,28 +617,20 @@ TEST(BmpReader, LongRows) {
 
 TEST(BmpReader, StopsWhenToldAndReportsEachPercentOnce) {
     const TBytes bytes = Join({MakeHeader({.height = 4}), TBytes(16, 0x55)});
-    std::vector<std::int32_t> seen;
-    for (const std::int32_t stop_at : {100, 25, 75}) {
+    for (const std::int32_t steps : {1, 3, 0}) {  // 0: to the end
         TMemoryStream stream(bytes);
         TReadResult result;
-        TProgressRec progress;
-        progress.Aborting = &result.failed;
-        seen.clear();
-        progress.fOnProgress = [&](void*, std::int32_t percent) {
-            seen.push_back(percent);
-            result.failed = percent >= stop_at;
-        };
-        ReadBMPStream(stream, result.bitmap, 0, true, result.alpha, false, false, progress,
+        test::TTestProgress progress(steps);
+        ReadBMPStream(stream, result.bitmap, 0, true, result.alpha, false, false, progress.record,
                       result.params);
-        EXPECT_EQ(result.failed, stop_at < 100);
-        const std::int32_t rows_read = std::min(stop_at, 100) / 25;
+        EXPECT_EQ(progress.aborting, steps != 0);
         for (std::int32_t y = 0; y < 4; ++y) {
-            const TRGB expected = 3 - y < rows_read ? TRGB{0x55, 0x55, 0x55} : kBlack;
-            EXPECT_EQ(result.At(0, y), expected) << stop_at << ", row " << y;
+            const bool is_read = steps == 0 || 3 - y < steps;
+            EXPECT_EQ(result.At(0, y), (is_read ? TRGB{0x55, 0x55, 0x55} : kBlack)) << y;
         }
-        if (stop_at == 100) {
-            EXPECT_EQ(seen, (std::vector<std::int32_t>{25, 50, 75}));
-        }
+        const std::vector<std::int32_t> all{25, 50, 75};
+        const std::ptrdiff_t seen = steps == 0 ? 3 : steps;
+        EXPECT_EQ(progress.percents, (std::vector<std::int32_t>(all.begin(), all.begin() + seen)));
     }
 }
 

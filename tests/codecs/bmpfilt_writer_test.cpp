@@ -12,6 +12,7 @@
 #include "engine/codecs/bmpfilt_p.h"
 #include "engine/foundation/zmstreams.h"
 #include "engine/io/zmioparams.h"
+#include "tests/codecs/codecstreams.h"
 #include "tests/support/testimages.h"
 
 namespace zm {
@@ -19,26 +20,10 @@ namespace {
 
 using TBytes = std::vector<std::uint8_t>;
 
-// A stream that takes `room` bytes in all and no more.
-class TFullDiskStream : public TMemoryStream {
-public:
-    explicit TFullDiskStream(std::int64_t room) : room_(room) {}
-    std::int32_t Write(const void* buffer, std::int32_t count) override {
-        const auto taken = static_cast<std::int32_t>(std::min<std::int64_t>(room_, count));
-        room_ -= taken;
-        return taken > 0 ? TMemoryStream::Write(buffer, taken) : 0;
-    }
-
-private:
-    std::int64_t room_;
-};
-
 bool WriteTo(TStream& stream, TZmBitmap& bitmap, TIOParams& params, bool with_alpha = false) {
-    bool failed = false;
-    TProgressRec progress;
-    progress.Aborting = &failed;
-    WriteBMPStream(stream, bitmap, params, with_alpha, progress);
-    return !failed;
+    test::TTestProgress progress;
+    WriteBMPStream(stream, bitmap, params, with_alpha, progress.record);
+    return !progress.aborting;
 }
 
 TBytes Write(TZmBitmap& bitmap, TIOParams& params, bool with_alpha = false) {
@@ -56,13 +41,11 @@ struct TReadBack {
 
 void ReadBack(const TBytes& bytes, TReadBack& result, bool native) {
     TMemoryStream stream(bytes);
-    bool failed = false;
-    TProgressRec progress;
-    progress.Aborting = &failed;
+    test::TTestProgress progress;
     result.params.fNativePixelFormat = native;
-    ReadBMPStream(stream, result.bitmap, 0, false, result.alpha, false, false, progress,
+    ReadBMPStream(stream, result.bitmap, 0, false, result.alpha, false, false, progress.record,
                   result.params);
-    ASSERT_FALSE(failed);
+    ASSERT_FALSE(progress.aborting);
 }
 
 // 2 x 2: blue, green over red, grey 0x808080.
@@ -74,16 +57,18 @@ void MakeFourColors(TZmBitmap& bitmap) {
     bitmap.SetPixels_zm24RGB(1, 1, TRGB{128, 128, 128});
 }
 
-TBytes EncodeRow8(const TBytes& indices) {
+TBytes EncodeRow(const TBytes& indices, int bits) {
     TBytes output;
-    EncodeBmpRle8Row(indices, output);
+    (bits == 8 ? EncodeBmpRle8Row : EncodeBmpRle4Row)(indices, output);
     return output;
 }
 
-TBytes EncodeRow4(const TBytes& indices) {
-    TBytes output;
-    EncodeBmpRle4Row(indices, output);
-    return output;
+TBytes Tail(const TBytes& file, std::size_t count) {
+    return {file.end() - static_cast<std::ptrdiff_t>(count), file.end()};
+}
+
+TBytes Part(const TBytes& file, std::ptrdiff_t from, std::ptrdiff_t to) {
+    return {file.begin() + from, file.begin() + to};
 }
 
 TEST(BmpWriter, Writes24Bits) {
@@ -114,9 +99,9 @@ TEST(BmpWriter, Writes32BitsOnlyWithHandledAlpha) {
     const TBytes with = Write(bitmap, params, /*with_alpha=*/true);
     ASSERT_EQ(with.size(), 54u + 16u);
     EXPECT_EQ(with[28], 32);
-    EXPECT_EQ(TBytes(with.begin() + 46, with.begin() + 54), TBytes(8, 0));
+    EXPECT_EQ(Part(with, 46, 54), TBytes(8, 0));
     const TBytes pixels = {0, 0, 255, 255, 128, 128, 128, 255, 255, 0, 0, 7, 0, 255, 0, 255};
-    EXPECT_EQ(TBytes(with.begin() + 54, with.end()), pixels);
+    EXPECT_EQ(Tail(with, 16), pixels);
     const TBytes without = Write(bitmap, params, /*with_alpha=*/false);
     EXPECT_EQ(without[28], 24);
     EXPECT_TRUE(bitmap.HasAlphaChannel());
@@ -140,7 +125,7 @@ TEST(BmpWriter, WritesOneBit) {
         0xFF, 0xC0, 0, 0, 0xAA, 0x80, 0,   0,
     };
     ASSERT_EQ(file.size(), 70u);
-    EXPECT_EQ(TBytes(file.begin() + 46, file.end()), tail);
+    EXPECT_EQ(Tail(file, 24), tail);
     // The 12-byte header has three bytes an entry.
     params.fBMP_Version = ioBMP_BMOS2V1;
     const TBytes expected = {
@@ -160,7 +145,7 @@ TEST(BmpWriter, OneBitKeepsTwoColoursAndThresholdsMore) {
     params.fBitsPerSample = 1;
     const TBytes file = Write(two, params);
     const TBytes tail = {200, 0, 0, 0, 0, 255, 255, 0, 0xA0, 0, 0, 0};
-    EXPECT_EQ(TBytes(file.end() - 12, file.end()), tail);
+    EXPECT_EQ(Tail(file, 12), tail);
     TZmBitmap ramp;
     ASSERT_TRUE(ramp.Allocate(4, 1, zm8g));
     for (std::int32_t x = 0; x < 4; ++x) {
@@ -168,7 +153,7 @@ TEST(BmpWriter, OneBitKeepsTwoColoursAndThresholdsMore) {
     }
     const TBytes gray = Write(ramp, params);
     const TBytes black_white = {0, 0, 0, 0, 255, 255, 255, 0, 0x30, 0, 0, 0};
-    EXPECT_EQ(TBytes(gray.end() - 12, gray.end()), black_white);
+    EXPECT_EQ(Tail(gray, 12), black_white);
     EXPECT_EQ(ramp.GetPixelFormat(), zm8g);
 }
 
@@ -180,34 +165,29 @@ TEST(BmpWriter, WritesFourBitsWithTheLongOs2Header) {
     params.fBMP_Version = ioBMP_BMOS2V2;
     const TBytes file = Write(bitmap, params);
     ASSERT_EQ(file.size(), 14u + 64u + 64u + 8u);
-    EXPECT_EQ(TBytes(file.begin() + 2, file.begin() + 6), (TBytes{150, 0, 0, 0}));
-    EXPECT_EQ(TBytes(file.begin() + 10, file.begin() + 18), (TBytes{142, 0, 0, 0, 64, 0, 0, 0}));
-    EXPECT_EQ(TBytes(file.begin() + 34, file.begin() + 38), (TBytes{0, 0, 0, 0}));  // data size
-    EXPECT_EQ(TBytes(file.begin() + 54, file.begin() + 78), TBytes(24, 0));         // the OS/2 tail
+    EXPECT_EQ(Part(file, 2, 6), (TBytes{150, 0, 0, 0}));
+    EXPECT_EQ(Part(file, 10, 18), (TBytes{142, 0, 0, 0, 64, 0, 0, 0}));
+    EXPECT_EQ(Part(file, 34, 38), (TBytes{0, 0, 0, 0}));  // data size
+    EXPECT_EQ(Part(file, 54, 78), TBytes(24, 0));         // the OS/2 tail
     // Few colours stand in the palette as they turn up from the top.
     const TBytes palette = {255, 0, 0, 0, 0, 255, 0, 0, 0, 0, 255, 0, 128, 128, 128, 0};
-    EXPECT_EQ(TBytes(file.begin() + 78, file.begin() + 94), palette);
-    EXPECT_EQ(TBytes(file.end() - 8, file.end()), (TBytes{0x23, 0, 0, 0, 0x01, 0, 0, 0}));
+    EXPECT_EQ(Part(file, 78, 94), palette);
+    EXPECT_EQ(Tail(file, 8), (TBytes{0x23, 0, 0, 0, 0x01, 0, 0, 0}));
     EXPECT_EQ(params.fColorMapCount, 16);
     EXPECT_EQ(params.fColorMap[2], (TRGB{0, 0, 255}));
 }
 
-TEST(BmpWriter, TakesIndicesAndGreysAsTheyStand) {
-    auto palette_image = test::MakeGradient(zm8p, 5, 3);
+TEST(BmpWriter, TakesGreysAsTheyStand) {
     TIOParams params;
     params.UpdateBPSAndSPP(zm8p);
-    TReadBack result;
-    ReadBack(Write(*palette_image, params), result, /*native=*/true);
-    test::ExpectSamePixels(*palette_image, result.bitmap);
     TZmBitmap gray;
     ASSERT_TRUE(gray.Allocate(3, 1, zm8g));
     gray.SetPixels_zm8(0, 0, 0);
     gray.SetPixels_zm8(1, 0, 77);
     gray.SetPixels_zm8(2, 0, 255);
     const TBytes file = Write(gray, params);
-    EXPECT_EQ(TBytes(file.end() - 4, file.end()), (TBytes{0, 77, 255, 0}));
-    EXPECT_EQ(TBytes(file.begin() + 54 + 77 * 4, file.begin() + 54 + 78 * 4),
-              (TBytes{77, 77, 77, 0}));
+    EXPECT_EQ(Tail(file, 4), (TBytes{0, 77, 255, 0}));
+    EXPECT_EQ(Part(file, 54 + 77 * 4, 54 + 78 * 4), (TBytes{77, 77, 77, 0}));
 }
 
 TEST(BmpWriter, FourBitsFromMoreThanSixteenColours) {
@@ -234,28 +214,31 @@ TEST(BmpWriter, FourBitsFromMoreThanSixteenColours) {
     EXPECT_EQ(indices.GetPixels_zm8(0, 0), 200);
 }
 
-TEST(BmpWriter, EncodesRle8Rows) {
-    EXPECT_EQ(EncodeRow8({5}), (TBytes{1, 5, 0, 0}));
-    EXPECT_EQ(EncodeRow8({5, 6}), (TBytes{1, 5, 1, 6, 0, 0}));
-    EXPECT_EQ(EncodeRow8({5, 6, 7}), (TBytes{0, 3, 5, 6, 7, 0, 0, 0}));
-    EXPECT_EQ(EncodeRow8({5, 6, 7, 8}), (TBytes{0, 4, 5, 6, 7, 8, 0, 0}));
-    EXPECT_EQ(EncodeRow8({5, 5}), (TBytes{2, 5, 0, 0}));
-    EXPECT_EQ(EncodeRow8({5, 6, 6, 6, 7}), (TBytes{1, 5, 3, 6, 1, 7, 0, 0}));
-    EXPECT_EQ(EncodeRow8({1, 1, 2, 2}), (TBytes{2, 1, 2, 2, 0, 0}));
-    EXPECT_EQ(EncodeRow8(TBytes(255, 9)), (TBytes{255, 9, 0, 0}));
-    EXPECT_EQ(EncodeRow8(TBytes(256, 9)), (TBytes{255, 9, 1, 9, 0, 0}));
-    EXPECT_EQ(EncodeRow8(TBytes(258, 9)), (TBytes{255, 9, 3, 9, 0, 0}));
-}
-
-TEST(BmpWriter, EncodesRle4Rows) {
-    EXPECT_EQ(EncodeRow4({5}), (TBytes{1, 0x50, 0, 0}));
-    EXPECT_EQ(EncodeRow4({5, 6}), (TBytes{2, 0x56, 0, 0}));
-    EXPECT_EQ(EncodeRow4({5, 6, 7}), (TBytes{0, 3, 0x56, 0x70, 0, 0}));
-    EXPECT_EQ(EncodeRow4({5, 6, 7, 8}), (TBytes{0, 4, 0x56, 0x78, 0, 0}));
-    EXPECT_EQ(EncodeRow4({5, 6, 7, 8, 9}), (TBytes{0, 5, 0x56, 0x78, 0x90, 0, 0, 0}));
-    EXPECT_EQ(EncodeRow4({5, 6, 7, 8, 9, 10}), (TBytes{0, 6, 0x56, 0x78, 0x9A, 0, 0, 0}));
-    EXPECT_EQ(EncodeRow4({15, 15, 15, 1}), (TBytes{3, 0xFF, 1, 0x10, 0, 0}));
-    EXPECT_EQ(EncodeRow4(TBytes(256, 3)), (TBytes{255, 0x33, 1, 0x30, 0, 0}));
+TEST(BmpWriter, EncodesRunLengthRows) {
+    const struct {
+        int bits;
+        TBytes indices;
+        TBytes expected;
+    } cases[] = {
+        {8, {5}, {1, 5, 0, 0}},
+        {8, {5, 6}, {1, 5, 1, 6, 0, 0}},
+        {8, {5, 6, 7}, {0, 3, 5, 6, 7, 0, 0, 0}},
+        {8, {5, 6, 7, 8}, {0, 4, 5, 6, 7, 8, 0, 0}},
+        {8, {5, 6, 6, 6, 7}, {1, 5, 3, 6, 1, 7, 0, 0}},
+        {8, {1, 1, 2, 2}, {2, 1, 2, 2, 0, 0}},
+        {8, TBytes(255, 9), {255, 9, 0, 0}},
+        {8, TBytes(256, 9), {255, 9, 1, 9, 0, 0}},
+        {4, {5}, {1, 0x50, 0, 0}},
+        {4, {5, 6}, {2, 0x56, 0, 0}},
+        {4, {5, 6, 7}, {0, 3, 0x56, 0x70, 0, 0}},
+        {4, {5, 6, 7, 8, 9}, {0, 5, 0x56, 0x78, 0x90, 0, 0, 0}},
+        {4, {5, 6, 7, 8, 9, 10}, {0, 6, 0x56, 0x78, 0x9A, 0, 0, 0}},
+        {4, {15, 15, 15, 1}, {3, 0xFF, 1, 0x10, 0, 0}},
+        {4, TBytes(256, 3), {255, 0x33, 1, 0x30, 0, 0}},
+    };
+    for (const auto& c : cases) {
+        EXPECT_EQ(EncodeRow(c.indices, c.bits), c.expected);
+    }
 }
 
 // Literals are flushed once 256 have gathered: a piece of 255 with its pad, and one alone.
@@ -264,7 +247,7 @@ TEST(BmpWriter, EncodesLongStretchesOfLiterals) {
     for (std::int32_t i = 0; i < 300; ++i) {
         indices.push_back(static_cast<std::uint8_t>(i % 7));
     }
-    const TBytes encoded = EncodeRow8(indices);
+    const TBytes encoded = EncodeRow(indices, 8);
     TBytes expected = {0, 255};
     expected.insert(expected.end(), indices.begin(), indices.begin() + 255);
     const TBytes middle = {0, 1, indices[255], 0, 44};
@@ -272,7 +255,7 @@ TEST(BmpWriter, EncodesLongStretchesOfLiterals) {
     expected.insert(expected.end(), indices.begin() + 256, indices.end());
     expected.insert(expected.end(), {0, 0});
     EXPECT_EQ(encoded, expected);
-    const TBytes nibbles = EncodeRow4(indices);
+    const TBytes nibbles = EncodeRow(indices, 4);
     // 2 + 128 bytes, then 1 pixel, then 2 + 22 bytes, then the end of the line.
     ASSERT_EQ(nibbles.size(), 130u + 2u + 24u + 2u);
     EXPECT_EQ(nibbles[1], 255);
@@ -296,7 +279,7 @@ TEST(BmpWriter, WritesRunLengthFilesWithTheirEndMark) {
     ASSERT_EQ(file.size(), 54u + 1024u + data.size());
     EXPECT_EQ(file[30], 1);
     EXPECT_EQ(file[34], data.size());
-    EXPECT_EQ(TBytes(file.end() - static_cast<std::ptrdiff_t>(data.size()), file.end()), data);
+    EXPECT_EQ(Tail(file, data.size()), data);
     params.fBitsPerSample = 4;
     EXPECT_EQ(Write(bitmap, params)[30], 2);
     // Without a field for the compression, and without an encoder, rows go out plain.
@@ -314,8 +297,10 @@ TEST(BmpWriter, ShortWritesFail) {
     TIOParams params;
     constexpr std::int64_t kAllBytes = 70 + 54;  // the headers are written twice
     for (std::int64_t room = 0; room <= kAllBytes; ++room) {
-        TFullDiskStream stream(room);
-        EXPECT_EQ(WriteTo(stream, bitmap, params), room == kAllBytes) << room;
+        for (const bool raises : {false, true}) {
+            test::TFullStream stream(room, raises);
+            EXPECT_EQ(WriteTo(stream, bitmap, params), room == kAllBytes) << room;
+        }
     }
 }
 
@@ -330,7 +315,7 @@ TEST(BmpWriter, RefusesWhatTheFileCannotHold) {
     EXPECT_FALSE(WriteTo(stream, wide, params));
 }
 
-TEST(BmpWriter, WritesBehindWhatTheStreamHolds) {
+TEST(BmpWriter, WritesBehindWhatTheStreamHoldsAndStopsWhenTold) {
     TZmBitmap bitmap;
     MakeFourColors(bitmap);
     TIOParams params;
@@ -338,61 +323,43 @@ TEST(BmpWriter, WritesBehindWhatTheStreamHolds) {
     TMemoryStream stream;
     stream.WriteBuffer("xyz", 3);
     ASSERT_TRUE(WriteTo(stream, bitmap, params));
-    const TBytes& all = stream.Bytes();
-    EXPECT_EQ(TBytes(all.begin() + 3, all.end()), alone);
+    EXPECT_EQ(Tail(stream.Bytes(), alone.size()), alone);
+    TMemoryStream stopped;
+    test::TTestProgress progress(1);
+    WriteBMPStream(stopped, bitmap, params, false, progress.record);
+    EXPECT_TRUE(progress.aborting);
+    EXPECT_EQ(stopped.GetSize(), 54 + 8);
+    EXPECT_EQ(stopped.Bytes()[10], 0);  // the header was not completed
 }
 
-TEST(BmpWriter, StopsWhenTold) {
-    TZmBitmap bitmap;
-    ASSERT_TRUE(bitmap.Allocate(1, 4, zm24RGB));
-    bitmap.Fill(0.0);
-    TIOParams params;
-    TMemoryStream stream;
-    bool failed = false;
-    TProgressRec progress;
-    progress.Aborting = &failed;
-    progress.fOnProgress = [&](void*, std::int32_t percent) { failed = percent == 50; };
-    WriteBMPStream(stream, bitmap, params, false, progress);
-    EXPECT_TRUE(failed);
-    EXPECT_EQ(stream.GetSize(), 54 + 8);
-    EXPECT_EQ(stream.Bytes()[10], 0);  // the header was not completed
-}
-
-struct TRoundTripCase {
-    TZmPixelFormat format;
-    TIOBMPVersion version;
-    TIOBMPCompression compression;
-};
-
-class BmpRoundTrip : public testing::TestWithParam<TRoundTripCase> {};
-
-TEST_P(BmpRoundTrip, KeepsPixels) {
-    const TRoundTripCase& c = GetParam();
+TEST(BmpRoundTrip, KeepsPixels) {
+    const struct {
+        TZmPixelFormat format;
+        TIOBMPVersion version;
+        TIOBMPCompression compression;
+    } cases[] = {
+        {zm1g, ioBMP_BM3, ioBMP_UNCOMPRESSED},  {zm1g, ioBMP_BMOS2V1, ioBMP_RLE},
+        {zm8p, ioBMP_BM3, ioBMP_UNCOMPRESSED},  {zm8p, ioBMP_BM3, ioBMP_RLE},
+        {zm8p, ioBMP_BMOS2V1, ioBMP_RLE},       {zm8p, ioBMP_BMOS2V2, ioBMP_RLE},
+        {zm24RGB, ioBMP_BM3, ioBMP_RLE},        {zm24RGB, ioBMP_BMOS2V1, ioBMP_UNCOMPRESSED},
+        {zm24RGB, ioBMP_V5, ioBMP_UNCOMPRESSED}};
     constexpr std::int32_t kSizes[][2] = {{1, 1},  {1, 2},  {7, 1},  {3, 3},  {16, 15},
                                           {31, 5}, {32, 4}, {33, 7}, {301, 2}};
-    for (const auto& size : kSizes) {
-        SCOPED_TRACE(testing::Message() << size[0] << " x " << size[1]);
-        auto source = test::MakeNoise(c.format, size[0], size[1], 17);
-        TIOParams params;
-        params.UpdateBPSAndSPP(c.format);
-        params.fBMP_Version = c.version;
-        params.fBMP_Compression = c.compression;
-        TReadBack result;
-        ReadBack(Write(*source, params), result, c.format == zm8p);
-        test::ExpectSamePixels(*source, result.bitmap);
+    for (const auto& c : cases) {
+        for (const auto& size : kSizes) {
+            SCOPED_TRACE(testing::Message() << "format " << c.format << " version " << c.version
+                                            << ", " << size[0] << " x " << size[1]);
+            auto source = test::MakeNoise(c.format, size[0], size[1], 17);
+            TIOParams params;
+            params.UpdateBPSAndSPP(c.format);
+            params.fBMP_Version = c.version;
+            params.fBMP_Compression = c.compression;
+            TReadBack result;
+            ReadBack(Write(*source, params), result, c.format == zm8p);
+            test::ExpectSamePixels(*source, result.bitmap);
+        }
     }
 }
-
-INSTANTIATE_TEST_SUITE_P(All, BmpRoundTrip,
-                         testing::Values(TRoundTripCase{zm1g, ioBMP_BM3, ioBMP_UNCOMPRESSED},
-                                         TRoundTripCase{zm1g, ioBMP_BMOS2V1, ioBMP_RLE},
-                                         TRoundTripCase{zm8p, ioBMP_BM3, ioBMP_UNCOMPRESSED},
-                                         TRoundTripCase{zm8p, ioBMP_BM3, ioBMP_RLE},
-                                         TRoundTripCase{zm8p, ioBMP_BMOS2V1, ioBMP_RLE},
-                                         TRoundTripCase{zm8p, ioBMP_BMOS2V2, ioBMP_RLE},
-                                         TRoundTripCase{zm24RGB, ioBMP_BM3, ioBMP_RLE},
-                                         TRoundTripCase{zm24RGB, ioBMP_BMOS2V1, ioBMP_UNCOMPRESSED},
-                                         TRoundTripCase{zm24RGB, ioBMP_V5, ioBMP_UNCOMPRESSED}));
 
 TEST(BmpRoundTrip, KeepsAlphaAndNibbles) {
     auto source = test::MakeNoise(zm24RGB, 33, 9, 5);

@@ -7,9 +7,11 @@
 #include <string>
 
 #include "engine/bitmap/zmmask.h"
+#include "engine/codecs/bmpfilt.h"
 #include "engine/codecs/jpegfilt.h"
 #include "engine/codecs/jpegfilt_p.h"
 #include "engine/codecs/pngfilt.h"
+#include "engine/codecs/wbmpfilt.h"
 #include "engine/io/zalmoio.h"
 #include "engine/io/zmioparams.h"
 #include "tests/codecs/allocprobe.h"
@@ -19,7 +21,7 @@
 #include "tests/support/testimages.h"
 
 // PNG and JPEG when memory ends anywhere, how much of it they take beside their libraries, and
-// streams that raise.
+// the readers over streams that raise.
 namespace zm::test {
 namespace {
 
@@ -266,15 +268,36 @@ TEST(CodecMemory, SavesTakeNoSecondImage) {
     }
 }
 
+void ReadBmp(TStream& stream, TZmBitmap& bitmap, TProgressRec& progress, TIOParams& params) {
+    TZmMask alpha;
+    ReadBMPStream(stream, bitmap, 0, false, alpha, false, false, progress, params);
+}
+
+void ReadWbmp(TStream& stream, TZmBitmap& bitmap, TProgressRec& progress, TIOParams& params) {
+    ReadWBMPStream(stream, bitmap, params, /*params_only=*/false, progress);
+}
+
 TEST(CodecStreams, StreamsThatRaiseAnywhereEndAsFailure) {
-    for (const bool is_png : {true, false}) {
-        const TBytes file = is_png ? RichPng() : RichJpeg(false);
-        for (std::size_t good = 0; good < file.size(); ++good) {
-            TRaisingStream stream(file, static_cast<std::int64_t>(good));
+    const auto saved = [](std::int32_t type) {
+        TMemoryStream stream;
+        TIOParams params;
+        EXPECT_TRUE(MakeGradient(zm1g, 40, 9)->Write(&stream, type, &params));
+        return stream.Bytes();
+    };
+    struct {
+        TBytes file;
+        decltype(ReadPng)* read;
+    } const cases[] = {{RichPng(), ReadPng},
+                       {RichJpeg(false), ReadJpeg},
+                       {saved(ioBMP), ReadBmp},
+                       {saved(ioWBMP), ReadWbmp}};
+    for (const auto& one : cases) {
+        for (std::size_t good = 0; good < one.file.size(); ++good) {
+            TRaisingStream stream(one.file, static_cast<std::int64_t>(good));
             TTestProgress progress;
             TZmBitmap bitmap;
             TIOParams params;
-            ASSERT_NO_THROW((is_png ? ReadPng : ReadJpeg)(stream, bitmap, progress.record, params));
+            ASSERT_NO_THROW(one.read(stream, bitmap, progress.record, params));
             ASSERT_TRUE(progress.aborting) << good;
         }
     }

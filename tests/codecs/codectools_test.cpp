@@ -12,8 +12,8 @@
 #include "tests/support/testimages.h"
 #include "tests/support/testprocess.h"
 
-// Programs from elsewhere as the other opinion: what they see in the sample files and in what we
-// write. A test whose program is not installed says so.
+// Programs from elsewhere as the other opinion: what they see in what we write, and how
+// they turn photos. A test whose program is not installed says so.
 namespace zm::test {
 namespace {
 
@@ -70,36 +70,6 @@ void ExpectWithin(const TPlainPicture& expected, TZmBitmap& actual, int bound) {
 
 bool IsOnCommandLine(const std::filesystem::path& path) {
     return path.string().find_first_of(" '\"#&()") == std::string::npos;
-}
-
-TEST(CodecTools, CorpusJpegsAsTheLibrarysDecoderSeesThem) {
-    const TempFolder folder;
-    if (!CorpusFolder() || !HasTool("djpeg -version", folder)) {
-        GTEST_SKIP() << "djpeg or the folder of sample files is not there";
-    }
-    int files = 0;
-    for (const CorpusEntry& entry : CorpusEntries()) {
-        if (entry.format != "jpeg" || !IsOnCommandLine(entry.path)) {
-            continue;
-        }
-        SCOPED_TRACE(entry.path.string());
-        const std::filesystem::path out = folder.File("djpeg.ppm");
-        const std::string command =
-            "djpeg -dct int -pnm -outfile " + out.string() + " " + entry.path.string();
-        const bool is_good = RunProcess(command, folder.Path()).exit_status == 0;
-        TZmBitmap bitmap;
-        TIOParams params;
-        const bool is_read = bitmap.Read(EngineName(entry.path), &params, /*check_unknown=*/true);
-        if (!is_good || !is_read) {
-            EXPECT_FALSE(is_good && is_read);
-            continue;
-        }
-        TPlainPicture expected;
-        ReadPlainPicture(out, expected);
-        ExpectWithin(expected, bitmap, 1);
-        ++files;
-    }
-    EXPECT_GT(files, 40);
 }
 
 /// Saves through the driver, as programs do.

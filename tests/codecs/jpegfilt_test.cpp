@@ -7,8 +7,7 @@
 
 #include "engine/codecs/jpegfilt_p.h"
 #include "engine/io/zmioparams.h"
-#include "tests/codecs/codecstreams.h"
-#include "tests/codecs/jpegraw.h"
+#include "tests/codecs/jpegload.h"
 #include "tests/support/testimages.h"
 
 namespace zm::test {
@@ -16,105 +15,63 @@ namespace {
 
 using TBytes = std::vector<std::uint8_t>;
 
-struct TLoaded {
-    TZmBitmap bitmap;
-    TIOParams params;
-    TTestProgress progress;
-    TJpegReadOptions options;
-};
-
-void Load(TLoaded& loaded, const TBytes& bytes) {
-    TBorrowedMemoryStream stream(bytes.data(), static_cast<std::int64_t>(bytes.size()));
-    ReadJPEGStream(stream, loaded.bitmap, loaded.options, loaded.progress.record, loaded.params);
-}
-
-void ExpectRgb(const TRawJpeg& raw, TZmBitmap& bitmap) {
-    ASSERT_TRUE(raw.is_good);
-    ASSERT_EQ(bitmap.GetPixelFormat(), zm24RGB);
-    ASSERT_EQ(bitmap.GetWidth(), raw.width);
-    ASSERT_EQ(bitmap.GetHeight(), raw.height);
-    for (int y = 0; y < raw.height; ++y) {
-        for (int x = 0; x < raw.width; ++x) {
-            const std::uint8_t* rgb = raw.pixels.data() + (y * raw.width + x) * 3;
-            ASSERT_EQ(bitmap.GetPixels_zm24RGB(x, y), (TRGB{rgb[2], rgb[1], rgb[0]}))
-                << "x " << x << " y " << y;
-        }
-    }
-}
-
 TBytes InsertAt(TBytes bytes, std::size_t at, const TBytes& added) {
     bytes.insert(bytes.begin() + static_cast<std::ptrdiff_t>(at), added.begin(), added.end());
     return bytes;
 }
 
-std::size_t FindMarker(const TBytes& bytes, std::uint8_t type) {
-    const std::uint8_t marker[2] = {0xFF, type};
-    return static_cast<std::size_t>(std::search(bytes.begin(), bytes.end(), marker, marker + 2) -
-                                    bytes.begin());
-}
-
 TEST(JpegReader, ColorsEqualTheLibrarysOwn) {
+    const auto settings_of = [](J_COLOR_SPACE input, J_COLOR_SPACE file, int h, int v,
+                                bool progressive = false, bool arithmetic = false) {
+        TRawSettings settings;
+        settings.input = input;
+        settings.file = file;
+        settings.h_factor = h;
+        settings.v_factor = v;
+        settings.progressive = progressive;
+        settings.arithmetic = arithmetic;
+        return settings;
+    };
     struct {
-        J_COLOR_SPACE input;
-        J_COLOR_SPACE file;
-        int h_factor;
-        int v_factor;
-        bool progressive;
-        bool arithmetic;
+        TRawSettings settings;
         TIOJPEGColorspace expected;
         std::int32_t samples;
     } const cases[] = {
-        {JCS_RGB, JCS_YCbCr, 2, 2, false, false, ioJPEG_YCbCr, 3},
-        {JCS_RGB, JCS_YCbCr, 2, 1, false, false, ioJPEG_YCbCr, 3},
-        {JCS_RGB, JCS_YCbCr, 1, 2, false, false, ioJPEG_YCbCr, 3},
-        {JCS_RGB, JCS_YCbCr, 1, 1, true, false, ioJPEG_YCbCr, 3},
-        {JCS_RGB, JCS_YCbCr, 2, 2, true, true, ioJPEG_YCbCr, 3},
-        {JCS_RGB, JCS_RGB, 1, 1, false, false, ioJPEG_RGB, 3},
-        {JCS_GRAYSCALE, JCS_GRAYSCALE, 1, 1, false, false, ioJPEG_GRAYLEV, 1},
+        {settings_of(JCS_RGB, JCS_YCbCr, 2, 2), ioJPEG_YCbCr, 3},
+        {settings_of(JCS_RGB, JCS_YCbCr, 2, 1), ioJPEG_YCbCr, 3},
+        {settings_of(JCS_RGB, JCS_YCbCr, 1, 1, true), ioJPEG_YCbCr, 3},
+        {settings_of(JCS_RGB, JCS_YCbCr, 2, 2, true, true), ioJPEG_YCbCr, 3},
+        {settings_of(JCS_RGB, JCS_RGB, 1, 1), ioJPEG_RGB, 3},
+        {settings_of(JCS_GRAYSCALE, JCS_GRAYSCALE, 1, 1), ioJPEG_GRAYLEV, 1},
     };
     for (const auto& one : cases) {
-        TRawSettings settings;
-        settings.input = one.input;
-        settings.file = one.file;
-        settings.h_factor = one.h_factor;
-        settings.v_factor = one.v_factor;
-        settings.progressive = one.progressive;
-        settings.arithmetic = one.arithmetic;
-        const TBytes file = EncodeRawJpeg(settings);
+        const TBytes file = EncodeRawJpeg(one.settings);
         for (const TIOJPEGScale scale : {ioJPEG_FULLSIZE, ioJPEG_HALF, ioJPEG_EIGHTH}) {
             const unsigned denominator = scale == ioJPEG_FULLSIZE ? 1
                                          : scale == ioJPEG_HALF   ? 2
                                                                   : 8;
-            TLoaded loaded;
+            TLoadedJpeg loaded;
             loaded.params.fJPEG_Scale = scale;
             Load(loaded, file);
             ASSERT_FALSE(loaded.progress.aborting);
             TRawJpeg raw;
             DecodeRawJpeg(file, JCS_RGB, denominator, raw);
-            ExpectRgb(raw, loaded.bitmap);
+            ExpectColors(raw, loaded.bitmap);
+            TLoadedJpeg native;
+            native.options.native_format = true;
+            native.params.fJPEG_Scale = scale;
+            Load(native, file);
+            EXPECT_EQ(native.bitmap.GetPixelFormat(), one.samples == 1 ? zm8g : zm24RGB);
+            EXPECT_EQ(native.bitmap.GetPixels(1, 1), RawColor(raw, 1, 1));
             EXPECT_EQ(loaded.params.fJPEG_ColorSpace, one.expected);
             EXPECT_EQ(loaded.params.fSamplesPerPixel, one.samples);
-            EXPECT_EQ(loaded.params.fJPEG_Progressive, one.progressive);
+            EXPECT_EQ(loaded.params.fJPEG_Progressive, one.settings.progressive);
             EXPECT_EQ(loaded.params.fJPEG_ScaleUsed, static_cast<std::int32_t>(denominator));
             EXPECT_EQ(loaded.params.fOriginalWidth, 19);
             EXPECT_EQ(loaded.params.fOriginalHeight, 13);
             EXPECT_EQ(loaded.params.fJPEG_WarningTot, 0);
         }
     }
-}
-
-TEST(JpegReader, GrayStaysGrayWhenNative) {
-    TRawSettings settings;
-    settings.input = settings.file = JCS_GRAYSCALE;
-    settings.h_factor = settings.v_factor = 1;
-    const TBytes file = EncodeRawJpeg(settings);
-    TLoaded loaded;
-    loaded.options.native_format = true;
-    Load(loaded, file);
-    TRawJpeg raw;
-    DecodeRawJpeg(file, JCS_GRAYSCALE, 1, raw);
-    ASSERT_EQ(loaded.bitmap.GetPixelFormat(), zm8g);
-    EXPECT_EQ(loaded.bitmap.GetPixels_zm8(3, 2), raw.pixels[2 * 19 + 3]);
 }
 
 TEST(JpegReader, CmykIsTakenAsStoredInverted) {
@@ -127,7 +84,7 @@ TEST(JpegReader, CmykIsTakenAsStoredInverted) {
         TRawJpeg raw;
         DecodeRawJpeg(file, JCS_CMYK, 1, raw);
         const std::uint8_t* cmyk = raw.pixels.data() + (2 * 19 + 3) * 4;
-        TLoaded native;
+        TLoadedJpeg native;
         native.options.native_format = true;
         Load(native, file);
         ASSERT_EQ(native.bitmap.GetPixelFormat(), zmCMYK);
@@ -136,15 +93,11 @@ TEST(JpegReader, CmykIsTakenAsStoredInverted) {
         EXPECT_EQ(native.params.fJPEG_ColorSpace,
                   file_space == JCS_CMYK ? ioJPEG_CMYK : ioJPEG_YCbCrK);
         EXPECT_EQ(native.params.fSamplesPerPixel, 4);
-        TLoaded loaded;
+        TLoadedJpeg loaded;
         Load(loaded, file);
-        const auto channel = [cmyk](int i) {
-            return static_cast<std::uint8_t>(cmyk[3] * cmyk[i] / 255);
-        };
-        EXPECT_EQ(loaded.bitmap.GetPixels_zm24RGB(3, 2),
-                  (TRGB{channel(2), channel(1), channel(0)}));
+        ExpectColors(raw, loaded.bitmap);
         settings.flat = 255;  // no ink at all
-        TLoaded white;
+        TLoadedJpeg white;
         Load(white, EncodeRawJpeg(settings));
         EXPECT_EQ(white.bitmap.GetPixels_zm24RGB(0, 0), (TRGB{255, 255, 255}));
     }
@@ -163,7 +116,7 @@ TEST(JpegReader, DensityUnits) {
         settings.density_unit = one.unit;
         settings.x_density = one.x;
         settings.y_density = one.y;
-        TLoaded loaded;
+        TLoadedJpeg loaded;
         loaded.options.params_only = true;
         Load(loaded, EncodeRawJpeg(settings));
         EXPECT_EQ(loaded.params.GetDpiX(), one.dpi_x);
@@ -177,7 +130,7 @@ TEST(JpegReader, DensityUnits) {
 TEST(JpegReader, LeadingJunk) {
     const TBytes file = EncodeRawJpeg({});
     for (const std::size_t junk : {0u, 1u, 149u, 150u, 151u}) {
-        TLoaded loaded;
+        TLoadedJpeg loaded;
         Load(loaded, InsertAt(file, 0, TBytes(junk, 0)));
         EXPECT_EQ(loaded.progress.aborting, junk > 149) << junk;
     }
@@ -198,7 +151,7 @@ TEST(JpegReader, AutomaticScale) {
         TRawSettings settings;
         settings.width = one.width;
         settings.height = one.height;
-        TLoaded loaded;
+        TLoadedJpeg loaded;
         loaded.params.fJPEG_Scale = ioJPEG_AUTOCALC;
         loaded.params.fWidth = one.wanted_width;
         loaded.params.fHeight = one.wanted_height;
@@ -213,7 +166,7 @@ TEST(JpegReader, ThumbnailWishDecodesSmallAndKeepsTheFields) {
     TRawSettings settings;
     settings.width = 700;
     settings.height = 610;
-    TLoaded loaded;
+    TLoadedJpeg loaded;
     loaded.params.fJPEG_GetExifThumbnail = true;
     loaded.params.fJPEG_Scale = ioJPEG_AUTOCALC;
     loaded.params.fWidth = 11;
@@ -240,7 +193,7 @@ TEST(JpegReader, MarkersSurviveLoadAndSaveInOrder) {
         write(0xEE, "not Adobe's");
         write(0xEF, "");
     };
-    TLoaded loaded;
+    TLoadedJpeg loaded;
     Load(loaded, EncodeRawJpeg(settings));
     const auto texts = [](const TZmMarkerList& list) {
         std::vector<std::string> result;
@@ -256,7 +209,7 @@ TEST(JpegReader, MarkersSurviveLoadAndSaveInOrder) {
                                         "238:not Adobe's", "239:"}));
     TMemoryStream saved;
     WriteJPEGStream(saved, loaded.bitmap, loaded.params, loaded.progress.record);
-    TLoaded again;
+    TLoadedJpeg again;
     Load(again, saved.Bytes());
     EXPECT_EQ(texts(again.params.fJPEG_MarkerList),
               (std::vector<std::string>{"254:first", "237:thirteen", "225:one", "224:another APP0",
@@ -271,7 +224,7 @@ TEST(JpegReader, TruncationAtEveryByte) {
             settings.arithmetic = arithmetic;
             const TBytes file = EncodeRawJpeg(settings);
             for (std::size_t length = 0; length <= file.size(); ++length) {
-                TLoaded loaded;
+                TLoadedJpeg loaded;
                 Load(loaded, FirstBytes(file, length));
                 const bool only_end_is_missing = length + 2 >= file.size();
                 if (!only_end_is_missing) {
@@ -290,16 +243,16 @@ TEST(JpegReader, ByteLimitAndStreamPosition) {
     const auto size = static_cast<std::int64_t>(file.size());
     const TBytes two = InsertAt(file, 0, file);
     TBorrowedMemoryStream stream(two.data(), 2 * size);
-    TLoaded first;
+    TLoadedJpeg first;
     ReadJPEGStream(stream, first.bitmap, first.options, first.progress.record, first.params);
     EXPECT_FALSE(first.progress.aborting);
     EXPECT_EQ(stream.GetPosition(), size);
-    TLoaded second;
+    TLoadedJpeg second;
     second.options.byte_limit = size;
     ReadJPEGStream(stream, second.bitmap, second.options, second.progress.record, second.params);
     EXPECT_FALSE(second.progress.aborting);
     ExpectSamePixels(first.bitmap, second.bitmap);
-    TLoaded cut;
+    TLoadedJpeg cut;
     cut.options.byte_limit = size - 20;
     Load(cut, two);
     EXPECT_TRUE(cut.progress.aborting);
@@ -307,7 +260,7 @@ TEST(JpegReader, ByteLimitAndStreamPosition) {
 
 TEST(JpegReader, WarningsAreCounted) {
     const TBytes file = EncodeRawJpeg({});
-    TLoaded loaded;
+    TLoadedJpeg loaded;
     Load(loaded, InsertAt(file, FindMarker(file, 0xDA), {1, 2, 3}));
     EXPECT_FALSE(loaded.progress.aborting);
     EXPECT_EQ(loaded.params.fJPEG_WarningTot, 1);
@@ -326,7 +279,7 @@ TEST(JpegReader, HostileFiles) {
     const std::size_t frame = FindMarker(file, 0xC2);
     std::fill_n(huge.begin() + static_cast<std::ptrdiff_t>(frame) + 5, 4, std::uint8_t{0xFF});
     huge[frame + 6] = huge[frame + 8] = 0x00;  // 65280 by 65280
-    TLoaded refused;
+    TLoadedJpeg refused;
     Load(refused, huge);
     EXPECT_TRUE(refused.progress.aborting);
     EXPECT_TRUE(refused.bitmap.IsEmpty());
@@ -340,11 +293,11 @@ TEST(JpegReader, HostileFiles) {
         many.insert(many.end(), scan.begin(), scan.end());
     }
     many.insert(many.end(), {0xFF, 0xD9});
-    TLoaded stopped;
+    TLoadedJpeg stopped;
     Load(stopped, many);
     EXPECT_TRUE(stopped.progress.aborting);
 
-    TLoaded empty;
+    TLoadedJpeg empty;
     Load(empty, {});
     EXPECT_TRUE(empty.progress.aborting);
 }

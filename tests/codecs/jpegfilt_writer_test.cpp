@@ -34,23 +34,6 @@ void MakeSmooth(TZmBitmap& bitmap) {
     }
 }
 
-TRGB RawColor(const TRawJpeg& raw, int x, int y) {
-    const std::uint8_t* pixel =
-        raw.pixels.data() + (y * raw.width + x) * (raw.color_space == JCS_GRAYSCALE ? 1
-                                                   : raw.components == 4            ? 4
-                                                                                    : 3);
-    if (raw.components == 1) {
-        return TRGB{pixel[0], pixel[0], pixel[0]};
-    }
-    if (raw.components == 3) {
-        return TRGB{pixel[2], pixel[1], pixel[0]};
-    }
-    const auto mix = [pixel](int i) {
-        return static_cast<std::uint8_t>(pixel[3] * pixel[i] / 255);
-    };
-    return TRGB{mix(2), mix(1), mix(0)};
-}
-
 TEST(JpegWriter, ColorSpacesAsAnotherDecoderSeesThem) {
     struct {
         TIOJPEGColorspace wanted;

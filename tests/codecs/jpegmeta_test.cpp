@@ -4,7 +4,6 @@
 #include <array>
 #include <string>
 
-#include "engine/codecs/jpegfilt.h"
 #include "engine/codecs/jpegfilt_p.h"
 #include "engine/codecs/orientation.h"
 #include "engine/foundation/zmsettings.h"
@@ -12,8 +11,7 @@
 #include "engine/io/zmioparams.h"
 #include "engine/metadata/zmexiforientation.h"
 #include "engine/metadata/zmmetahooks.h"
-#include "tests/codecs/codecstreams.h"
-#include "tests/codecs/jpegraw.h"
+#include "tests/codecs/jpegload.h"
 #include "tests/support/testimages.h"
 
 // What the JPEG codec does with EXIF, IPTC, XMP and profile markers, and turning upright.
@@ -53,6 +51,20 @@ TBytes ProfilePiece(std::uint8_t number, std::uint8_t count, const std::string& 
     return piece;
 }
 
+/// Resource blocks with an IPTC block of the title "T".
+TBytes TitleResource() {
+    TBytes resource =
+        BytesOfText(std::string("Photoshop 3.0\0"
+                                "8BIM\4\4\0\0\0\0\0\6",
+                                26));
+    resource.insert(resource.end(), {0x1C, 2, 5, 0, 1, 'T'});
+    return resource;
+}
+
+TBytes XmpMarker(const std::string& packet) {
+    return BytesOfText(std::string("http://ns.adobe.com/xap/1.0/\0", 29) + packet);
+}
+
 using TMarkers = std::vector<std::pair<int, TBytes>>;
 
 TBytes FileWith(const TMarkers& markers, int width = 19, int height = 13) {
@@ -65,18 +77,6 @@ TBytes FileWith(const TMarkers& markers, int width = 19, int height = 13) {
         }
     };
     return EncodeRawJpeg(settings);
-}
-
-struct TLoaded {
-    TZmBitmap bitmap;
-    TIOParams params;
-    TTestProgress progress;
-    TJpegReadOptions options;
-};
-
-void Load(TLoaded& loaded, const TBytes& bytes) {
-    TBorrowedMemoryStream stream(bytes.data(), static_cast<std::int64_t>(bytes.size()));
-    ReadJPEGStream(stream, loaded.bitmap, loaded.options, loaded.progress.record, loaded.params);
 }
 
 TEST(ExifOrientation, BothByteOrdersAndDamage) {
@@ -146,14 +146,14 @@ TEST(TurnUpright, TheWayBackGivesTheSameForAllPixelSizesAndStrips) {
 
 TEST(JpegOrientation, IsAppliedOnlyWhenEnabledAndTheMarkerFollows) {
     const TBytes file = FileWith({{0xE1, BytesOfText("other")}, {0xE1, ExifMarker(6)}}, 20, 10);
-    TLoaded lying;
+    TLoadedJpeg lying;
     Load(lying, file);
     EXPECT_EQ(lying.bitmap.GetWidth(), 20);
     EXPECT_EQ(lying.params.fEXIF_Orientation, 6);
     EXPECT_EQ(lying.params.fTIFF_Orientation, 6);
     EXPECT_FALSE(lying.params.fEXIF_HasEXIFData);  // no reader of blocks is installed
 
-    TLoaded upright;
+    TLoadedJpeg upright;
     upright.params.fJPEG_EnableAdjustOrientation = true;
     Load(upright, file);
     EXPECT_FALSE(upright.progress.aborting);
@@ -168,7 +168,7 @@ TEST(JpegOrientation, IsAppliedOnlyWhenEnabledAndTheMarkerFollows) {
     const auto marker = upright.params.fJPEG_MarkerList.GetMarkerData(1);
     EXPECT_EQ(TBytes(marker.begin(), marker.end()), ExifMarker(1));
 
-    TLoaded header;
+    TLoadedJpeg header;
     header.params.fJPEG_EnableAdjustOrientation = true;
     header.options.params_only = true;
     Load(header, file);
@@ -177,20 +177,14 @@ TEST(JpegOrientation, IsAppliedOnlyWhenEnabledAndTheMarkerFollows) {
 }
 
 TEST(JpegMetadata, IptcAndXmpAreReadAndNotWhenUnwanted) {
-    TBytes resource =
-        BytesOfText(std::string("Photoshop 3.0\0"
-                                "8BIM\4\4\0\0\0\0\0\10",
-                                26));
-    resource.insert(resource.end(), {0x1C, 2, 5, 0, 3, 'T', 'i', 't'});
-    const std::string packet = "<x:xmpmeta/>";
-    const TBytes xmp = BytesOfText(std::string("http://ns.adobe.com/xap/1.0/\0", 29) + packet);
-    const TBytes file = FileWith({{0xED, {0x1C, 2, 5, 0, 1, 'X'}}, {0xED, resource}, {0xE1, xmp}});
-    TLoaded loaded;
+    const TBytes file = FileWith(
+        {{0xED, {0x1C, 2, 5, 0, 1, 'X'}}, {0xED, TitleResource()}, {0xE1, XmpMarker("<x/>")}});
+    TLoadedJpeg loaded;
     Load(loaded, file);
-    EXPECT_EQ(loaded.params.ReadIPTCField(2, 5), "Tit");
-    EXPECT_EQ(loaded.params.fXMP_Info, packet);
+    EXPECT_EQ(loaded.params.ReadIPTCField(2, 5), "T");
+    EXPECT_EQ(loaded.params.fXMP_Info, "<x/>");
     for (const bool by_option : {true, false}) {
-        TLoaded without;
+        TLoadedJpeg without;
         without.options.read_metadata = !by_option;
         without.params.fGetMetaData = by_option;
         Load(without, file);
@@ -212,7 +206,7 @@ TEST(JpegExchange, ABlockTakesThePlaceOfTheOldOnesAndAllElseStays) {
     const TBytes new_iptc = BytesOfText("Photoshop 3.0 new");
     const TBytes other = BytesOfText("Adobe_CM");
     const TBytes comment = BytesOfText("comment");
-    const TBytes xmp = BytesOfText(std::string("http://ns.adobe.com/xap/1.0/\0<x/>", 33));
+    const TBytes xmp = XmpMarker("<x/>");
     const TBytes file =
         FileWith({{0xFE, comment}, {0xED, old_iptc}, {0xED, other}, {0xE1, xmp}, {0xED, old_iptc}});
     const TBytes without = FileWith({{0xFE, comment}, {0xED, other}, {0xE1, xmp}});
@@ -231,10 +225,8 @@ TEST(JpegExchange, ABlockTakesThePlaceOfTheOldOnesAndAllElseStays) {
 
 TEST(JpegExchange, WhatIsCutOrFullFails) {
     const TBytes file = FileWith({{0xFE, BytesOfText("comment")}});
-    const TBytes scan_mark{0xFF, 0xDA};
-    const auto scan = std::search(file.begin(), file.end(), scan_mark.begin(), scan_mark.end());
     const TBytes iptc = BytesOfText("Photoshop 3.0");
-    for (std::size_t length = 0; length < static_cast<std::size_t>(scan - file.begin()); ++length) {
+    for (std::size_t length = 0; length < FindMarker(file, 0xDA); ++length) {
         TMemoryStream input(FirstBytes(file, length));
         TMemoryStream output;
         ASSERT_FALSE(ExchangeJpegBlock(input, output, kJpegBlockIptc, iptc)) << length;
@@ -338,25 +330,21 @@ private:
 };
 
 TMarkers AllMarkers(const std::string& profile) {
-    TBytes resource =
-        BytesOfText(std::string("Photoshop 3.0\0"
-                                "8BIM\4\4\0\0\0\0\0\6",
-                                26));
-    resource.insert(resource.end(), {0x1C, 2, 5, 0, 1, 'T'});
-    const TBytes xmp = BytesOfText(std::string("http://ns.adobe.com/xap/1.0/\0", 29) + "<x/>");
-    return {
-        {0xE2, ProfilePiece(1, 1, profile)}, {0xE1, xmp}, {0xE1, ExifMarker(1)}, {0xED, resource}};
+    return {{0xE2, ProfilePiece(1, 1, profile)},
+            {0xE1, XmpMarker("<x/>")},
+            {0xE1, ExifMarker(1)},
+            {0xED, TitleResource()}};
 }
 
 TEST(JpegHooks, RunInTheStatedOrderWhateverTheMarkersOrder) {
     const TRecordingHooks hooks;
-    TLoaded loaded;
+    TLoadedJpeg loaded;
     Load(loaded, FileWith(AllMarkers("own")));
     EXPECT_EQ(hooks.calls, (std::vector<std::string>{"exif after T", "profile own after <x/>"}));
     EXPECT_EQ(loaded.params.GetDpiX(), 72);  // the file's 1 by 1 is a placeholder
     EXPECT_EQ(loaded.params.GetDpiY(), 96);
     hooks.calls.clear();
-    TLoaded made;
+    TLoadedJpeg made;
     Load(made, FileWith(AllMarkers("bad")));
     EXPECT_EQ(hooks.calls.back(), "made for R03");
     ZmGlobalSettings().fEXIFInteroperabilityIndexUsage = zmiiNone;
@@ -375,7 +363,7 @@ TEST(JpegHooks, AStatedResolutionStays) {
         const TBytes marker = ExifMarker(1);
         jpeg_write_marker(&encoder, 0xE1, marker.data(), static_cast<unsigned>(marker.size()));
     };
-    TLoaded loaded;
+    TLoadedJpeg loaded;
     Load(loaded, EncodeRawJpeg(settings));
     EXPECT_EQ(loaded.params.GetDpiX(), 150);
     EXPECT_EQ(loaded.params.GetDpiY(), 1);
@@ -384,29 +372,29 @@ TEST(JpegHooks, AStatedResolutionStays) {
 TEST(JpegHooks, RowsGoThroughTheProfileWithColorManagement) {
     const TRecordingHooks hooks;
     const TBytes file = FileWith(AllMarkers("own"));
-    TLoaded plain;
+    TLoadedJpeg plain;
     Load(plain, file);
     ZmGlobalSettings().fEnableCMS = true;
-    TLoaded managed;
+    TLoadedJpeg managed;
     Load(managed, file);
     EXPECT_EQ(hooks.calls.back(), "rows of 3");
     EXPECT_EQ(managed.bitmap.GetScanLine(4)[0], 255 - plain.bitmap.GetScanLine(4)[0]);
     const TBytes narrow = FileWith(AllMarkers("own"), 5, 9);  // the profile fails: plain rows
-    TLoaded failed;
+    TLoadedJpeg failed;
     Load(failed, narrow);
     ZmGlobalSettings().fEnableCMS = false;
-    TLoaded expected;
+    TLoadedJpeg expected;
     Load(expected, narrow);
     ExpectSamePixels(expected.bitmap, failed.bitmap);
 }
 
 TEST(JpegHooks, TheOutputProfileReplacesTheOldOne) {
     const TRecordingHooks hooks;
-    TLoaded loaded;
+    TLoadedJpeg loaded;
     Load(loaded, FileWith(AllMarkers("own")));
     TMemoryStream saved;
     WriteJPEGStream(saved, loaded.bitmap, loaded.params, loaded.progress.record);
-    TLoaded again;
+    TLoadedJpeg again;
     again.options.params_only = true;
     Load(again, saved.Bytes());
     const TZmMarkerList& markers = again.params.fJPEG_MarkerList;
@@ -417,7 +405,7 @@ TEST(JpegHooks, TheOutputProfileReplacesTheOldOne) {
 
 TEST(JpegReader, YCbCrSamplesAreKeptWhenAsked) {
     const TBytes file = EncodeRawJpeg({});
-    TLoaded loaded;
+    TLoadedJpeg loaded;
     loaded.options.keep_ycbcr = true;
     Load(loaded, file);
     TRawJpeg raw;
@@ -425,21 +413,6 @@ TEST(JpegReader, YCbCrSamplesAreKeptWhenAsked) {
     const std::uint8_t* row = loaded.bitmap.GetScanLine(3);
     EXPECT_EQ(TBytes(row, row + 57), TBytes(raw.pixels.begin() + 171, raw.pixels.begin() + 228));
     EXPECT_EQ(loaded.params.fJPEG_ColorSpace, ioJPEG_YCbCr);
-}
-
-TEST(JpegReader, TheDriverChoosesTheScaleForAView) {
-    TRawSettings settings;
-    settings.width = 1600;
-    settings.height = 1200;
-    const TBytes file = EncodeRawJpeg(settings);
-    TZmBitmap bitmap;
-    TIOParams params;
-    params.OptimizeLoadingParams(400, 300);
-    ASSERT_TRUE(bitmap.Read(file.data(), static_cast<std::int64_t>(file.size()), ioJPEG, &params));
-    EXPECT_EQ(params.fJPEG_ScaleUsed, 4);
-    EXPECT_EQ(bitmap.GetWidth(), 400);
-    EXPECT_EQ(bitmap.GetHeight(), 300);
-    EXPECT_EQ(params.fOriginalWidth, 1600);
 }
 
 }  // namespace

@@ -12,6 +12,8 @@
 #include <functional>
 #include <vector>
 
+#include "engine/bitmap/zmpixelformats.h"
+
 /// The JPEG library by itself, as encoder of test files and as the other opinion on ours.
 namespace zm::test {
 
@@ -47,6 +49,7 @@ struct TRawJpeg {
     int width = 0;
     int height = 0;
     int components = 0;
+    int channels = 0;  ///< of `pixels`
     J_COLOR_SPACE color_space = JCS_UNKNOWN;
     int h_factors[4] = {};
     int v_factors[4] = {};
@@ -89,6 +92,7 @@ inline void DecodeRawJpeg(const std::vector<std::uint8_t>& bytes, J_COLOR_SPACE 
         jpeg_start_decompress(&decoder);
         raw.width = static_cast<int>(decoder.output_width);
         raw.height = static_cast<int>(decoder.output_height);
+        raw.channels = decoder.output_components;
         const std::size_t row_bytes = static_cast<std::size_t>(decoder.output_width) *
                                       static_cast<std::size_t>(decoder.output_components);
         raw.pixels.resize(row_bytes * decoder.output_height);
@@ -101,6 +105,16 @@ inline void DecodeRawJpeg(const std::vector<std::uint8_t>& bytes, J_COLOR_SPACE 
         raw.is_good = true;
     }
     jpeg_destroy_decompress(&decoder);
+}
+
+/// Colour of a pixel; inks as such files store them, 255 for none.
+inline TRGB RawColor(const TRawJpeg& raw, std::int32_t x, std::int32_t y) {
+    const std::uint8_t* pixel = raw.pixels.data() + (y * raw.width + x) * raw.channels;
+    const auto channel = [pixel, &raw](int i) {
+        return raw.channels == 4 ? static_cast<std::uint8_t>(pixel[3] * pixel[i] / 255)
+                                 : pixel[raw.channels == 1 ? 0 : i];
+    };
+    return TRGB{channel(2), channel(1), channel(0)};
 }
 
 struct TRawSettings {

@@ -72,55 +72,53 @@ struct TKind {
 constexpr TKind kKinds[] = {{0, 1}, {0, 2}, {0, 4}, {0, 8}, {0, 16}, {2, 8}, {2, 16}, {3, 1},
                             {3, 2}, {3, 4}, {3, 8}, {4, 8}, {4, 16}, {6, 8}, {6, 16}};
 
+/// Native mode keeps grey and palette pixels of whole bytes.
+TZmPixelFormat ExpectedFormat(TKind kind, bool native) {
+    const bool is_gray = kind.color_type == 0;
+    if (is_gray && kind.depth == 1) {
+        return zm1g;
+    }
+    if (!native || kind.depth < 8 || (!is_gray && kind.color_type != 3)) {
+        return zm24RGB;
+    }
+    return !is_gray ? zm8p : kind.depth == 8 ? zm8g : zm16g;
+}
+
+void ExpectLoads(const TPngPicture& picture, bool native) {
+    TLoaded loaded;
+    loaded.params.fNativePixelFormat = native;
+    Load(loaded, picture.Build());
+    ASSERT_FALSE(loaded.progress.aborting);
+    const TZmPixelFormat format = ExpectedFormat({picture.color_type, picture.depth}, native);
+    ASSERT_EQ(loaded.bitmap.GetPixelFormat(), format);
+    if (format == zm16g) {
+        const auto x = static_cast<std::int32_t>(picture.width) - 1;
+        EXPECT_EQ(loaded.bitmap.GetPixels_zm16g(x, 0), picture.Sample(picture.width - 1, 0, 0));
+    } else {
+        ExpectColors(picture, loaded.bitmap);
+    }
+    if (picture.color_type >= 4) {
+        ExpectAlphaSamples(picture, loaded.bitmap);
+    } else {
+        EXPECT_FALSE(loaded.bitmap.HasAlphaChannel());
+    }
+    EXPECT_EQ(loaded.params.fBitsPerSample, picture.color_type == 3 ? 8 : picture.depth);
+    EXPECT_EQ(loaded.params.fSamplesPerPixel, picture.Channels());
+    EXPECT_EQ(loaded.params.fPNG_Interlaced, picture.interlaced);
+    EXPECT_EQ(loaded.params.GetImageCount(), 1);
+}
+
 TEST(PngReader, EveryColorTypeDepthAndInterlacing) {
     constexpr std::uint32_t kSizes[][2] = {{1, 1}, {9, 7}, {8, 17}};
     for (const TKind kind : kKinds) {
         for (const auto& size : kSizes) {
-            for (const bool interlaced : {false, true}) {
-                const TPngPicture picture{size[0],    size[1], kind.depth, kind.color_type,
-                                          interlaced, {},      {}};
+            for (const int mode : {0, 1, 2, 3}) {
                 SCOPED_TRACE(testing::Message()
-                             << "type " << kind.color_type << " depth " << kind.depth
-                             << " interlaced " << interlaced << " width " << size[0]);
-                TLoaded loaded;
-                Load(loaded, picture.Build());
-                ASSERT_FALSE(loaded.progress.aborting);
-                const bool is_bits = kind.color_type == 0 && kind.depth == 1;
-                EXPECT_EQ(loaded.bitmap.GetPixelFormat(), is_bits ? zm1g : zm24RGB);
-                ExpectColors(picture, loaded.bitmap);
-                if (kind.color_type >= 4) {
-                    ExpectAlphaSamples(picture, loaded.bitmap);
-                } else {
-                    EXPECT_FALSE(loaded.bitmap.HasAlphaChannel());
-                }
-                EXPECT_EQ(loaded.params.fBitsPerSample, kind.color_type == 3 ? 8 : kind.depth);
-                EXPECT_EQ(loaded.params.fSamplesPerPixel, picture.Channels());
-                EXPECT_EQ(loaded.params.fPNG_Interlaced, interlaced);
-                EXPECT_EQ(loaded.params.GetImageCount(), 1);
+                             << "type " << kind.color_type << " depth " << kind.depth << " mode "
+                             << mode << " width " << size[0]);
+                ExpectLoads({size[0], size[1], kind.depth, kind.color_type, mode > 1, {}, {}},
+                            mode % 2 != 0);
             }
-        }
-    }
-}
-
-TEST(PngReader, NativeModeKeepsWholeByteGrayAndPalette) {
-    for (const TKind kind : kKinds) {
-        SCOPED_TRACE(testing::Message() << "type " << kind.color_type << " depth " << kind.depth);
-        const TPngPicture picture{9, 7, kind.depth, kind.color_type, false, {}, {}};
-        TLoaded loaded;
-        loaded.params.fNativePixelFormat = true;
-        Load(loaded, picture.Build());
-        ASSERT_FALSE(loaded.progress.aborting);
-        const bool is_gray = kind.color_type == 0;
-        const TZmPixelFormat expected = is_gray && kind.depth == 1                ? zm1g
-                                        : is_gray && kind.depth == 8              ? zm8g
-                                        : is_gray && kind.depth == 16             ? zm16g
-                                        : kind.color_type == 3 && kind.depth == 8 ? zm8p
-                                                                                  : zm24RGB;
-        ASSERT_EQ(loaded.bitmap.GetPixelFormat(), expected);
-        if (expected == zm16g) {
-            EXPECT_EQ(loaded.bitmap.GetPixels_zm16g(3, 2), picture.Sample(3, 2, 0));
-        } else {
-            ExpectColors(picture, loaded.bitmap);
         }
     }
 }
@@ -396,14 +394,6 @@ TEST(PngReader, HugeCompressedTextsAreLeftOut) {
     ExpectColors(picture, loaded.bitmap);
 }
 
-TEST(PngReader, ProgressTellsEachPercentOnce) {
-    const TBytes file = TPngPicture{3, 10, 8, 2, false, {}, {}}.Build();
-    TLoaded whole;
-    Load(whole, file);
-    EXPECT_EQ(whole.progress.percents,
-              (std::vector<std::int32_t>{10, 20, 30, 40, 50, 60, 70, 80, 90, 100}));
-}
-
 TEST(PngReader, StreamStandsBehindTheImageAndASecondLoadIsEqual) {
     const TPngPicture picture{7, 5, 8, 6, true, {}, {}};
     TBytes two = picture.Build();
@@ -418,14 +408,14 @@ TEST(PngReader, StreamStandsBehindTheImageAndASecondLoadIsEqual) {
     EXPECT_FALSE(second.progress.aborting);
     ExpectSamePixels(first.bitmap, second.bitmap);
     ExpectSameAlpha(first.bitmap, second.bitmap);
-}
-
-TEST(PngReader, AnOldAlphaPlaneDoesNotStay) {
-    TLoaded loaded;
-    Load(loaded, TPngPicture{4, 4, 8, 6, false, {}, {}}.Build());
-    ASSERT_TRUE(loaded.bitmap.HasAlphaChannel());
-    Load(loaded, TPngPicture{4, 4, 8, 2, false, {}, {}}.Build());
-    EXPECT_FALSE(loaded.bitmap.HasAlphaChannel());
+    TLoaded again;
+    Load(again, picture.Build());
+    const auto opaque = TPngPicture{7, 10, 8, 2, false, {}, {}}.Build();
+    again.progress.percents.clear();
+    Load(again, opaque);
+    EXPECT_FALSE(again.bitmap.HasAlphaChannel());  // the old plane is gone
+    EXPECT_EQ(again.progress.percents,
+              (std::vector<std::int32_t>{10, 20, 30, 40, 50, 60, 70, 80, 90, 100}));
 }
 
 }  // namespace

@@ -11,6 +11,7 @@
 #include "engine/foundation/zmutils_tempfile.h"
 #include "engine/platform/files.h"
 #include "tests/support/testfiles.h"
+#include "tests/support/testmessage.h"
 
 namespace zm {
 namespace {
@@ -74,12 +75,15 @@ TEST_F(DirContent, PatternsFitWholeNamesWithoutCase) {
         {u"/*.*", "One.PNG broken.lnk sub to_file.lnk to_folder.LNK two.png.txt "},
         {u"/???", "sub "},
         {u"/t*o*", "to_file.lnk to_folder.LNK two.png.txt "},
-        {u"/*?", "One.PNG broken.lnk sub to_file.lnk to_folder.LNK two.png.txt "},
         {u"/*a*a*a*a*", ""},
     };
     for (const auto& [pattern, expected] : cases) {
         EXPECT_EQ(Names(Path() + pattern, true, true), expected) << Utf8FromUtf16(pattern);
     }
+    std::vector<std::u16string> full_names;
+    TZmDirContent::PopulateStrings(Path() + u"/*.png", full_names);
+    ASSERT_EQ(full_names.size(), 1u);
+    EXPECT_TRUE(platform::FileExists(full_names.front()));
 }
 
 TEST_F(DirContent, TellsSizeDatesAndKindOfEach) {
@@ -105,13 +109,6 @@ TEST_F(DirContent, TellsSizeDatesAndKindOfEach) {
     EXPECT_FALSE(content.GetItem(name)) << "the end stays the end";
 }
 
-TEST_F(DirContent, FullNamesOpenTheirFiles) {
-    std::vector<std::u16string> names;
-    TZmDirContent::PopulateStrings(Path() + u"/*.png", names);
-    ASSERT_EQ(names.size(), 1u);
-    EXPECT_TRUE(platform::FileExists(names.front()));
-}
-
 TEST(TemporaryFile, LivesAsLongAsItsStream) {
     const test::TempFolder folder;
     const std::u16string name = folder.Name("cache.tmp");
@@ -132,12 +129,8 @@ TEST(TemporaryFile, LivesAsLongAsItsStream) {
 TEST(TemporaryFile, RefusalsNameTheFile) {
     const test::TempFolder folder;
     for (const std::u16string& name : {folder.Name("no") + u"/such/\x00E4", folder.Name("")}) {
-        try {
-            TZmTemporaryFileStream stream(name);
-            ADD_FAILURE() << "created";
-        } catch (const EZmException& error) {
-            EXPECT_EQ(error.what(), "Unable to create " + Utf8FromUtf16(name));
-        }
+        EXPECT_EQ(test::MessageOf<EZmException>([&] { TZmTemporaryFileStream stream(name); }),
+                  "Unable to create " + Utf8FromUtf16(name));
     }
     EXPECT_TRUE(platform::FolderExists(test::EngineName(folder.Path())));
 }

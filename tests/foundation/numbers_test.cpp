@@ -68,13 +68,10 @@ TEST(Numbers, ClampsOverEveryValueAroundTheirRanges) {
     EXPECT_EQ(Clamp16(kMaxInt32), 65535);
 }
 
-TEST(Numbers, WideValuesAreLimitedNotWrapped) {
+TEST(Numbers, WideValuesAreLimitedAndProductsWrapOrAreRefused) {
     EXPECT_EQ(SaturateToInt32(std::int64_t{1} << 32), kMaxInt32);
     EXPECT_EQ(SaturateToInt32(-(std::int64_t{1} << 32)), kMinInt32);
     EXPECT_EQ(SaturateToInt32(-7), -7);
-}
-
-TEST(Numbers, ProductsWrapOrAreRefused) {
     EXPECT_EQ(WrapMul32(65536, 32768), kMinInt32);
     EXPECT_EQ(WrapMul32(65536, 65536), 0);
     EXPECT_EQ(WrapMul32(-3, 5), -15);
@@ -86,9 +83,7 @@ TEST(Numbers, ProductsWrapOrAreRefused) {
     EXPECT_EQ(CheckedMul(kMost, 0), 0);
     EXPECT_EQ(CheckedMul(-1, 0), std::nullopt);
     EXPECT_EQ(CheckedMul(0, -1), std::nullopt);
-}
-
-TEST(Numbers, AddressSpaceIsHalfOfWhatSizesCanTell) {
+    // A block has at most half of what sizes can tell.
     EXPECT_TRUE(FitsAddressSpace(0x7FFFFFFF));
     EXPECT_EQ(FitsAddressSpace(0x80000000), sizeof(std::size_t) > 4);
     EXPECT_FALSE(FitsAddressSpace(-1));

@@ -8,11 +8,13 @@
 
 #include "engine/platform/files.h"
 #include "tests/support/testfiles.h"
+#include "tests/support/testmessage.h"
 
 namespace zm {
 namespace {
 
 using test::ListFolder;
+using test::MessageOf;
 using test::ReadFileBytes;
 using test::TempFolder;
 using test::WriteFileBytes;
@@ -78,7 +80,10 @@ TEST(Streams, MemoryGrowsWithZerosBetween) {
     EXPECT_EQ(stream.Write("x", -4), 0);
 }
 
-TEST(Streams, AMemoryStreamWithoutRoomWritesShort) {
+TEST(Streams, WithoutRoomAMemoryStreamWritesShort) {
+    const TBytes bytes = Counting(2);
+    TBorrowedMemoryStream borrowed(bytes.data(), 2);
+    EXPECT_THROW(borrowed.WriteBuffer("ab", 2), EWriteError);
     TMemoryStream stream;
     EXPECT_EQ(stream.Seek(std::numeric_limits<std::int64_t>::max(), soBeginning),
               std::numeric_limits<std::int64_t>::max());
@@ -90,13 +95,6 @@ TEST(Streams, AMemoryStreamWithoutRoomWritesShort) {
     }
     EXPECT_THROW(stream.WriteBuffer("ab", 2), EWriteError);
     EXPECT_EQ(stream.GetSize(), 0);
-}
-
-TEST(Streams, BorrowedBytesAreNotWritten) {
-    const TBytes bytes = Counting(2);
-    TBorrowedMemoryStream stream(bytes.data(), 2);
-    EXPECT_EQ(stream.Write("ab", 2), 0);
-    EXPECT_THROW(stream.WriteBuffer("ab", 2), EWriteError);
 }
 
 TEST(FileStreams, OpenChangeAndCreate) {
@@ -117,23 +115,12 @@ TEST(FileStreams, OpenChangeAndCreate) {
     EXPECT_EQ(emptied.GetSize(), 0);
 }
 
-template <typename TError, typename TCall>
-std::string MessageOf(TCall call) {
-    try {
-        call();
-    } catch (const TError& error) {
-        return error.what();
-    }
-    return "no exception";
-}
-
 TEST(FileStreams, FailuresNameTheFileAndTheReason) {
     const TempFolder folder;
     const std::string missing =
         MessageOf<EFOpenError>([&] { TFileStream(folder.Name("missing.png"), fmOpenRead); });
     EXPECT_NE(missing.find("missing.png\". "), std::string::npos) << missing;
     EXPECT_GT(missing.size(), missing.find("\". ") + 6) << "the reason follows: " << missing;
-    EXPECT_THROW(TFileStream(folder.Name("missing.png"), fmOpenReadWrite), EFOpenError);
     EXPECT_THROW(TFileStream(folder.Name("no/folder.png"), fmCreate), EFCreateError);
     EXPECT_THROW(TFileStream(folder.Name(""), fmOpenRead), EFOpenError) << "a folder";
     EXPECT_THROW(TFileStream(std::u16string(), fmOpenRead), EFOpenError);
@@ -163,11 +150,7 @@ TEST_F(SaveStream, CommitPutsTheNewFileInPlace) {
         }
         TZmSaveFileStream stream(folder_.Name(name));
         WriteNew(stream);
-        if (existing) {
-            EXPECT_EQ(ReadFileBytes(folder_.File(name)), old_bytes_) << "until the commit";
-        } else {
-            EXPECT_FALSE(platform::FileExists(folder_.Name(name)));
-        }
+        EXPECT_EQ(platform::FileExists(folder_.Name(name)), existing) << "until the commit";
         ASSERT_TRUE(stream.Commit());
         EXPECT_FALSE(stream.Commit()) << "only once";
         EXPECT_EQ(ReadFileBytes(folder_.File(name)), new_bytes_);
@@ -184,20 +167,6 @@ TEST_F(SaveStream, WithoutCommitTheOldFileStaysAlone) {
     }
     EXPECT_EQ(ListFolder(folder_.Path()), std::vector<std::string>{"a"});
     EXPECT_EQ(ReadFileBytes(folder_.File("a")), old_bytes_);
-}
-
-TEST_F(SaveStream, AFileIsReplacedByWhatWasReadFromIt) {
-    WriteFileBytes(folder_.File("a"), old_bytes_);
-    TBytes bytes(3);
-    {
-        TFileStream source(folder_.Name("a"), fmOpenRead);
-        source.ReadBuffer(bytes.data(), bytes.size());
-    }
-    TZmSaveFileStream stream(folder_.Name("a"));
-    stream.WriteBuffer(bytes.data(), 3);
-    stream.WriteBuffer(bytes.data(), 3);
-    ASSERT_TRUE(stream.Commit());
-    EXPECT_EQ(ReadFileBytes(folder_.File("a")), (TBytes{'o', 'l', 'd', 'o', 'l', 'd'}));
 }
 
 TEST_F(SaveStream, EarlierBytesCanBeWrittenAnew) {
@@ -225,25 +194,19 @@ TEST_F(SaveStream, TargetsThatCannotBeMadeAreToldAtOnce) {
 
 TEST_F(SaveStream, AWriteProtectedTargetIsNotReplaced) {
     using std::filesystem::perms;
+    const auto all_writers = perms::owner_write | perms::group_write | perms::others_write;
     WriteFileBytes(folder_.File("a"), old_bytes_);
-    const auto writable = perms::owner_write | perms::group_write | perms::others_write;
-    std::filesystem::permissions(folder_.File("a"), writable,
+    std::filesystem::permissions(folder_.File("a"), all_writers,
                                  std::filesystem::perm_options::remove);
-    bool refused = false;
-    try {
-        TFileStream(folder_.Name("a"), fmOpenReadWrite);
-    } catch (const EFOpenError&) {
-        refused = true;
-    }
+    const bool refused = MessageOf<EFOpenError>([&] {
+                             TFileStream(folder_.Name("a"), fmOpenReadWrite);
+                         }) != "nothing raised";  // root may write protected files
     if (refused) {
         EXPECT_THROW(TZmSaveFileStream{folder_.Name("a")}, EFCreateError);
     }
     EXPECT_EQ(ReadFileBytes(folder_.File("a")), old_bytes_);
     std::filesystem::permissions(folder_.File("a"), perms::owner_write,
                                  std::filesystem::perm_options::add);
-    if (!refused) {
-        GTEST_SKIP() << "this user may write protected files";
-    }
 }
 
 TEST_F(SaveStream, ARelativeNameIsReplacedInTheCurrentFolder) {

@@ -20,8 +20,7 @@ TEST(Strings, Utf8AndUtf16OfOneTextBelongTogether) {
         {"two bytes", "\xC2\x80\xDF\xBF", u"\x0080\x07FF"},
         {"three bytes", "\xE0\xA0\x80\xEF\xBF\xBF", u"\x0800\xFFFF"},
         {"around the surrogates", "\xED\x9F\xBF\xEE\x80\x80", u"\xD7FF\xE000"},
-        {"four bytes", "\xF0\x90\x80\x80\xF4\x8F\xBF\xBF", u"\xD800\xDC00\xDBFF\xDFFF"},
-    };
+        {"four bytes", "\xF0\x90\x80\x80\xF4\x8F\xBF\xBF", u"\xD800\xDC00\xDBFF\xDFFF"}};
     for (const TPair& pair : pairs) {
         EXPECT_EQ(Utf16FromUtf8(pair.utf8), pair.utf16) << pair.name;
         EXPECT_EQ(Utf8FromUtf16(pair.utf16), pair.utf8) << pair.name;
@@ -30,16 +29,14 @@ TEST(Strings, Utf8AndUtf16OfOneTextBelongTogether) {
 
 TEST(Strings, MalformedBytesAreKeptOneByOne) {
     const TPair pairs[] = {
-        {"lone continuation", "a\x80z", u"a\xDC80z"},
-        {"cut short at the end", "\xE2\x82", u"\xDCE2\xDC82"},
+        {"lone continuation, cut short", "a\x80z\xE2\x82", u"a\xDC80z\xDCE2\xDC82"},
         {"cut short before a letter", "\xF0\x9F\x98x", u"\xDCF0\xDC9F\xDC98x"},
         {"overlong slash", "\xC0\xAF", u"\xDCC0\xDCAF"},
         {"overlong in three bytes", "\xE0\x9F\xBF", u"\xDCE0\xDC9F\xDCBF"},
         {"overlong in four bytes", "\xF0\x8F\xBF\xBF", u"\xDCF0\xDC8F\xDCBF\xDCBF"},
         {"surrogate", "\xED\xA0\x80", u"\xDCED\xDCA0\xDC80"},
         {"beyond the last character", "\xF4\x90\x80\x80", u"\xDCF4\xDC90\xDC80\xDC80"},
-        {"never valid", "\xFE\xFF", u"\xDCFE\xDCFF"},
-    };
+        {"never valid", "\xFE\xFF", u"\xDCFE\xDCFF"}};
     for (const TPair& pair : pairs) {
         EXPECT_EQ(Utf16FromUtf8(pair.utf8), pair.utf16) << pair.name;
         EXPECT_EQ(Utf8FromUtf16(pair.utf16), pair.utf8) << pair.name;
@@ -66,28 +63,26 @@ TEST(Strings, IntegersAsUsersTypeThem) {
     const struct {
         const char16_t* text;
         std::optional<std::int32_t> value;
-    } rows[] = {
-        {u"0", 0},
-        {u" \t42\t ", 42},
-        {u"+7", 7},
-        {u"-0012", -12},
-        {u"2147483647", 2147483647},
-        {u"2147483648", std::nullopt},
-        {u"-2147483648", -2147483647 - 1},
-        {u"-2147483649", std::nullopt},
-        {u"99999999999999999999999999", std::nullopt},
-        {u"", std::nullopt},
-        {u"  ", std::nullopt},
-        {u"-", std::nullopt},
-        {u"+-1", std::nullopt},
-        {u"- 1", std::nullopt},
-        {u"1 2", std::nullopt},
-        {u"1.0", std::nullopt},
-        {u"0x10", std::nullopt},
-        {u"12px", std::nullopt},
-        {u"\x0661", std::nullopt},  // an Arabic digit
-        {u"1\n", std::nullopt},
-    };
+    } rows[] = {{u"0", 0},
+                {u" \t42\t ", 42},
+                {u"+7", 7},
+                {u"-0012", -12},
+                {u"2147483647", 2147483647},
+                {u"2147483648", std::nullopt},
+                {u"-2147483648", -2147483647 - 1},
+                {u"-2147483649", std::nullopt},
+                {u"99999999999999999999999999", std::nullopt},
+                {u"", std::nullopt},
+                {u"  ", std::nullopt},
+                {u"-", std::nullopt},
+                {u"+-1", std::nullopt},
+                {u"- 1", std::nullopt},
+                {u"1 2", std::nullopt},
+                {u"1.0", std::nullopt},
+                {u"0x10", std::nullopt},
+                {u"12px", std::nullopt},
+                {u"\x0661", std::nullopt},  // an Arabic digit
+                {u"1\n", std::nullopt}};
     for (const auto& row : rows) {
         EXPECT_EQ(ParseInteger(std::u16string_view(row.text)), row.value)
             << Utf8FromUtf16(row.text);
@@ -112,16 +107,13 @@ TEST(Strings, KeysFoldTheScriptsTheyAreWrittenIn) {
     EXPECT_EQ(AsciiUpper(std::u16string_view(u"`az{\x00E4")), u"`AZ{\x00E4");
 }
 
-TEST(Strings, LinesEndInThreeWays) {
+TEST(Strings, LinesEndInThreeWaysAndPartsAtSeparators) {
     using TLines = std::vector<std::u16string>;
     EXPECT_EQ(SplitLines(u""), TLines{});
     EXPECT_EQ(SplitLines(u"a\r\nb\nc\rd"), (TLines{u"a", u"b", u"c", u"d"}));
     EXPECT_EQ(SplitLines(u"a\r\n"), TLines{u"a"});
     EXPECT_EQ(SplitLines(u"\n\r\r\n"), (TLines{u"", u"", u""}));
     EXPECT_EQ(SplitLines(u"a\r\n\r"), (TLines{u"a", u""}));
-}
-
-TEST(Strings, PartsBetweenSeparators) {
     using TParts = std::vector<std::string>;
     EXPECT_EQ(SplitText("", ';'), TParts{""});
     EXPECT_EQ(SplitText("A;;B;", ';'), (TParts{"A", "", "B", ""}));
@@ -133,11 +125,9 @@ TEST(Strings, PartsOfFileNames) {
         const char16_t* folder;
         const char16_t* base;
         const char16_t* extension;
-    } rows[] = {
-        {u"", u"", u"", u""},           {u"a.JPG", u"", u"a.JPG", u".JPG"},
-        {u"x.y/a", u"x.y/", u"a", u""}, {u"/x/a.tar.gz", u"/x/", u"a.tar.gz", u".gz"},
-        {u"x/", u"x/", u"", u""},       {u"x/a.", u"x/", u"a.", u"."},
-    };
+    } rows[] = {{u"", u"", u"", u""},           {u"a.JPG", u"", u"a.JPG", u".JPG"},
+                {u"x.y/a", u"x.y/", u"a", u""}, {u"/x/a.tar.gz", u"/x/", u"a.tar.gz", u".gz"},
+                {u"x/", u"x/", u"", u""},       {u"x/a.", u"x/", u"a.", u"."}};
     for (const auto& row : rows) {
         EXPECT_EQ(FileFolder(row.name), row.folder);
         EXPECT_EQ(FileBaseName(row.name), row.base);

@@ -9,6 +9,7 @@
 
 #include "engine/foundation/zmnumbers.h"
 #include "engine/foundation/zmsettings.h"
+#include "tests/support/testmessage.h"
 
 namespace zm {
 namespace {
@@ -64,15 +65,17 @@ TEST(ThreadPool, MembersRunAtTheSameTimeAndStayAfterWaitFor) {
     EXPECT_EQ(pool.GetCount(), 3u);
 }
 
-TEST(ThreadPool, JoinFreesInListOrder) {
+TEST(ThreadPool, JoinFreesInListOrderAlsoWhenItRaises) {
     std::string freed;
     TZmThreadPool pool;
     for (const char name : std::string("abc")) {
         pool.Add(std::make_unique<TWork>(
-            name != 'b', [] {}, &freed, name));
+            name != 'b', [name] { name == 'a' ? throw std::out_of_range("x") : void(); }, &freed,
+            name));
     }
-    pool.Join();
+    EXPECT_THROW(pool.Join(), std::out_of_range);
     EXPECT_EQ(freed, "abc");
+    EXPECT_EQ(pool.GetCount(), 0u);
 }
 
 TEST(ThreadPool, DestructionWaitsForTheWork) {
@@ -98,21 +101,9 @@ TEST(ThreadPool, TheFirstExceptionComesOutAfterAllHaveEnded) {
         std::this_thread::sleep_for(std::chrono::milliseconds(20));
         last_ended = true;
     }));
-    try {
-        pool.WaitFor();
-        ADD_FAILURE() << "no exception";
-    } catch (const std::runtime_error& error) {
-        EXPECT_STREQ(error.what(), "first");
-    }
+    EXPECT_EQ(test::MessageOf([&] { pool.WaitFor(); }), "first");
     EXPECT_TRUE(last_ended);
     EXPECT_NO_THROW(pool.Join()) << "an exception is raised once";
-    EXPECT_EQ(pool.GetCount(), 0u);
-}
-
-TEST(ThreadPool, JoinRaisesAndStillEmptiesTheList) {
-    TZmThreadPool pool;
-    pool.Add(std::make_unique<TWork>(true, [] { throw std::out_of_range("x"); }));
-    EXPECT_THROW(pool.Join(), std::out_of_range);
     EXPECT_EQ(pool.GetCount(), 0u);
 }
 

@@ -10,6 +10,7 @@
 
 #include "engine/foundation/zmdefs.h"
 #include "engine/io/zmstreamprovider.h"
+#include "tests/support/testmessage.h"
 
 namespace zm {
 namespace {
@@ -125,6 +126,8 @@ TEST(BufferedReadStream, CountsFromItsCreationWhenRelative) {
     EXPECT_EQ(4, reader.Seek(4, soBeginning));
     EXPECT_EQ(24, ReadByte(reader));
     EXPECT_EQ(29, reader.Seek(-1, soEnd));
+    EXPECT_EQ(30, reader.GetSize());
+    EXPECT_EQ(50, TZmBufferedReadStream(&source, 8, false).GetSize());
 }
 
 TEST(BufferedReadStream, ForwardsWithoutABuffer) {
@@ -156,17 +159,11 @@ TEST(BufferedStreams, RefuseTheOtherDirection) {
     TMemoryStream stream(CountingBytes(4));
     TZmBufferedReadStream reader(&stream, 4, false);
     TZmBufferedWriteStream writer(&stream, 4);
-    const auto message_of = [](auto&& call) -> std::string {
-        try {
-            call();
-        } catch (const EZmException& error) {
-            return error.what();
-        }
-        return "nothing raised";
-    };
     std::uint8_t byte = 0;
-    EXPECT_EQ("TZmBufferedReadStream cannot write!", message_of([&] { reader.Write(&byte, 1); }));
-    EXPECT_EQ("TZmBufferedWriteStream cannot read!", message_of([&] { writer.Read(&byte, 1); }));
+    EXPECT_EQ("TZmBufferedReadStream cannot write!",
+              test::MessageOf([&] { reader.Write(&byte, 1); }));
+    EXPECT_EQ("TZmBufferedWriteStream cannot read!",
+              test::MessageOf([&] { writer.Read(&byte, 1); }));
 }
 
 TEST(BufferedWriteStream, FlushesFullBlocksOnSeekAndAtTheEnd) {

@@ -8,102 +8,31 @@
 #include <string>
 #include <vector>
 
-#include "engine/foundation/zmsettings.h"
-#include "engine/foundation/zmstreams.h"
-#include "engine/io/zmfileformats.h"
-#include "tests/support/testfiles.h"
+#include "tests/io/driverfixture.h"
 
 namespace zm {
 namespace {
 
-using TBytes = std::vector<std::uint8_t>;
-
-/// Text, then zeros up to a size.
-TBytes Padded(const std::string& text, std::size_t size) {
-    TBytes bytes(text.begin(), text.end());
-    bytes.resize(size);
-    return bytes;
-}
-
-void PutWord(TBytes& bytes, std::size_t place, unsigned value) {
-    bytes[place] = static_cast<std::uint8_t>(value);
-    bytes[place + 1] = static_cast<std::uint8_t>(value >> 8);
-}
-
-void PutLong(TBytes& bytes, std::size_t place, std::uint32_t value) {
-    PutWord(bytes, place, value & 0xFFFF);
-    PutWord(bytes, place + 2, value >> 16);
-}
-
-TBytes Joined(TBytes first, const TBytes& second) {
-    first.insert(first.end(), second.begin(), second.end());
-    return first;
-}
+using test::BytesWith;
+using test::Joined;
+using test::Padded;
+using test::TBytes;
 
 /// A directory of one entry and one byte behind it.
-TBytes IconDirectory(unsigned type_word, std::uint32_t image_offset) {
-    TBytes bytes(23);
-    PutWord(bytes, 2, type_word);
-    PutWord(bytes, 4, 1);
-    PutLong(bytes, 6 + 8, 1);
-    PutLong(bytes, 6 + 12, image_offset);
-    return bytes;
+TBytes IconDirectory(std::uint32_t type_word, std::uint32_t image_offset) {
+    return BytesWith(23, {{2, type_word | 1 << 16}, {6 + 8, 1}, {6 + 12, image_offset}});
 }
 
-TBytes Targa() {
-    TBytes bytes(18);
-    bytes[2] = 2;  // true colour
-    PutWord(bytes, 12, 1);
-    PutWord(bytes, 14, 1);
-    bytes[16] = 24;
-    return bytes;
+/// True colour, one pixel of 24 bits.
+TBytes Targa(std::uint32_t image_type) {
+    return BytesWith(18, {{2, image_type}, {12, 1 | 1 << 16}, {16, 24}});
 }
 
-TBytes MetafileHeader() {
-    TBytes bytes(18);
-    PutWord(bytes, 0, 1);
-    PutWord(bytes, 2, 9);
-    return bytes;
-}
-
-TBytes PlaceableMetafile() {
-    TBytes bytes(22);
-    PutLong(bytes, 0, 0x9AC6CDD7);
-    return Joined(bytes, MetafileHeader());
-}
-
-TBytes EnhancedMetafile() {
-    TBytes bytes(108);
-    PutLong(bytes, 0, 1);
-    PutLong(bytes, 40, 0x464D4520);
-    return bytes;
-}
-
-TBytes Photoshop() {
-    TBytes bytes = Padded("8BPS", 26);
-    bytes[5] = 2;    // version
-    bytes[13] = 24;  // channels
-    bytes[23] = 16;  // depth
-    bytes[25] = 9;   // mode
-    return bytes;
-}
+constexpr std::uint32_t kMetafileStart = 1 | 9 << 16;
+constexpr std::uint32_t kMultiPagePcx = 0x3ADE68B1;
 
 TBytes Layers() {
-    TBytes bytes = Padded("ZALMOIOLAYERS", 25);
-    PutLong(bytes, 13, 1);
-    return bytes;
-}
-
-TBytes LayersAndVectors() {
-    TBytes bytes(4);
-    PutLong(bytes, 0, 29);
-    return Joined(Joined(bytes, Layers()), {'Z', 'M', 'V', 87});
-}
-
-TBytes MultiPagePcx() {
-    TBytes bytes(8);
-    PutLong(bytes, 0, 0x3ADE68B1);
-    return bytes;
+    return Padded("ZALMOIOLAYERS\1", 25);
 }
 
 TBytes JunkBeforeJpeg(std::size_t junk) {
@@ -122,14 +51,13 @@ const std::vector<TTag> kSize{{256, 3, 1, 5}, {257, 3, 1, 5}};
 /// A little-endian header and a directory right behind it, without the next directory's offset.
 TBytes Tiff(const std::vector<TTag>& tags, const std::string& magic = "II*") {
     TBytes bytes = Padded(magic, 10 + 12 * tags.size());
-    PutLong(bytes, 4, 8);
-    PutWord(bytes, 8, static_cast<unsigned>(tags.size()));
+    test::PutNumber(bytes, 4, 8);
+    test::PutNumber(bytes, 8, static_cast<std::uint32_t>(tags.size()));
     for (std::size_t i = 0; i < tags.size(); ++i) {
         const std::size_t place = 10 + 12 * i;
-        PutWord(bytes, place, tags[i].tag);
-        PutWord(bytes, place + 2, tags[i].type);
-        PutLong(bytes, place + 4, tags[i].count);
-        PutLong(bytes, place + 8, tags[i].value);
+        test::PutNumber(bytes, place, tags[i].tag | tags[i].type << 16);
+        test::PutNumber(bytes, place + 4, tags[i].count);
+        test::PutNumber(bytes, place + 8, tags[i].value);
     }
     return bytes;
 }
@@ -147,15 +75,10 @@ TBytes BigEndianTiff() {
             1,   1,   0, 4,  0, 0, 0, 1, 0, 0, 0, 5};  // height
 }
 
+/// Offsets of 8 bytes, the first directory at 16, two entries.
 TBytes BigTiff() {
-    TBytes bytes(16 + 8 + 2 * 20);
-    PutLong(bytes, 0, 43 << 16 | 0x4949);
-    PutWord(bytes, 4, 8);   // bytes of an offset
-    PutLong(bytes, 8, 16);  // first directory
-    PutLong(bytes, 16, 2);  // entries
-    PutWord(bytes, 24, 256);
-    PutWord(bytes, 44, 257);
-    return bytes;
+    return BytesWith(16 + 8 + 2 * 20,
+                     {{0, 43 << 16 | 0x4949}, {4, 8}, {8, 16}, {16, 2}, {24, 256}, {44, 257}});
 }
 
 TBytes HDPhoto() {
@@ -219,34 +142,30 @@ INSTANTIATE_TEST_SUITE_P(
         TCase{"png", Padded("\x89PNG", 9), 3, 'g', ioPNG},
         TCase{"dicom", Joined(TBytes(128), {'D', 'I', 'C', 'M'}), 131, 'm', ioDICOM},
         TCase{"icon", IconDirectory(1, 22), 18, 21, ioICO},
-        TCase{"cursor", IconDirectory(2, 22), 9, 1, ioCUR}, TCase{"targa", Targa(), 16, 15, ioTGA},
-        TCase{"targa of type 11",
-              [] {
-                  TBytes b = Targa();
-                  b[2] = 11;
-                  return b;
-              }(),
-              2, 12, ioTGA},
+        TCase{"cursor", IconDirectory(2, 22), 9, 1, ioCUR}, TCase{"targa", Targa(2), 16, 15, ioTGA},
+        TCase{"targa of type 11", Targa(11), 2, 12, ioTGA},
         TCase{"pixmap", Padded("P6 1 1", 6), 1, '7', ioPXM},
         TCase{"pixmap with comment", Padded("#x P1\nP4\n# 0\r8 2", 16), 7, '7', ioPXM},
         TCase{"jp2", {0, 0, 0, 12, 0x6A, 0x50, 0x20, 0x20, 0x0D, 0x0A, 0x87, 0x0A}, 3, 11, ioJP2},
         TCase{"code stream", {0xFF, 0x4F, 0xFF, 0x51}, 3, 0x52, ioJ2K},
         TCase{"avi", Padded("RIFFxxxxAVI ", 12), 11, 'X', ioAVI},
-        TCase{"dcx", MultiPagePcx(), 4, 8, ioDCX},
-        TCase{"wmf", Joined(MetafileHeader(), {0, 0}), 16, 1, ioWMF},
-        TCase{"placeable wmf", PlaceableMetafile(), 38, 1, ioWMF},
-        TCase{"emf", EnhancedMetafile(), 40, 0, ioEMF}, TCase{"psd", Photoshop(), 13, 25, ioPSD},
+        TCase{"dcx", BytesWith(8, {{0, kMultiPagePcx}}), 4, 8, ioDCX},
+        TCase{"wmf", BytesWith(20, {{0, kMetafileStart}}), 16, 1, ioWMF},
+        TCase{"placeable wmf", BytesWith(40, {{0, 0x9AC6CDD7}, {22, kMetafileStart}}), 38, 1,
+              ioWMF},
+        TCase{"emf", BytesWith(108, {{0, 1}, {40, 0x464D4520}}), 40, 0, ioEMF},
+        // Version 2, 24 channels of 16 bits, mode 9: the most of each.
+        TCase{"psd", BytesWith(26, {{0, 0x53504238}, {5, 2}, {13, 24}, {23, 16}, {25, 9}}), 13, 25,
+              ioPSD},
         TCase{"vectors", {'Z', 'M', 'V', 49}, 3, 48, ioZMV},
         TCase{"layers", Layers(), 13, 0, ioLYR},
-        TCase{"layers and vectors", LayersAndVectors(), 32, 88, ioALL},
+        TCase{"layers and vectors", Joined(Joined({29, 0, 0, 0}, Layers()), {'Z', 'M', 'V', 87}),
+              32, 88, ioALL},
         TCase{"jpeg behind 149 bytes", JunkBeforeJpeg(149), 151, 0xFE, ioJPEG}));
 
-TEST(DetectionDetails, JpegIsFoundAmongTheFirst150PositionsOnly) {
+TEST(DetectionDetails, TheJpegScanEndsEarlyAndIsSkippedForRawSignatures) {
     EXPECT_EQ(ioJPEG, Detect(JunkBeforeJpeg(0)));
     EXPECT_EQ(0, Detect(JunkBeforeJpeg(150)));
-}
-
-TEST(DetectionDetails, RawSignaturesSkipTheJpegScan) {
     // Place and text of each signature, in 17 bytes with a JPEG behind them.
     const std::vector<std::vector<std::pair<std::size_t, std::string>>> signatures{
         {{0, "IIRO"}},
@@ -286,16 +205,17 @@ TEST(DetectionDetails, CameraRawTiffsAreNoTiff) {
     // A JPEG near the start of such a file decides, unless the signature is a raw one.
     TBytes with_jpeg = Joined(TiffWith({{50706, 1, 4, 0x401}}), JunkBeforeJpeg(0));
     EXPECT_EQ(ioJPEG, Detect(with_jpeg));
-    PutWord(with_jpeg, 2, 'R' | 'O' << 8);
+    with_jpeg[2] = 'R';
+    with_jpeg[3] = 'O';
     EXPECT_EQ(0, Detect(with_jpeg));
 }
 
 TEST(DetectionDetails, DirectoriesThatClaimAnythingAreReadWithinTheFile) {
     TBytes bytes = Tiff(kSize);
-    PutWord(bytes, 8, 0xFFFF);  // more entries than the file has room for
+    bytes[8] = bytes[9] = 0xFF;  // more entries than the file has room for
     EXPECT_EQ(ioTIFF, Detect(bytes));
     for (const std::uint32_t place : {0u, 33u, 34u, 0x7FFFFFFFu, 0xFFFFFFFFu}) {
-        PutLong(bytes, 4, place);
+        test::PutNumber(bytes, 4, place);
         EXPECT_EQ(0, Detect(bytes)) << place;
     }
     TBytes big = BigTiff();
@@ -308,46 +228,39 @@ TEST(DetectionDetails, DirectoriesThatClaimAnythingAreReadWithinTheFile) {
                               {257, 12, 9, 0xFFFFFFF0},
                               {330, 4, 1, 9},
                               {37398, 1, 4, 1}})));
-}
-
-TEST(DetectionDetails, ALongDirectoryIsReadToItsEnd) {
-    std::vector<TTag> tags(1000, TTag{700, 1, 1, 0});
-    tags.insert(tags.end(), kSize.begin(), kSize.end());
-    EXPECT_EQ(ioTIFF, Detect(Tiff(tags)));
+    std::vector<TTag> many(1000, TTag{700, 1, 1, 0});
+    many.insert(many.end(), kSize.begin(), kSize.end());
+    EXPECT_EQ(ioTIFF, Detect(Tiff(many)));
 }
 
 TEST(DetectionDetails, IconOffsetsAreUnsignedAndEveryEntryCounts) {
     EXPECT_EQ(ioICO, Detect(IconDirectory(1, 0xFFFFFFF0)));
     TBytes two = IconDirectory(1, 0xFFFFFFF0);
-    PutWord(two, 4, 2);
+    two[4] = 2;
     EXPECT_NE(ioICO, Detect(two));  // the second entry is not there
     two.resize(6 + 2 * 16);
-    PutLong(two, 22 + 8, 1);
-    PutLong(two, 22 + 12, 38);
+    test::PutNumber(two, 22 + 8, 1);
+    test::PutNumber(two, 22 + 12, 38);
     EXPECT_EQ(ioICO, Detect(two));
     two[22 + 3] = 1;
     EXPECT_NE(ioICO, Detect(two));
 }
 
 TEST(DetectionDetails, DcxLooksAtNoMoreThan1024Pages) {
-    TBytes bytes(4 + 4 * 1025);
-    PutLong(bytes, 0, 0x3ADE68B1);
+    TBytes bytes = BytesWith(4 + 4 * 1025, {{0, kMultiPagePcx}});
     for (std::size_t page = 0; page < 1025; ++page) {
-        PutLong(bytes, 4 + 4 * page, 5);
+        test::PutNumber(bytes, 4 + 4 * page, page < 1024 ? 5 : 0xFFFFFFFF);
     }
-    PutLong(bytes, 4 + 4 * 1024, 0xFFFFFFFF);
     EXPECT_EQ(ioDCX, Detect(bytes));
-    PutLong(bytes, 4 + 4 * 1023, 0xFFFFFFFF);
+    test::PutNumber(bytes, 4 + 4 * 1023, 0xFFFFFFFF);
     EXPECT_NE(ioDCX, Detect(bytes));
 }
 
 TEST(DetectionDetails, ALeadingLetterPExcludesTargaOnlyWithADigit) {
-    TBytes bytes = Targa();
+    TBytes bytes = Targa(2);
     bytes[0] = 'P';
-    bytes[1] = 0;
     EXPECT_EQ(ioTGA, Detect(bytes));  // the second byte is no digit: no further look
-    // A colour map type below 2 excludes a digit in the second byte.
-    bytes[1] = '5';
+    bytes[1] = '5';                   // and no type of a colour map
     bytes[2] = '\n';
     EXPECT_NE(ioTGA, Detect(bytes));
 }
@@ -361,62 +274,49 @@ TEST(DetectionDetails, PixmapTokensConsumeTheByteBehindThem) {
     EXPECT_EQ(ioPXM, Detect(Padded(long_comment, long_comment.size())));
 }
 
-/// A stream that claims another size than it has.
-class TClaimingStream : public TMemoryStream {
-public:
-    TClaimingStream(TBytes bytes, std::int64_t size)
-        : TMemoryStream(std::move(bytes)), size_(size) {}
-    std::int64_t GetSize() override { return size_; }
-    std::int32_t Read(void* buffer, std::int32_t count) override {
-        const auto there = static_cast<std::int64_t>(Bytes().size());
-        const std::int64_t left = std::max<std::int64_t>(there - GetPosition(), 0);
-        return TMemoryStream::Read(buffer,
-                                   static_cast<std::int32_t>(std::min<std::int64_t>(count, left)));
-    }
-
-private:
-    std::int64_t size_;
-};
-
-TEST(DetectionDetails, SizeLimitsCompareA32BitSignedSize) {
-    TClaimingStream large(Padded("BM", 15), 0x7FFFFFFF);
-    EXPECT_EQ(ioBMP, FindStreamFormat(large));
-    TClaimingStream larger(Padded("BM", 15), 0x80000000);
-    EXPECT_EQ(0, FindStreamFormat(larger));
-    TClaimingStream lying(Padded("BM", 10), 100);  // bytes that are not there never match
-    EXPECT_EQ(0, FindStreamFormat(lying));
-}
-
-class TCountingStream : public TMemoryStream {
+/// A stream that may claim another size than it has, counts what is read, and may raise.
+class TOddStream : public TMemoryStream {
 public:
     using TMemoryStream::TMemoryStream;
+    std::int64_t GetSize() override { return claimed < 0 ? TMemoryStream::GetSize() : claimed; }
     std::int32_t Read(void* buffer, std::int32_t count) override {
-        const std::int32_t got = TMemoryStream::Read(buffer, count);
+        if (raises) {
+            SetPosition(50);
+            throw EReadError("broken");
+        }
+        const auto there = static_cast<std::int64_t>(Bytes().size());
+        const std::int64_t left = std::clamp<std::int64_t>(there - GetPosition(), 0, count);
+        const auto got = TMemoryStream::Read(buffer, static_cast<std::int32_t>(left));
         bytes_read += got;
         return got;
     }
+    std::int64_t claimed = -1;
     std::int64_t bytes_read = 0;
+    bool raises = false;
 };
+
+TEST(DetectionDetails, SizeLimitsCompareA32BitSignedSize) {
+    TOddStream stream(Padded("BM", 15));
+    stream.claimed = 0x7FFFFFFF;
+    EXPECT_EQ(ioBMP, FindStreamFormat(stream));
+    stream.claimed = 0x80000000;
+    EXPECT_EQ(0, FindStreamFormat(stream));
+    TOddStream lying(Padded("BM", 10));  // bytes that are not there never match
+    lying.claimed = 100;
+    EXPECT_EQ(0, FindStreamFormat(lying));
+}
 
 TEST(DetectionDetails, OneSmallReadServesAllTestsOfAStart) {
     for (const char* start : {"", "II*", "P7#", "RIFF"}) {
-        TCountingStream stream(Padded(start, 1 << 20));
+        TOddStream stream(Padded(start, 1 << 20));
         EXPECT_EQ(0, FindStreamFormat(stream)) << start;
         EXPECT_LE(stream.bytes_read, 4096) << start;
     }
 }
 
-class TRaisingStream : public TMemoryStream {
-public:
-    TRaisingStream() : TMemoryStream(TBytes(100)) {}
-    std::int32_t Read(void*, std::int32_t) override {
-        SetPosition(50);
-        throw EReadError("broken");
-    }
-};
-
 TEST(DetectionDetails, APositionIsRestoredWhenTheStreamRaises) {
-    TRaisingStream stream;
+    TOddStream stream(TBytes(100));
+    stream.raises = true;
     stream.SetPosition(3);
     EXPECT_THROW(FindStreamFormat(stream), EReadError);
     EXPECT_EQ(3, stream.GetPosition());
@@ -427,15 +327,6 @@ class DetectionOfFiles : public ::testing::Test {
 protected:
     void TearDown() override { DestroySingletonInstance(); }
 
-    static void Register(std::int32_t type, const std::string& extensions,
-                         TZmTryImageStream try_function) {
-        auto row = std::make_shared<TZmFileFormatInfo>();
-        row->FileType = type;
-        row->Extensions = extensions;
-        row->TryFunction = try_function;
-        RegisterFileFormat(row);
-    }
-
     std::int32_t Find(const std::string& name, const TBytes& bytes, TZmFindFormatMethod method) {
         test::WriteFileBytes(folder_.File(name), bytes);
         return FindFileFormat(folder_.Name(name), method);
@@ -445,14 +336,14 @@ protected:
 };
 
 TEST_F(DetectionOfFiles, AsksRowsInTheirOrderFromTheStartingPosition) {
-    Register(9000, "", [](TStream& stream, std::int32_t) {
+    test::RegisterRow(9000, "", nullptr, nullptr, [](TStream& stream, std::int32_t) {
         stream.SetPosition(0);
         return false;
     });
-    Register(9001, "", [](TStream& stream, std::int32_t type) {
+    test::RegisterRow(9001, "", nullptr, nullptr, [](TStream& stream, std::int32_t type) {
         return stream.GetPosition() == 5 && type == 9001;
     });
-    Register(9002, "", [](TStream&, std::int32_t) { return true; });
+    test::RegisterRow(9002, "", nullptr, nullptr, [](TStream&, std::int32_t) { return true; });
     TMemoryStream stream(TBytes(40, 0xAB));
     stream.SetPosition(5);
     EXPECT_EQ(9001, FindStreamFormat(stream));
@@ -465,7 +356,9 @@ TEST_F(DetectionOfFiles, ReconcilesNameAndContent) {
     const TBytes icon = IconDirectory(1, 22);
     const TBytes avi = Padded("RIFFxxxxAVI ", 12);
     const TBytes nothing(5, 0xAB);
-    Register(9000, "PLUG", nullptr);
+    test::RegisterRow(9000, "PLUG");
+    EXPECT_EQ(0, FindFileFormat(u"", zmfmContentElseExtension));
+    EXPECT_EQ(0, FindFileFormat(folder_.Name("missing.png"), zmfmContentElseExtension));
     struct TRow {
         const char* name;
         const TBytes* bytes;
@@ -522,11 +415,6 @@ TEST(DetectionOfSamples, RealFilesAreOfTheirFormat) {
         EXPECT_TRUE(expected->second.contains(type)) << entry.path << " gave " << type;
     }
     EXPECT_GT(tested, 200u);
-}
-
-TEST_F(DetectionOfFiles, MissingFilesHaveNoType) {
-    EXPECT_EQ(0, FindFileFormat(u"", zmfmContentElseExtension));
-    EXPECT_EQ(0, FindFileFormat(folder_.Name("missing.png"), zmfmContentElseExtension));
 }
 
 }  // namespace

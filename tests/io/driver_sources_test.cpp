@@ -1,24 +1,15 @@
-#include <gtest/gtest.h>
-
-#include <array>
 #include <string>
 #include <vector>
 
-#include "engine/bitmap/zmxBitmaps.h"
-#include "engine/foundation/zmsettings.h"
-#include "engine/foundation/zmstreams.h"
-#include "engine/io/zalmoio.h"
-#include "engine/io/zmfileformats.h"
 #include "engine/metadata/zmmetahooks.h"
-#include "tests/support/testfiles.h"
-#include "tests/support/testimages.h"
+#include "tests/io/driverfixture.h"
 
 // Headers without images, images in a row, images from modules and as text, and what the driver
 // does around a codec.
 namespace zm {
 namespace {
 
-using TBytes = std::vector<std::uint8_t>;
+using test::TBytes;
 
 constexpr std::int32_t kManyType = 9001;
 
@@ -34,26 +25,7 @@ void ReadOneOfThree(TStream&, TZmBitmap& bitmap, TIOParams& params, TProgressRec
     bitmap.SetPixels_zm8(0, 0, static_cast<std::uint8_t>(params.GetImageIndex()));
 }
 
-class DriverSources : public ::testing::Test {
-protected:
-    void SetUp() override {
-        image_ = test::MakeGradient(zm24RGB, 12, 9);
-        io_ = TZalmoIO::CreateFromBitmap(image_.get());
-        io_->SetOnFinishWork([this](void*) { ++finish_count_; });
-    }
-    void TearDown() override { DestroySingletonInstance(); }
-
-    TBytes SavedAs(std::int32_t type) {
-        TMemoryStream stream;
-        EXPECT_TRUE(io_->SaveToStream(stream, type));
-        return stream.Bytes();
-    }
-
-    test::TempFolder folder_;
-    std::unique_ptr<TZmBitmap> image_;
-    std::unique_ptr<TZalmoIO> io_;
-    int finish_count_ = 0;
-};
+using DriverSources = test::DriverFixture;
 
 TEST_F(DriverSources, ParametersComeWithoutTheImage) {
     io_->GetParams()->SetDpiX(123);
@@ -102,12 +74,23 @@ TEST_F(DriverSources, ParametersOfWhatIsNoImage) {
     EXPECT_TRUE(io_->GetAborting());
 }
 
+TEST_F(DriverSources, AHeaderAloneTellsTheResolutionThatALoadWould) {
+    io_->GetParams()->SetDpiX(1);
+    io_->GetParams()->SetDpiY(2);
+    const TBytes jpeg = SavedAs(ioJPEG);
+    const auto size = static_cast<std::int64_t>(jpeg.size());
+    ZmGlobalSettings().fDefaultDPIX = 123;
+    for (const bool is_whole : {false, true}) {
+        ASSERT_TRUE(is_whole ? io_->LoadFromBuffer(jpeg.data(), size, ioJPEG)
+                             : io_->ParamsFromBuffer(jpeg.data(), size, ioJPEG));
+        EXPECT_EQ(123, io_->GetParams()->GetDpiX());
+        EXPECT_EQ(2, io_->GetParams()->GetDpiY());
+        EXPECT_EQ(123, io_->GetParams()->fEXIF_XResolution);
+    }
+}
+
 TEST_F(DriverSources, SeekStaysWithinTheImages) {
-    auto row = std::make_shared<TZmFileFormatInfo>();
-    row->FileType = kManyType;
-    row->Extensions = "MANY";
-    row->ReadFunction = ReadOneOfThree;
-    RegisterFileFormat(row);
+    test::RegisterRow(kManyType, "MANY", ReadOneOfThree);
     test::WriteFileBytes(folder_.File("a.many"), {1});
     struct TStep {
         TZmIOSeekDestination destination;
@@ -190,12 +173,12 @@ TEST_F(DriverSources, UnequalResolutionsAreMadeEqual) {
             reader.SetFilteredAdjustDPI(is_filtered);
             ASSERT_TRUE(reader.LoadFromStreamPNG(stream));
             TZmBitmap& loaded = *reader.GetZmBitmap();
-            EXPECT_EQ(row.new_width, loaded.GetWidth());
-            EXPECT_EQ(row.new_height, loaded.GetHeight());
-            EXPECT_EQ(row.new_width, reader.GetParams()->fWidth);
-            EXPECT_EQ(row.new_height, reader.GetParams()->fHeight);
-            EXPECT_EQ(row.new_dpi, reader.GetParams()->GetDpiX());
-            EXPECT_EQ(row.new_dpi, reader.GetParams()->GetDpiY());
+            const TIOParams& params = *reader.GetParams();
+            const std::pair new_size(row.new_width, row.new_height);
+            EXPECT_EQ(new_size, std::pair(loaded.GetWidth(), loaded.GetHeight()));
+            EXPECT_EQ(new_size, std::pair(params.fWidth, params.fHeight));
+            EXPECT_EQ(std::pair(row.new_dpi, row.new_dpi),
+                      std::pair(params.GetDpiX(), params.GetDpiY()));
             ASSERT_TRUE(loaded.HasAlphaChannel());
             EXPECT_EQ(row.new_width, loaded.GetAlphaChannel()->GetWidth());
             EXPECT_EQ(image->GetAlpha(0, 0), loaded.GetAlpha(0, 0));
@@ -204,6 +187,22 @@ TEST_F(DriverSources, UnequalResolutionsAreMadeEqual) {
             }
         }
     }
+}
+
+TEST_F(DriverSources, AWantedSizeIsNotTheSizeThatIsMadeEqual) {
+    image_ = test::MakeGradient(zm24RGB, 64, 48);
+    io_->AttachZmBitmap(image_.get());
+    io_->GetParams()->SetDpiX(200);
+    io_->GetParams()->SetDpiY(100);
+    const TBytes jpeg = SavedAs(ioJPEG);
+    TZalmoIO reader;
+    reader.SetAutoAdjustDPI(true);
+    reader.GetParams()->fJPEG_Scale = ioJPEG_AUTOCALC;
+    reader.GetParams()->fWidth = reader.GetParams()->fHeight = 20;  // half the size covers it
+    ASSERT_TRUE(LoadBytes(reader, jpeg, ioJPEG));
+    EXPECT_EQ(32, reader.GetZmBitmap()->GetWidth());
+    EXPECT_EQ(48, reader.GetZmBitmap()->GetHeight());
+    EXPECT_EQ(48, reader.GetParams()->fHeight);
 }
 
 TEST_F(DriverSources, ResolutionsAloneDoNotAskForMemory) {
@@ -248,7 +247,7 @@ TEST_F(DriverSources, MetadataIsPutIntoAFileThatStaysAsItIs) {
     TIOParams told;
     ASSERT_TRUE(told.Read(name, std::int32_t{ioJPEG}));
     EXPECT_EQ("Sea", told.ReadIPTCField(2, 120));
-    EXPECT_EQ(1, told.fJPEG_MarkerList.GetMarkerType(0) == kMarkerApp1 ? 1 : 0);
+    EXPECT_EQ(kMarkerApp1, told.fJPEG_MarkerList.GetMarkerType(0));
     params.ResetInfo();
     ASSERT_TRUE(io_->InjectJpegEXIF(name));
     ASSERT_TRUE(io_->InjectJpegIPTC(name));
@@ -306,16 +305,13 @@ TEST_F(DriverSources, WhatNeedsAViewOrAScreenFails) {
     EXPECT_EQ(-1, io_->InsertToFileTIFF(u"a.tif"));
     EXPECT_FALSE(io_->LoadFromFilePDF(u"a.pdf"));
     EXPECT_THROW(io_->SaveToFileZMN(u"a.zmn"), EZmException);
+    EXPECT_THROW(io_->SaveToFile(folder_.Name("a.lyr"), 0), EZmException);
+    EXPECT_FALSE(io_->LoadFromURL(u"file:///a.png"));
 }
 
 TEST_F(DriverSources, PluginsStandInForSvgAndPdf) {
-    auto row = std::make_shared<TZmFileFormatInfo>();
-    row->FileType = kPluginSvgReaderType;
-    row->ReadFunction = ReadOneOfThree;
-    RegisterFileFormat(row);
-    auto pdf = std::make_shared<TZmFileFormatInfo>(*row);
-    pdf->FileType = kPluginPdfWriteType;
-    RegisterFileFormat(pdf);
+    test::RegisterRow(kPluginSvgReaderType, "", ReadOneOfThree);
+    test::RegisterRow(kPluginPdfWriteType, "", ReadOneOfThree);
     test::WriteFileBytes(folder_.File("a.svg"), {1});
     EXPECT_TRUE(io_->LoadFromFile(folder_.Name("a.svg"), std::int32_t{ioSVG}));
     EXPECT_EQ(kPluginSvgReaderType, io_->GetParams()->fFileType);
@@ -327,63 +323,30 @@ TEST_F(DriverSources, PluginsStandInForSvgAndPdf) {
 TEST_F(DriverSources, NoticesOfALoadComeInOrder) {
     std::string order;
     const TBytes bytes = SavedAs(ioBMP);
-    image_->SetOnChanged([&](void*) { order += "changed "; });
     io_->SetOnImageLoaded([&](void*) { order += "loaded "; });
     io_->SetOnFinishWork([&](void*) { order += "finished "; });
-    EXPECT_TRUE(io_->LoadFromBuffer(bytes.data(), static_cast<std::int64_t>(bytes.size()), 0));
-    EXPECT_TRUE(order.ends_with("changed loaded finished ")) << order;
-    order.clear();
-    EXPECT_FALSE(io_->LoadFromBuffer(bytes.data(), 60, ioBMP));
-    EXPECT_TRUE(order.ends_with("loaded finished ")) << order;
+    EXPECT_TRUE(LoadBytes(*io_, bytes, 0));
+    EXPECT_FALSE(LoadBytes(*io_, TBytes(bytes.begin(), bytes.begin() + 60), ioBMP));
+    EXPECT_EQ("loaded finished loaded finished ", order);
 }
 
-// A module of the smallest kind: one section with one resource, type "PICS", name "SEA".
+/// A module of the smallest kind: one section with one resource, type "PICS", name "SEA".
 TBytes ModuleWith(const TBytes& data) {
-    TBytes file(0x400, 0);
-    const auto put = [&file](std::size_t at, std::uint32_t value, int bytes) {
-        for (int i = 0; i < bytes; ++i) {
-            file[at + static_cast<std::size_t>(i)] = static_cast<std::uint8_t>(value >> (8 * i));
-        }
-    };
-    put(0, 0x5A4D, 2);
-    put(0x3C, 0x40, 4);  // offset of the PE header
-    put(0x40, 0x4550, 4);
-    put(0x44, 0x14C, 2);  // i386
-    put(0x46, 1, 2);      // sections
-    put(0x54, 0xE0, 2);   // size of the optional header
-    put(0x56, 0x2102, 2);
-    put(0x58, 0x10B, 2);             // PE32
-    put(0x58 + 92, 16, 4);           // data directories
-    put(0x58 + 96 + 16, 0x1000, 4);  // the resources' address and size
-    put(0x58 + 96 + 20, 0x200, 4);
-    const std::size_t section = 0x58 + 0xE0;
-    std::copy_n(".rsrc", 5, file.begin() + static_cast<std::ptrdiff_t>(section));
-    put(section + 8, 0x1000, 4);   // virtual size
-    put(section + 12, 0x1000, 4);  // address
-    put(section + 16, 0x1000, 4);  // size in the file
-    put(section + 20, 0x200, 4);   // place in the file
-    const std::size_t root = 0x200;
-    put(root + 12, 1, 2);  // one named entry
-    put(root + 16, 0x80000060, 4);
-    put(root + 20, 0x80000018, 4);
-    put(root + 0x18 + 12, 1, 2);
-    put(root + 0x18 + 16, 0x80000070, 4);
-    put(root + 0x18 + 20, 0x80000030, 4);
-    put(root + 0x30 + 14, 1, 2);  // one numbered entry: the language
-    put(root + 0x30 + 16, 0x409, 4);
-    put(root + 0x30 + 20, 0x48, 4);
-    put(root + 0x48, 0x1100, 4);  // the data's address
-    put(root + 0x4C, static_cast<std::uint32_t>(data.size()), 4);
-    put(root + 0x60, 4, 2);
-    put(root + 0x70, 3, 2);
-    for (std::size_t i = 0; i < 4; ++i) {
-        put(root + 0x62 + 2 * i, static_cast<std::uint32_t>("PICS"[i]), 2);
-        put(root + 0x72 + 2 * i, static_cast<std::uint32_t>("SEA"[i]), 2);
-    }
-    file.resize(0x300);
-    file.insert(file.end(), data.begin(), data.end());
-    file.resize(0x1200, 0);
-    return file;
+    const auto bytes = static_cast<std::uint32_t>(data.size());
+    // clang-format off
+    return test::Joined(test::BytesWith(0x300, {
+        {0x00, 0x5A4D}, {0x3C, 0x40}, {0x40, 0x4550},                // DOS header, PE header
+        {0x44, 0x14C | 1 << 16}, {0x54, 0xE0 | 0x2102 << 16},        // i386, one section
+        {0x58, 0x10B}, {0xB4, 16}, {0xC8, 0x1000}, {0xCC, 0x200},    // PE32, resources
+        {0x138, 0x7273722E}, {0x13C, 'c'},                           // ".rsrc"
+        {0x140, 0x1000}, {0x144, 0x1000}, {0x148, 0x1000}, {0x14C, 0x200},
+        {0x20C, 1}, {0x210, 0x80000060}, {0x214, 0x80000018},        // one named type
+        {0x224, 1}, {0x228, 0x80000070}, {0x22C, 0x80000030},        // one named resource
+        {0x23C, 1 << 16}, {0x240, 0x409}, {0x244, 0x48},             // one language
+        {0x248, 0x1100}, {0x24C, bytes},
+        {0x260, 4 | 'P' << 16}, {0x264, 'I' | 'C' << 16}, {0x268, 'S'},
+        {0x270, 3 | 'S' << 16}, {0x274, 'E' | 'A' << 16}}), data);
+    // clang-format on
 }
 
 TEST_F(DriverSources, ResourcesOfModules) {
@@ -392,6 +355,10 @@ TEST_F(DriverSources, ResourcesOfModules) {
     EXPECT_TRUE(reader.LoadFromResource(folder_.Name("pics.dll"), u"pics", u"sea", 0));
     test::ExpectSamePixels(*image_, *reader.GetZmBitmap());
     EXPECT_FALSE(reader.GetParams()->fIsResource);
+    TZmBitmap bitmap;
+    EXPECT_TRUE(bitmap.LoadFromResource(folder_.Name("pics.dll"), u"pics", u"sea", 0));
+    test::ExpectSamePixels(*image_, bitmap);
+    EXPECT_FALSE(bitmap.LoadFromResource(folder_.Name("pics.dll"), u"pics", u"lake", 0));
     EXPECT_FALSE(reader.LoadFromResource(folder_.Name("pics.dll"), u"pics", u"lake", 0));
     EXPECT_FALSE(reader.LoadFromResource(folder_.Name("none.dll"), u"pics", u"sea", 0));
     EXPECT_TRUE(reader.GetAborting());

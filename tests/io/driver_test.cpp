@@ -1,45 +1,17 @@
-#include "engine/io/zalmoio.h"
-
-#include <gtest/gtest.h>
-
 #include <cstring>
 #include <new>
-#include <string>
 #include <vector>
 
 #include "engine/bitmap/zmplatformbitmap.h"
-#include "engine/bitmap/zmxBitmaps.h"
-#include "engine/foundation/zmsettings.h"
-#include "engine/foundation/zmstreams.h"
-#include "engine/io/zmfileformats.h"
 #include "engine/io/zmformatdetect.h"
-#include "tests/support/testfiles.h"
-#include "tests/support/testimages.h"
+#include "tests/io/driverfixture.h"
 
 namespace zm {
 namespace {
 
-using TBytes = std::vector<std::uint8_t>;
+using test::TBytes;
 
 constexpr std::int32_t kPluginType = 9000;
-
-void WriteMark(TStream& stream, TZmBitmap&, TIOParams&, TProgressRec&) {
-    stream.WriteBuffer("MARK", 4);
-}
-
-void WriteThenAbort(TStream& stream, TZmBitmap&, TIOParams&, TProgressRec& progress) {
-    stream.WriteBuffer("MARK", 4);
-    *progress.Aborting = true;
-}
-
-void WriteThenRaise(TStream& stream, TZmBitmap&, TIOParams&, TProgressRec&) {
-    stream.WriteBuffer("MARK", 4);
-    throw EZmException("writer broke");
-}
-
-void WriteWithoutMemory(TStream&, TZmBitmap&, TIOParams&, TProgressRec&) {
-    throw std::bad_alloc();
-}
 
 void ReadOnePixel(TStream&, TZmBitmap& bitmap, TIOParams& params, TProgressRec& progress,
                   bool preview) {
@@ -48,71 +20,31 @@ void ReadOnePixel(TStream&, TZmBitmap& bitmap, TIOParams& params, TProgressRec& 
     *progress.Aborting = !bitmap.Allocate(1, 1, zm24RGB);
 }
 
-class Driver : public ::testing::Test {
+class Driver : public test::DriverFixture {
 protected:
-    void SetUp() override {
-        image_ = test::MakeGradient(zm24RGB, 12, 9);
-        io_ = TZalmoIO::CreateFromBitmap(image_.get());
-        io_->SetOnFinishWork([this](void*) { ++finish_count_; });
-    }
-    void TearDown() override { DestroySingletonInstance(); }
-
     static TZmFileFormatInfo& RegisterPlugin(TZmReadImageStream read, TZmWriteImageStream write) {
-        auto row = std::make_shared<TZmFileFormatInfo>();
-        row->FileType = kPluginType;
-        row->Extensions = "PLUG";
-        row->ReadFunction = read;
-        row->WriteFunction = write;
-        RegisterFileFormat(row);
-        return *row;
+        return test::RegisterRow(kPluginType, "PLUG", read, write);
     }
-
     std::int32_t TypeOf(const std::string& name) {
         return FindFileFormat(folder_.Name(name), zmfmContentOnly);
     }
-
     TBytes Bytes(const std::string& name) { return test::ReadFileBytes(folder_.File(name)); }
-
-    test::TempFolder folder_;
-    std::unique_ptr<TZmBitmap> image_;
-    std::unique_ptr<TZalmoIO> io_;
-    int finish_count_ = 0;
 };
 
-TEST_F(Driver, LosslessFormatsComeBackAsTheyWere) {
-    for (const std::int32_t type : {ioBMP, ioPNG}) {
-        const std::u16string name = folder_.Name("photo.dat");
-        EXPECT_TRUE(io_->SaveToFile(name, type));
-        EXPECT_EQ(type, TypeOf("photo.dat"));
-        TZalmoIO reader;
-        EXPECT_TRUE(reader.LoadFromFile(name, 0));
-        EXPECT_EQ(type, reader.GetParams()->fFileType);
-        EXPECT_EQ(name, reader.GetParams()->fFileName);
-        EXPECT_EQ(300, reader.GetParams()->GetDpiX());
-        test::ExpectSamePixels(*image_, *reader.GetZmBitmap());
+TEST_F(Driver, ContentDecidesWhereTheNameTellsNothingOrIsWrong) {
+    for (const char* file : {"photo.unknown", "photo.bmp"}) {
+        const std::u16string name = folder_.Name(file);
+        ASSERT_TRUE(io_->SaveToFileJpeg(name));
+        finish_count_ = 0;
+        EXPECT_FALSE(io_->LoadFromFile(name, false));
+        EXPECT_TRUE(io_->GetAborting());
+        EXPECT_EQ(1, finish_count_);
+        EXPECT_TRUE(io_->LoadFromFile(name, true));
+        EXPECT_EQ(ioJPEG, io_->GetParams()->fFileType);
+        EXPECT_EQ(name, io_->GetParams()->fFileName);
+        EXPECT_TRUE(io_->LoadFromFileAuto(name));
+        EXPECT_FALSE(io_->LoadFromFileFormat(name, 0));
     }
-    EXPECT_EQ(2, finish_count_);
-}
-
-TEST_F(Driver, ContentDecidesWhereTheNameTellsNothing) {
-    const std::u16string name = folder_.Name("photo.unknown");
-    ASSERT_TRUE(io_->SaveToFileJpeg(name));
-    finish_count_ = 0;
-    EXPECT_FALSE(io_->LoadFromFile(name, false));
-    EXPECT_TRUE(io_->GetAborting());
-    EXPECT_EQ(1, finish_count_);
-    EXPECT_TRUE(io_->LoadFromFile(name, true));
-    EXPECT_EQ(ioJPEG, io_->GetParams()->fFileType);
-    EXPECT_TRUE(io_->LoadFromFileAuto(name));
-    EXPECT_FALSE(io_->LoadFromFileFormat(name, 0));
-}
-
-TEST_F(Driver, ContentDecidesWhereTheNameIsWrong) {
-    const std::u16string name = folder_.Name("photo.png");
-    ASSERT_TRUE(io_->SaveToFileBMP(name));
-    EXPECT_FALSE(io_->LoadFromFile(name, false));
-    EXPECT_TRUE(io_->LoadFromFile(name, true));
-    EXPECT_EQ(ioBMP, io_->GetParams()->fFileType);
 }
 
 TEST_F(Driver, TheTypeOfASaveComesFromTheNameThenTheParametersThenJpeg) {
@@ -125,6 +57,11 @@ TEST_F(Driver, TheTypeOfASaveComesFromTheNameThenTheParametersThenJpeg) {
     EXPECT_EQ(ioJPEG, TypeOf("c"));
     EXPECT_TRUE(io_->SaveToFile(folder_.Name("d.jpg"), ioPNG));
     EXPECT_EQ(ioPNG, TypeOf("d.jpg"));
+    // Types that the settings give away are saved as what their name says without that.
+    ZmGlobalSettings().fWICFileTypes = "*.bmp;*.xyz";
+    EXPECT_TRUE(io_->SaveToFile(folder_.Name("e.bmp"), 0));
+    EXPECT_EQ(ioBMP, TypeOf("e.bmp"));
+    EXPECT_FALSE(io_->SaveToFile(folder_.Name("e.xyz"), 0));
 
     TZalmoIO fresh;
     fresh.GetZmBitmap()->Assign(image_.get());
@@ -167,28 +104,36 @@ TEST_F(Driver, FilesThatCannotBeOpenedOrCreatedRaise) {
     EXPECT_TRUE(io_->GetAborting());
 }
 
-TEST_F(Driver, AnEmptyImageReplacesNothing) {
-    TZalmoIO fresh;
-    test::WriteFileBytes(folder_.File("a.jpg"), {1, 2, 3});
-    EXPECT_FALSE(fresh.SaveToFile(folder_.Name("a.jpg"), ioJPEG));
-    EXPECT_EQ((TBytes{1, 2, 3}), Bytes("a.jpg"));
-}
-
 TEST_F(Driver, AFailedSaveKeepsTheOldFileAndLeavesNothingBehind) {
-    TZmFileFormatInfo& row = RegisterPlugin(nullptr, WriteThenAbort);
+    TZmFileFormatInfo& row =
+        RegisterPlugin(nullptr, [](TStream& stream, TZmBitmap&, TIOParams&, TProgressRec& record) {
+            stream.WriteBuffer("MARK", 4);
+            *record.Aborting = true;
+        });
     test::WriteFileBytes(folder_.File("a.plug"), {1, 2, 3});
     const std::u16string name = folder_.Name("a.plug");
     EXPECT_FALSE(io_->SaveToFile(name, kPluginType));
-    row.WriteFunction = WriteThenRaise;
+    row.WriteFunction = [](TStream& stream, TZmBitmap&, TIOParams&, TProgressRec&) {
+        stream.WriteBuffer("MARK", 4);
+        throw EZmException("writer broke");
+    };
     EXPECT_THROW(io_->SaveToFile(name, kPluginType), EZmException);
     EXPECT_TRUE(io_->GetAborting());
-    row.WriteFunction = WriteWithoutMemory;
+    row.WriteFunction = [](TStream&, TZmBitmap&, TIOParams&, TProgressRec&) {
+        throw std::bad_alloc();
+    };
     EXPECT_FALSE(io_->SaveToFile(name, kPluginType));
     EXPECT_EQ(3, finish_count_);
     EXPECT_EQ((TBytes{1, 2, 3}), Bytes("a.plug"));
     EXPECT_EQ((std::vector<std::string>{"a.plug"}), test::ListFolder(folder_.Path()));
-    row.WriteFunction = WriteMark;
+    row.WriteFunction = [](TStream& stream, TZmBitmap&, TIOParams&, TProgressRec&) {
+        stream.WriteBuffer("MARK", 4);
+    };
     EXPECT_TRUE(io_->SaveToFile(name, kPluginType));
+    EXPECT_EQ((TBytes{'M', 'A', 'R', 'K'}), Bytes("a.plug"));
+
+    TZmBitmap empty;
+    EXPECT_FALSE(TZalmoIO::CreateFromBitmap(&empty)->SaveToFile(name, ioJPEG));
     EXPECT_EQ((TBytes{'M', 'A', 'R', 'K'}), Bytes("a.plug"));
 }
 
@@ -223,23 +168,17 @@ TEST_F(Driver, ASaveLeavesTheBitmapAsItWas) {
 }
 
 TEST_F(Driver, AlphaTravelsThroughPngAndThroughBmpWhereAsked) {
+    const TBytes opaque = SavedAs(ioPNG);
     test::AddNoiseAlpha(*image_, 3);
     for (const std::int32_t type : {ioPNG, ioBMP}) {
-        TMemoryStream stream;
         io_->GetParams()->fBMP_HandleTransparency = true;
-        ASSERT_TRUE(io_->SaveToStream(stream, type));
-        stream.SetPosition(0);
         TZalmoIO reader;
         reader.GetParams()->fBMP_HandleTransparency = true;
-        ASSERT_TRUE(reader.LoadFromStream(stream, type));
+        ASSERT_TRUE(LoadBytes(reader, SavedAs(type), type));
         test::ExpectSamePixels(*image_, *reader.GetZmBitmap());
         test::ExpectSameAlpha(*image_, *reader.GetZmBitmap());
         // A load drops what was there before.
-        TMemoryStream opaque;
-        ASSERT_TRUE(TZalmoIO::CreateFromBitmap(test::MakeGradient(zm24RGB, 3, 3).get())
-                        ->SaveToStream(opaque, type));
-        opaque.SetPosition(0);
-        ASSERT_TRUE(reader.LoadFromStream(opaque, type));
+        ASSERT_TRUE(LoadBytes(reader, opaque, ioPNG));
         EXPECT_FALSE(reader.GetZmBitmap()->HasAlphaChannel());
     }
 }
@@ -247,26 +186,11 @@ TEST_F(Driver, AlphaTravelsThroughPngAndThroughBmpWhereAsked) {
 TEST_F(Driver, ThePngBackgroundIsTheDriversOwn) {
     io_->SetBackground(0x0000FF);  // red
     io_->GetParams()->fPNG_Background = TRGB{255, 255, 255};
-    TMemoryStream stream;
-    ASSERT_TRUE(io_->SaveToStreamPNG(stream));
+    const TBytes png = SavedAs(ioPNG);
     EXPECT_EQ((TRGB{0, 0, 255}), io_->GetParams()->fPNG_Background);
-    stream.SetPosition(0);
     TZalmoIO reader;
-    ASSERT_TRUE(reader.LoadFromStreamPNG(stream));
+    ASSERT_TRUE(LoadBytes(reader, png, ioPNG));
     EXPECT_EQ(0x0000FF, reader.GetBackground());
-}
-
-TEST_F(Driver, LowResolutionsBecomeTheSettings) {
-    ZmGlobalSettings().fDefaultDPIX = 123;
-    RegisterPlugin(ReadOnePixel, nullptr);
-    io_->GetParams()->SetDpiX(1);
-    io_->GetParams()->SetDpiY(2);
-    TMemoryStream stream;
-    ASSERT_TRUE(io_->SaveToStreamBMP(stream));
-    stream.SetPosition(0);
-    ASSERT_TRUE(io_->LoadFromStreamBMP(stream));
-    EXPECT_EQ(123, io_->GetParams()->GetDpiX());
-    EXPECT_EQ(2, io_->GetParams()->GetDpiY());
 }
 
 TEST_F(Driver, PluginRowsAreCalled) {
@@ -296,39 +220,18 @@ TEST_F(Driver, RaisingAndMemorylessReadersRunTheFinishNotice) {
 }
 
 TEST_F(Driver, AFailedLoadTellsSoAndKeepsTheType) {
-    TMemoryStream stream;
-    ASSERT_TRUE(io_->SaveToStreamPNG(stream));
-    const TBytes whole = stream.Bytes();
-    const TBytes cut(whole.begin(), whole.begin() + 40);
+    const TBytes whole = SavedAs(ioPNG);
     TZalmoIO reader;
-    EXPECT_FALSE(reader.LoadFromBuffer(cut.data(), static_cast<std::int64_t>(cut.size()), 0));
+    EXPECT_FALSE(LoadBytes(reader, TBytes(whole.begin(), whole.begin() + 40), 0));
     EXPECT_EQ(0, reader.GetParams()->fFileType);
-    EXPECT_TRUE(reader.LoadFromBuffer(whole.data(), static_cast<std::int64_t>(whole.size()), 0));
+    EXPECT_TRUE(LoadBytes(reader, whole, 0));
     EXPECT_FALSE(reader.GetAborting());
 }
 
-TEST_F(Driver, TheProgressEventSeesTheEndAndCanStopTheWork) {
-    std::vector<std::int32_t> percents;
-    io_->SetOnProgress([&](void* sender, std::int32_t percent) {
-        EXPECT_EQ(io_.get(), sender);
-        percents.push_back(percent);
-    });
-    TMemoryStream stream;
-    ASSERT_TRUE(io_->SaveToStreamBMP(stream));
-    ASSERT_GT(percents.size(), 5u);
-    EXPECT_EQ(100, percents.back());
-    io_->SetOnProgress([this](void*, std::int32_t) { io_->SetAborting(true); });
-    stream.SetPosition(0);
-    EXPECT_FALSE(io_->LoadFromStreamBMP(stream));
-}
-
 TEST_F(Driver, APlatformBitmapIsLoadedInPlace) {
-    TMemoryStream stream;
-    ASSERT_TRUE(io_->SaveToStreamBMP(stream));
-    stream.SetPosition(0);
     TBitmap target;
     const auto driver = TZalmoIO::CreateFromBitmap(&target);
-    ASSERT_TRUE(driver->LoadFromStreamBMP(stream));
+    ASSERT_TRUE(LoadBytes(*driver, SavedAs(ioBMP), ioBMP));
     EXPECT_EQ(12, target.GetWidth());
     EXPECT_EQ(9, target.GetHeight());
     EXPECT_TRUE(target.GetModified());

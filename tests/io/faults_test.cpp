@@ -200,6 +200,24 @@ TEST_P(Faults, EveryAllocationOfALoadFailsOnce) {
     EXPECT_EQ(31, bitmap.GetWidth());
 }
 
+// The load then runs in place, or fails; no thread is waited for that never began.
+TEST_P(Faults, EveryAllocationOfAThreadsStartFailsOnce) {
+    TZmBitmap bitmap;
+    const auto reader = TZalmoIO::CreateFromBitmap(&bitmap);
+    reader->SetAsyncMode(true);
+    bool has_failed = true;
+    for (std::int64_t n = 0; has_failed && n < 50; ++n) {
+        TBorrowedMemoryStream stream(bytes_.data(), static_cast<std::int64_t>(bytes_.size()));
+        t_allocations_left = n;
+        const bool is_started = reader->LoadFromStream(stream, GetParam());
+        has_failed = t_allocations_left < 0;
+        t_allocations_left = -1;
+        reader->WaitThreads(/*abort_all=*/false);
+        ASSERT_NE(is_started, reader->GetAborting()) << n;
+    }
+    EXPECT_EQ(31, bitmap.GetWidth());
+}
+
 TEST_P(Faults, EveryAllocationOfASaveFailsOnce) {
     bool is_saved = false;
     TBytes saved;

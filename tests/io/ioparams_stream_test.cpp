@@ -1,5 +1,6 @@
 #include <gtest/gtest.h>
 
+#include <algorithm>
 #include <cstring>
 #include <functional>
 #include <string>
@@ -13,6 +14,7 @@
 #include "engine/io/zmioparams_fields_p.h"
 #include "engine/io/zmioparams_types_p.h"
 #include "tests/support/testfiles.h"
+#include "tests/support/testmessage.h"
 
 namespace zm {
 namespace {
@@ -79,6 +81,13 @@ void ChangeAllFields(TIOParams& params) {
     params.fDict.Insert(u"key", u"value");
 }
 
+/// Loads from behind the magic; the place where the reading ended.
+std::int64_t LoadBytes(TIOParams& params, const TBytes& bytes) {
+    TBorrowedMemoryStream stream(bytes.data(), static_cast<std::int64_t>(bytes.size()));
+    params.LoadFromStream(stream, /*check_magic=*/false);
+    return stream.GetPosition();
+}
+
 bool IsBlock(const TZmIOField& field) {
     return field.type >= kBlockFieldTypes && field.type < kBlockFieldTypes + kParamsBlockCount;
 }
@@ -137,31 +146,24 @@ TEST_F(IOParamsStream, EveryFieldComesBack) {
 TEST_F(IOParamsStream, StartsWithMagicVersionDictionaryAndEmptyExif) {
     TMemoryStream stream;
     params_.SaveToStream(stream);
-    const std::string dictionary = "{\"key\":\"value\"}";
-    TBytes head{15, 0, 0, 0};
-    for (const char c : std::string("ZMIOPARAMSMAGIC")) {
-        head.push_back(static_cast<std::uint8_t>(c));
+    using namespace std::string_literals;
+    std::string head = "\17\0\0\0ZMIOPARAMSMAGIC\133\0\0\0\17\0\0\0"s;  // 15 bytes; version 91
+    for (const char c : "{\"key\":\"value\"}"s) {                       // 15 characters
+        head += {c, '\0'};
     }
-    head.insert(head.end(), {91, 0, 0, 0, static_cast<std::uint8_t>(dictionary.size()), 0, 0, 0});
-    for (const char c : dictionary) {
-        head.insert(head.end(), {static_cast<std::uint8_t>(c), 0});
-    }
-    head.insert(head.end(), {0, 0, 0, 0});                       // EXIF
-    head.insert(head.end(), {16, 0, 0, 0, 'f', 'o', 'l', 'd'});  // file name, single-byte
+    head += "\0\0\0\0\20\0\0\0fold"s;  // no EXIF; the file name, single-byte
     ASSERT_GT(stream.Bytes().size(), head.size());
-    EXPECT_EQ(head, TBytes(stream.Bytes().begin(),
-                           stream.Bytes().begin() + static_cast<std::ptrdiff_t>(head.size())));
+    EXPECT_TRUE(std::equal(head.begin(), head.end(), stream.Bytes().begin()));
 }
 
 TEST_F(IOParamsStream, OldVersionsReadTheirFieldsAndNoMore) {
     // Version 1: seven JPEG fields and the codec's three texts.
     const TBytes bytes{1, 0, 0, 0, 1, 77,  0, 0, 0, 2, 1, 5, 0, 0, 0, 1,
                        3, 1, 0, 0, 0, 'n', 0, 0, 0, 0, 0, 0, 0, 0, 0};
-    TBorrowedMemoryStream stream(bytes.data(), static_cast<std::int64_t>(bytes.size()));
     TIOParams loaded;
     loaded.fWidth = 55;
     loaded.fDict.Insert(u"old", 1);
-    loaded.LoadFromStream(stream, /*check_magic=*/false);
+    EXPECT_EQ(static_cast<std::int64_t>(bytes.size()), LoadBytes(loaded, bytes));
     EXPECT_EQ(ioJPEG_GRAYLEV, loaded.fJPEG_ColorSpace);
     EXPECT_EQ(77, loaded.fJPEG_Quality);
     EXPECT_EQ(ioJPEG_FLOAT, loaded.fJPEG_DCTMethod);
@@ -171,17 +173,14 @@ TEST_F(IOParamsStream, OldVersionsReadTheirFieldsAndNoMore) {
     EXPECT_EQ(u"n", loaded.fWIC_CodecInfo.name);
     EXPECT_EQ(0, loaded.fWidth);
     EXPECT_TRUE(loaded.fDict.IsEmpty());
-    EXPECT_EQ(static_cast<std::int64_t>(bytes.size()), stream.GetPosition());
 }
 
 TEST_F(IOParamsStream, EachVersionHasItsFields) {
     for (std::int32_t version = 0; version <= kLastVersion; ++version) {
         const TBytes bytes = StreamOfVersion(version);
-        TBorrowedMemoryStream stream(bytes.data(), static_cast<std::int64_t>(bytes.size()));
         TIOParams loaded;
         ChangeAllFields(loaded);
-        loaded.LoadFromStream(stream, /*check_magic=*/false);
-        EXPECT_EQ(stream.GetSize(), stream.GetPosition()) << version;
+        EXPECT_EQ(static_cast<std::int64_t>(bytes.size()), LoadBytes(loaded, bytes)) << version;
         EXPECT_EQ(version >= 51, loaded.fDict.HasKey(u"key")) << version;
         for (const TZmIOField& field : TZmIOFieldTable::Stored()) {
             TIOParams& expected = field.since <= version ? params_ : defaults_;
@@ -194,9 +193,8 @@ TEST_F(IOParamsStream, EachVersionHasItsFields) {
 TEST_F(IOParamsStream, AStreamThatEndsEarlyLeavesDefaults) {
     const TBytes bytes = StreamOfVersion(kLastVersion);
     for (std::size_t size = 0; size < bytes.size(); ++size) {
-        TBorrowedMemoryStream stream(bytes.data(), static_cast<std::int64_t>(size));
         TIOParams loaded;
-        loaded.LoadFromStream(stream, /*check_magic=*/false);
+        LoadBytes(loaded, TBytes(bytes.begin(), bytes.begin() + static_cast<std::ptrdiff_t>(size)));
         bool has_ended = false;
         for (const TZmIOField& field : TZmIOFieldTable::Stored()) {
             const TBytes value = FieldBytes(loaded, field);
@@ -213,17 +211,13 @@ TEST_F(IOParamsStream, AStreamThatEndsEarlyLeavesDefaults) {
 TEST_F(IOParamsStream, LengthsAndOrdinalsAreNotBelieved) {
     // Version 25: no dictionary, no EXIF; a file name of 2^31 - 1 bytes, then of -1 bytes.
     for (const std::uint8_t high : TBytes{0x7F, 0xFF}) {
-        const TBytes bytes{25, 0, 0, 0, 0xFF, 0xFF, 0xFF, high, 1, 2, 3};
-        TBorrowedMemoryStream stream(bytes.data(), static_cast<std::int64_t>(bytes.size()));
         TIOParams loaded;
-        loaded.LoadFromStream(stream, /*check_magic=*/false);
+        LoadBytes(loaded, {25, 0, 0, 0, 0xFF, 0xFF, 0xFF, high, 1, 2, 3});
         EXPECT_TRUE(loaded.fFileName.empty());
         EXPECT_EQ(8, loaded.fBitsPerSample);
     }
-    TBytes version_one{1, 0, 0, 0, 200, 77, 0, 0, 0};  // no such colour space
-    TBorrowedMemoryStream stream(version_one.data(), 9);
     TIOParams loaded;
-    loaded.LoadFromStream(stream, /*check_magic=*/false);
+    LoadBytes(loaded, {1, 0, 0, 0, 200, 77, 0, 0, 0});  // no such colour space
     EXPECT_EQ(ioJPEG_YCbCr, loaded.fJPEG_ColorSpace);
     EXPECT_EQ(77, loaded.fJPEG_Quality);
 }
@@ -232,15 +226,10 @@ TEST_F(IOParamsStream, OtherFilesAreRefused) {
     const TBytes jpeg{0xFF, 0xD8, 0xFF, 0xE0, 0, 16, 'J', 'F', 'I', 'F', 0};
     TBorrowedMemoryStream stream(jpeg.data(), static_cast<std::int64_t>(jpeg.size()));
     TIOParams loaded;
-    try {
-        loaded.LoadFromStream(stream, /*check_magic=*/true);
-        FAIL();
-    } catch (const EZmException& error) {
-        EXPECT_STREQ(
-            "Invalid TIOParams stream. You cannot use TIOParams.LoadFromStream or LoadFromFile "
-            "to load parameters from image files.",
-            error.what());
-    }
+    EXPECT_EQ(
+        "Invalid TIOParams stream. You cannot use TIOParams.LoadFromStream or LoadFromFile "
+        "to load parameters from image files.",
+        test::MessageOf<EZmException>([&] { loaded.LoadFromStream(stream, true); }));
 }
 
 TEST_F(IOParamsStream, FilesAndBlocksOfOtherRooms) {

@@ -2,13 +2,8 @@
 
 #include <gtest/gtest.h>
 
-#include "engine/bitmap/zmxBitmaps.h"
-#include "engine/foundation/zmsettings.h"
-#include "engine/foundation/zmstreams.h"
-#include "engine/io/zalmoio.h"
-#include "engine/io/zmfileformats.h"
 #include "engine/io/zmformatdetect.h"
-#include "tests/support/testimages.h"
+#include "tests/io/driverfixture.h"
 
 namespace zm {
 namespace {
@@ -41,9 +36,7 @@ TEST_F(MagickPlugin, TheRowsReplacePdfAndPostScript) {
 }
 
 TEST_F(MagickPlugin, AnotherPdfPluginKeepsItsRow) {
-    auto other = std::make_shared<TZmFileFormatInfo>();
-    other->FileType = kPluginPdfType;
-    RegisterFileFormat(other);
+    test::RegisterRow(kPluginPdfType, "");
     if (!TZmMiscPluginsImageMagick::RegisterPlugin()) {
         GTEST_SKIP() << "the ImageMagick libraries are not installed";
     }

@@ -6,19 +6,12 @@
 #include <thread>
 #include <vector>
 
-#include "engine/bitmap/zmxBitmaps.h"
-#include "engine/foundation/zmsettings.h"
-#include "engine/foundation/zmstreams.h"
-#include "engine/io/zalmoio.h"
-#include "engine/io/zmfileformats.h"
-#include "tests/support/testfiles.h"
-#include "tests/support/testimages.h"
+#include "tests/io/driverfixture.h"
 
 // Loads and saves on the driver's own threads, and drivers on many threads at once.
 namespace zm {
 namespace {
 
-using TBytes = std::vector<std::uint8_t>;
 using std::chrono::milliseconds;
 
 constexpr std::int32_t kSlowType = 9002;
@@ -41,11 +34,7 @@ class Threads : public ::testing::Test {
 protected:
     void SetUp() override {
         ZmGlobalSettings();
-        auto row = std::make_shared<TZmFileFormatInfo>();
-        row->FileType = kSlowType;
-        row->Extensions = "SLOW";
-        row->ReadFunction = ReadSlowly;
-        RegisterFileFormat(row);
+        test::RegisterRow(kSlowType, "SLOW", ReadSlowly);
         test::WriteFileBytes(folder_.File("a.slow"), {1});
         g_steps = 0;
         g_step_limit = 1000000;
@@ -130,6 +119,8 @@ TEST_F(Threads, AWorkIsStoppedFromOutside) {
     EXPECT_TRUE(StartSlow());
     io_->WaitThreads(false);
     EXPECT_FALSE(io_->GetAborting());
+    io_->WaitThreads(/*abort_all=*/true);  // also where no work is left
+    EXPECT_TRUE(io_->GetAborting());
 }
 
 TEST_F(Threads, SuspendedThreadsStandStill) {

@@ -8,13 +8,9 @@
 #include <thread>
 #include <vector>
 
-#include "engine/bitmap/zmxBitmaps.h"
-#include "engine/foundation/zmsettings.h"
-#include "engine/foundation/zmstreams.h"
 #include "engine/foundation/zmstrings.h"
-#include "engine/io/zalmoio.h"
 #include "engine/platform/urlclient.h"
-#include "tests/support/testimages.h"
+#include "tests/io/driverfixture.h"
 
 namespace zm {
 namespace {
@@ -83,53 +79,46 @@ private:
     std::thread thread_;
 };
 
-class Url : public ::testing::Test {
+class Url : public test::DriverFixture {
 protected:
     void SetUp() override {
         if (!platform::UrlClientIsAvailable()) {
             GTEST_SKIP() << "no transfer library is installed";
         }
-        image_ = test::MakeGradient(zm24RGB, 13, 8);
+        test::DriverFixture::SetUp();
     }
-    void TearDown() override { DestroySingletonInstance(); }
-    std::vector<std::uint8_t> Saved(std::int32_t type) {
-        TMemoryStream stream;
-        EXPECT_TRUE(TZalmoIO::CreateFromBitmap(image_.get())->SaveToStream(stream, type));
-        return stream.Bytes();
-    }
-    std::unique_ptr<TZmBitmap> image_;
-    TZalmoIO io_;
+    TZalmoIO reader_;
 };
 
 TEST_F(Url, TypeByContentElseByTheNameInTheUrl) {
-    TOneShotServer png("200 OK", Saved(ioPNG));
-    EXPECT_TRUE(io_.LoadFromFile(png.Url("/a%20b/photo?size=1"), /*check_unknown=*/false));
-    test::ExpectSamePixels(*image_, *io_.GetZmBitmap());
+    TOneShotServer png("200 OK", SavedAs(ioPNG));
+    EXPECT_TRUE(reader_.LoadFromFile(png.Url("/a%20b/photo?size=1"), /*check_unknown=*/false));
+    test::ExpectSamePixels(*image_, *reader_.GetZmBitmap());
     EXPECT_TRUE(png.Request().starts_with("GET /a%20b/photo?size=1 HTTP/1.1\r\n"));
-    TOneShotServer wbmp("200 OK", Saved(ioWBMP));
-    EXPECT_TRUE(io_.LoadFromURL(wbmp.Url("/photo.WBMP?x=a.png#top")));
-    EXPECT_EQ(ioWBMP, io_.GetParams()->fFileType);
+    TOneShotServer wbmp("200 OK", SavedAs(ioWBMP));
+    EXPECT_TRUE(reader_.LoadFromURL(wbmp.Url("/photo.WBMP?x=a.png#top")));
+    EXPECT_EQ(ioWBMP, reader_.GetParams()->fFileType);
     TOneShotServer text("200 OK", {'t', 'e', 'x', 't'});
-    EXPECT_FALSE(io_.LoadFromURL(text.Url("/page")));
+    EXPECT_FALSE(reader_.LoadFromURL(text.Url("/page")));
 }
 
 TEST_F(Url, FailuresRunTheFinishNotice) {
     int finished = 0;
-    io_.SetOnFinishWork([&](void*) { ++finished; });
-    TOneShotServer missing("404 Not Found", Saved(ioPNG));
-    EXPECT_FALSE(io_.LoadFromURL(missing.Url("/a.png")));
+    reader_.SetOnFinishWork([&](void*) { ++finished; });
+    TOneShotServer missing("404 Not Found", SavedAs(ioPNG));
+    EXPECT_FALSE(reader_.LoadFromURL(missing.Url("/a.png")));
     EXPECT_EQ(1, finished);
-    EXPECT_TRUE(io_.GetAborting());
-    EXPECT_FALSE(io_.LoadFromURL(u"http://127.0.0.1:1/a.png"));  // nobody listens there
+    EXPECT_TRUE(reader_.GetAborting());
+    EXPECT_FALSE(reader_.LoadFromURL(u"http://127.0.0.1:1/a.png"));  // nobody listens there
     EXPECT_EQ(2, finished);
 }
 
 TEST_F(Url, TheProxyOfTheSettingsIsAsked) {
-    TOneShotServer proxy("200 OK", Saved(ioPNG));
+    TOneShotServer proxy("200 OK", SavedAs(ioPNG));
     ZmGlobalSettings().fProxyAddress = Utf16FromUtf8(proxy.Host());
     ZmGlobalSettings().fProxyUser = u"me";
     ZmGlobalSettings().fProxyPassword = u"secret";
-    EXPECT_TRUE(io_.LoadFromURL(u"http://photos.invalid/a.png"));
+    EXPECT_TRUE(reader_.LoadFromURL(u"http://photos.invalid/a.png"));
     const std::string request = proxy.Request();
     EXPECT_TRUE(request.starts_with("GET http://photos.invalid/a.png HTTP/1.1\r\n")) << request;
     EXPECT_NE(std::string::npos, request.find("Proxy-Authorization: Basic bWU6c2VjcmV0"));

@@ -263,8 +263,7 @@ TEST(ConvertToPalette, TakesTheNearestEntries) {
 }
 
 TEST(ConvertToFormat, EveryPaletteAndDitherOnEverySource) {
-    for (const TZmPixelFormat format :
-         {zm1g, zm8p, zm8g, zm16g, zm24RGB, zm32f, zmCMYK, zm48RGB, zmCIELab, zm32RGB}) {
+    for (const TZmPixelFormat format : kAllFormats) {
         for (int palette = 0; palette < kPaletteTypeCount; ++palette) {
             for (int dither = 0; dither < kDitherTypeCount; ++dither) {
                 const auto type = static_cast<TZmPaletteType>(palette);

@@ -360,7 +360,7 @@ TEST(ResampleProjectionTest, AllThreeChannelsDecide) {
 TMatrix Scaled(const TMatrix& values, std::int32_t width, TResampleFilter filter) {
     const auto source = GrayPicture(zm8g, values);
     const auto target = TargetFor(*source, width, 1);
-    EXPECT_TRUE(ResampleScaler(*source, *target, filter));
+    EXPECT_TRUE(ResampleScaler(*source, *target, filter, TScalerChoice::kOwn));
     return ValuesOf(*target);
 }
 
@@ -376,6 +376,7 @@ TEST(ResampleScalerTest, AlignsCentres) {
 }
 
 TEST(ResampleScalerTest, KeepsConstantPicturesOfEveryFormat) {
+    // The platform's scaler where there is one.
     for (int format = zm1g; format <= zm32RGB; ++format) {
         SCOPED_TRACE(PixelFormatInfo(static_cast<TZmPixelFormat>(format)).name);
         const auto one = MakeNoise(static_cast<TZmPixelFormat>(format), 1, 1, 9);

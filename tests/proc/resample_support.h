@@ -16,6 +16,9 @@ namespace zm::test {
 
 using TMatrix = std::vector<std::vector<int>>;
 
+inline constexpr TZmPixelFormat kAllFormats[] = {zm1g,  zm8p,   zm8g,    zm16g,    zm24RGB,
+                                                 zm32f, zmCMYK, zm48RGB, zmCIELab, zm32RGB};
+
 /// A zm1g, zm8g or zm16g picture from its values, top row first.
 inline std::unique_ptr<TZmBitmap> GrayPicture(TZmPixelFormat format, const TMatrix& values) {
     const auto height = static_cast<std::int32_t>(values.size());

@@ -3,8 +3,10 @@
 
 #include <gtest/gtest.h>
 
+#include <array>
 #include <cmath>
 #include <cstring>
+#include <iterator>
 #include <limits>
 #include <stdexcept>
 
@@ -20,8 +22,6 @@ namespace zm::test {
 namespace {
 
 constexpr TColor kWhite = 0xFFFFFF;
-constexpr TZmPixelFormat kAllFormats[] = {zm1g,  zm8p,   zm8g,    zm16g,    zm24RGB,
-                                          zm32f, zmCMYK, zm48RGB, zmCIELab, zm32RGB};
 
 TMatrix Turned(const TMatrix& values, TZmPixelFormat format, double angle) {
     const auto image = GrayPicture(format, values);
@@ -165,69 +165,57 @@ TEST(RotateFastForms, QuartersOfEveryFormatAndWidth) {
     }
 }
 
-TEST(RotateFastForms, QuartersOfTurnedBackImagesGiveTheImage) {
-    for (const TZmPixelFormat format : kAllFormats) {
-        const auto image = MakeNoise(format, 37, 130, 5);
-        TZmBitmap once;
-        TZmBitmap back;
-        ASSERT_TRUE(TurnQuarters(*image, once, 1));
-        ASSERT_TRUE(TurnQuarters(once, back, 3));
-        ExpectSamePixels(*image, back);
+/// Plain and fast form of an engine, called with the source, the target, and an angle.
+template <typename Formats, typename Angles, typename Plain, typename Fast>
+void CompareForms(const Formats& formats, const Angles& angles, const Plain& plain_form,
+                  const Fast& fast_form) {
+    for (const TZmPixelFormat format : formats) {
+        for (std::int32_t width = 1; width <= 70; ++width) {
+            const std::int32_t height = 1 + width * 13 % 41;
+            const auto image = MakeNoise(format, width, height, static_cast<unsigned>(width));
+            const double angle = angles[static_cast<std::size_t>(width) % std::size(angles)];
+            TZmBitmap plain;
+            TZmBitmap fast;
+            ASSERT_TRUE(plain_form(*image, plain, angle));
+            ASSERT_TRUE(fast_form(*image, fast, angle));
+            SCOPED_TRACE(testing::Message() << width << " by " << height << ", " << angle);
+            ExpectSamePixels(plain, fast);
+        }
     }
 }
 
 /// Angles in every quarter, near whole ones, and large.
 constexpr double kAngles[] = {7, -7, 45, -45, 30.5, 60, 89.9, 133, 179.99, -100, 0.01, 1000.3};
+constexpr double kRests[] = {7, -7, 45, -45, 30.5, -12.25, 0.001, -0.5, 44.999, -1};
+constexpr TColor kSomeColor = 0x3040F0;
 
-TEST(RotateFastForms, InverseFilterOfManySizes) {
-    for (const TZmPixelFormat format : {zm24RGB, zm8g, zm8p}) {
-        for (std::int32_t width = 1; width <= 70; ++width) {
-            const std::int32_t height = 1 + width * 13 % 41;
-            const auto image = MakeNoise(format, width, height, static_cast<unsigned>(width));
-            const double angle = kAngles[width % 12];
-            for (const TZmAntialiasMode mode : {zmrBilinear, zmrBicubic}) {
-                TZmBitmap plain;
-                TZmBitmap fast;
-                ASSERT_TRUE(RotateInversePlain(*image, plain, angle, mode, 0x3040F0, kNobody));
-                ASSERT_TRUE(RotateInverse(*image, fast, angle, mode, 0x3040F0, kNobody));
-                SCOPED_TRACE(testing::Message() << width << " by " << height << ", " << angle
-                                                << " degrees, mode " << int{mode});
-                ExpectSamePixels(plain, fast);
-            }
-        }
+TEST(RotateFastForms, EveryEngine) {
+    for (const TZmAntialiasMode mode : {zmrBilinear, zmrBicubic}) {
+        CompareForms(
+            std::array{zm24RGB, zm8g, zm8p}, kAngles,
+            [mode](TZmBitmap& source, TZmBitmap& target, double angle) {
+                return RotateInversePlain(source, target, angle, mode, kSomeColor, kNobody);
+            },
+            [mode](TZmBitmap& source, TZmBitmap& target, double angle) {
+                return RotateInverse(source, target, angle, mode, kSomeColor, kNobody);
+            });
     }
-}
-
-TEST(RotateFastForms, NearestSampleOfEveryFormat) {
-    for (const TZmPixelFormat format : kAllFormats) {
-        for (std::int32_t width = 1; width <= 70; width += 3) {
-            const std::int32_t height = 1 + width * 13 % 41;
-            const auto image = MakeNoise(format, width, height, static_cast<unsigned>(width));
-            const double angle = kAngles[width % 12];
-            TZmBitmap plain;
-            TZmBitmap fast;
-            ASSERT_TRUE(RotateNearestPlain(*image, plain, angle, 1, kNobody));
-            ASSERT_TRUE(RotateNearest(*image, fast, angle, 1, kNobody));
-            ExpectSamePixels(plain, fast);
-        }
-    }
-}
-
-TEST(RotateFastForms, ShearsOfManySizes) {
-    constexpr double kRests[] = {7, -7, 45, -45, 30.5, -12.25, 0.001, -0.5, 44.999, -1};
-    for (const TZmPixelFormat format : {zm24RGB, zm8g, zm1g}) {
-        for (std::int32_t width = 1; width <= 70; ++width) {
-            const std::int32_t height = 1 + width * 13 % 41;
-            const auto image = MakeNoise(format, width, height, static_cast<unsigned>(width));
-            const double rest = kRests[width % 10];
-            TZmBitmap plain;
-            TZmBitmap fast;
-            ASSERT_TRUE(RotateByShearsPlain(*image, plain, rest, 0x3040F0, kNobody));
-            ASSERT_TRUE(RotateByShears(*image, fast, rest, 0x3040F0, kNobody));
-            SCOPED_TRACE(testing::Message() << width << " by " << height << ", " << rest);
-            ExpectSamePixels(plain, fast);
-        }
-    }
+    CompareForms(
+        kAllFormats, kAngles,
+        [](TZmBitmap& source, TZmBitmap& target, double angle) {
+            return RotateNearestPlain(source, target, angle, 1, kNobody);
+        },
+        [](TZmBitmap& source, TZmBitmap& target, double angle) {
+            return RotateNearest(source, target, angle, 1, kNobody);
+        });
+    CompareForms(
+        std::array{zm24RGB, zm8g, zm1g}, kRests,
+        [](TZmBitmap& source, TZmBitmap& target, double rest) {
+            return RotateByShearsPlain(source, target, rest, kSomeColor, kNobody);
+        },
+        [](TZmBitmap& source, TZmBitmap& target, double rest) {
+            return RotateByShears(source, target, rest, kSomeColor, kNobody);
+        });
 }
 
 TEST(RotateFastForms, VectorsWriteNothingBeyondTheirPixels) {
@@ -305,34 +293,14 @@ TEST(RotateFastForms, ImagesInFilesGiveTheSame) {
     }
 }
 
-// The choice of the engine.
+// The forms of the bitmap.
 
-TEST(BitmapRotate, EngineFollowsFormatAndMode) {
-    const auto color = MakeNoise(zm24RGB, 23, 17, 1);
-    const auto bits = MakeNoise(zm1g, 23, 17, 1);
-    const auto gray = MakeNoise(zm8g, 23, 17, 1);
-    TZmBitmap inverse;
-    TZmBitmap shears;
+TEST(BitmapRotate, WithoutAntialiasTheModeDoesNotCount) {
+    const auto image = MakeNoise(zm24RGB, 23, 17, 1);
     TZmBitmap nearest;
-    ASSERT_TRUE(RotateInverse(*color, inverse, 20, zmrBicubic, kWhite, kNobody));
-    ASSERT_TRUE(RotateByShears(*bits, shears, 20, kWhite, kNobody));
-    ASSERT_TRUE(RotateNearest(*gray, nearest, 20, kWhite, kNobody));
-    color->Rotate(20, zmrBicubic, kWhite);
-    ExpectSamePixels(inverse, *color);
-    bits->Rotate(20, zmrBicubic, kWhite);
-    ExpectSamePixels(shears, *bits);
-    gray->Rotate(20, zmrBicubic, kWhite);
-    ExpectSamePixels(nearest, *gray);
-    const auto fast = MakeNoise(zm24RGB, 23, 17, 1);
-    TZmBitmap turned;
-    ASSERT_TRUE(TurnQuarters(*fast, turned, 1));
-    ASSERT_TRUE(RotateByShears(turned, shears, -20, kWhite, kNobody));
-    fast->Rotate(70, zmrFast, kWhite);
-    ExpectSamePixels(shears, *fast);
-    const auto plain = MakeNoise(zm24RGB, 23, 17, 1);
-    ASSERT_TRUE(RotateNearest(*plain, nearest, 20, kWhite, kNobody));
-    plain->Rotate(20, /*antialias=*/false, zmrBicubic, kWhite);
-    ExpectSamePixels(nearest, *plain);
+    ASSERT_TRUE(RotateNearest(*image, nearest, 20, kWhite, kNobody));
+    image->Rotate(20, /*antialias=*/false, zmrBicubic, kWhite);
+    ExpectSamePixels(nearest, *image);
 }
 
 TEST(BitmapRotate, AlphaStaysInStepAndIsClearBesideThePicture) {

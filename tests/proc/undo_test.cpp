@@ -68,18 +68,6 @@ TEST_F(ZalmoProcTest, UndoBringsTheStateBackWithItsCaption) {
     }
 }
 
-TEST_F(ZalmoProcTest, SizeAndFormatComeBackToo) {
-    proc_.SetAutoUndo(true);
-    proc_.Resample(9, 9, rfLanczos3, false);
-    image_.SetPixelFormat(zm24RGB);
-    EXPECT_EQ(proc_.GetUndoInfo(0)->Operation, kOperationResample);
-    EXPECT_EQ(proc_.GetUndoInfo(0)->Caption, OperationCaption(kOperationResample));
-    EXPECT_FALSE(proc_.GetUndoInfo(0)->Caption.empty());
-    proc_.Undo(false);
-    EXPECT_EQ(image_.GetWidth(), 3);
-    EXPECT_EQ(image_.GetPixelFormat(), zm8g);
-}
-
 TEST_F(ZalmoProcTest, LimitDropsTheOldest) {
     Change(1);
     Change(2);
@@ -193,29 +181,24 @@ TEST_F(ZalmoProcTest, UndoRectRestoresAPart) {
 }
 
 TEST_F(ZalmoProcTest, RegionIsTheSelectionOrTheWholeBitmap) {
-    struct TSelectionCase {
-        TRect asked;
-        bool selected;
-        TRect region;
-    };
-    for (const TSelectionCase& test : {TSelectionCase{{1, 0, 2, 2}, true, {1, 0, 2, 2}},
-                                       TSelectionCase{{-4, -4, 99, 99}, true, {0, 0, 3, 2}},
-                                       TSelectionCase{{2, 0, 2, 2}, false, {0, 0, 3, 2}},
-                                       TSelectionCase{{2, 2, 1, 1}, false, {0, 0, 3, 2}}}) {
-        proc_.Select(test.asked);
-        TRect region;
+    const auto expect_region = [this](bool is_selected, const std::vector<std::int32_t>& wanted) {
+        std::vector<std::int32_t> region(4);
         TZmMask* mask = nullptr;
-        EXPECT_EQ(proc_.GetReSel(region.left, region.top, region.right, region.bottom, mask),
-                  test.selected);
-        EXPECT_EQ(region.left, test.region.left);
-        EXPECT_EQ(region.top, test.region.top);
-        EXPECT_EQ(region.right, test.region.right);
-        EXPECT_EQ(region.bottom, test.region.bottom);
+        EXPECT_EQ(proc_.GetReSel(region[0], region[1], region[2], region[3], mask), is_selected);
+        EXPECT_EQ(region, wanted);
+    };
+    expect_region(false, {0, 0, 3, 2});
+    proc_.Select({1, 0, 2, 2});
+    expect_region(true, {1, 0, 2, 2});
+    proc_.Select({-4, -4, 99, 99});
+    expect_region(true, {0, 0, 3, 2});
+    for (const TRect& empty : {TRect{2, 0, 2, 2}, TRect{2, 2, 1, 1}}) {
+        proc_.Select(empty);
+        expect_region(false, {0, 0, 3, 2});
     }
+    proc_.Select({1, 0, 2, 2});
     proc_.Deselect();
-    TRect region;
-    TZmMask* mask = nullptr;
-    EXPECT_FALSE(proc_.GetReSel(region.left, region.top, region.right, region.bottom, mask));
+    expect_region(false, {0, 0, 3, 2});
 }
 
 TEST_F(ZalmoProcTest, BeginConvertsOrRefusesAndSavesFirst) {

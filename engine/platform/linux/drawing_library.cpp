@@ -77,8 +77,4 @@ bool IsVectorGraphicsBound() {
     return binding.is_loaded && binding.count > 0;
 }
 
-std::unique_ptr<TDrawMetafile> CreateMetafile(std::span<const std::uint8_t>) {
-    return nullptr;  // recorded calls of another system's drawing: there is nothing to play them
-}
-
 }  // namespace zm::platform

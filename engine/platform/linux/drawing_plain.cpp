@@ -127,14 +127,14 @@ TRect Sorted(const TRect& rect) {
             std::max(rect.left, rect.right), std::max(rect.top, rect.bottom)};
 }
 
-/// The box of a text's pixels as a rectangle of drawing: the last column and row are the
-/// outline's.
-TDrawRect FrameOf(const TRect& rect, double inset) {
-    const TRect sorted = Sorted(rect);
-    const double width = static_cast<double>(std::int64_t{sorted.right} - sorted.left) - 1;
-    const double height = static_cast<double>(std::int64_t{sorted.bottom} - sorted.top) - 1;
-    return {static_cast<float>(sorted.left + inset), static_cast<float>(sorted.top + inset),
-            static_cast<float>(width - 2 * inset), static_cast<float>(height - 2 * inset)};
+/// What an outline within a rectangle runs along: the last column and row are its own.
+TDeviceBox FrameOf(const TRect& rect, double inset) {
+    const TDeviceBox box = BoxOf(Sorted(rect));
+    return {box.left + inset, box.top + inset, box.right - 1 - inset, box.bottom - 1 - inset};
+}
+
+bool IsFrame(const TDeviceBox& box) {
+    return box.left <= box.right && box.top <= box.bottom;
 }
 
 std::u16string OnOneLine(std::u16string_view text) {
@@ -204,18 +204,9 @@ TArgb OpaqueColor(TColor color) {
     return MakeArgb(255, RGBFromColor(color));
 }
 
-/// Angles of an arc from a ray through one point counter-clockwise to that through another.
-struct TSweep {
-    double start = 0;
-    double sweep = 0;
-};
-TSweep SweepBetween(const TDrawRect& bounds, TPoint start, TPoint end) {
-    constexpr double kDegreesPerRadian = 57.295779513082320877;
-    const double x = bounds.x + bounds.width / 2.0;
-    const double y = bounds.y + bounds.height / 2.0;
-    const double first = std::atan2(start.y - y, start.x - x) * kDegreesPerRadian;
-    const double last = std::atan2(end.y - y, end.x - x) * kDegreesPerRadian;
-    return {first, last - first >= 0 ? last - first - 360 : last - first};
+TSweep SweepBetween(const TDeviceBox& frame, TPoint start, TPoint end) {
+    return platform::SweepBetween(frame, {double(start.x), double(start.y)},
+                                  {double(end.x), double(end.y)});
 }
 
 // Figures.
@@ -305,10 +296,7 @@ void TLinuxPlainCanvas::Polygon(const TPlainPen& pen, const TPlainBrush& brush,
 
 void TLinuxPlainCanvas::FillRect(const TPlainBrush& brush, const TRect& rect) try {
     TOutline outline = MakeOutline();
-    outline.AddPoint(rect.left, rect.top);
-    outline.AddPoint(rect.right, rect.top);
-    outline.AddPoint(rect.right, rect.bottom);
-    outline.AddPoint(rect.left, rect.bottom);
+    outline.AddRectangle(BoxOf(rect));
     Fill(TPlainPen{}, brush, outline);
 } catch (const std::bad_alloc&) {
     return;
@@ -321,9 +309,9 @@ void TLinuxPlainCanvas::Rectangle(const TPlainPen& pen, const TPlainBrush& brush
 
 void TLinuxPlainCanvas::Ellipse(const TPlainPen& pen, const TPlainBrush& brush,
                                 const TRect& rect) try {
-    const TDrawRect frame = FrameOf(rect, InsetOf(pen));
+    const TDeviceBox frame = FrameOf(rect, InsetOf(pen));
     TOutline outline = MakeOutline();
-    if (frame.width >= 0 && frame.height >= 0) {
+    if (IsFrame(frame)) {
         outline.AddEllipse(frame);
     }
     FillAndStroke(pen, brush, outline);
@@ -333,24 +321,12 @@ void TLinuxPlainCanvas::Ellipse(const TPlainPen& pen, const TPlainBrush& brush,
 
 void TLinuxPlainCanvas::RoundRect(const TPlainPen& pen, const TPlainBrush& brush, const TRect& rect,
                                   std::int32_t corner_width, std::int32_t corner_height) try {
-    const TDrawRect frame = FrameOf(rect, InsetOf(pen));
-    if (frame.width < 0 || frame.height < 0) {
+    const TDeviceBox frame = FrameOf(rect, InsetOf(pen));
+    if (!IsFrame(frame)) {
         return;
     }
-    const float width = std::clamp(static_cast<float>(corner_width), 0.0F, frame.width);
-    const float height = std::clamp(static_cast<float>(corner_height), 0.0F, frame.height);
-    const float right = frame.x + frame.width - width;
-    const float bottom = frame.y + frame.height - height;
     TOutline outline = MakeOutline();
-    if (width > 0 && height > 0) {
-        outline.AddArc({frame.x, frame.y, width, height}, 180, 90);
-        outline.AddArc({right, frame.y, width, height}, 270, 90);
-        outline.AddArc({right, bottom, width, height}, 0, 90);
-        outline.AddArc({frame.x, bottom, width, height}, 90, 90);
-        outline.CloseFigure();
-    } else {
-        outline.AddRectangle(frame);
-    }
+    outline.AddRoundRect(frame, corner_width, corner_height);
     FillAndStroke(pen, brush, outline);
 } catch (const std::bad_alloc&) {
     return;
@@ -358,9 +334,9 @@ void TLinuxPlainCanvas::RoundRect(const TPlainPen& pen, const TPlainBrush& brush
 
 void TLinuxPlainCanvas::Pie(const TPlainPen& pen, const TPlainBrush& brush, const TRect& rect,
                             TPoint start, TPoint end) try {
-    const TDrawRect frame = FrameOf(rect, 0);
+    const TDeviceBox frame = FrameOf(rect, 0);
     TOutline outline = MakeOutline();
-    if (frame.width >= 0 && frame.height >= 0) {
+    if (IsFrame(frame)) {
         const TSweep angles = SweepBetween(frame, start, end);
         outline.AddPie(frame, angles.start, angles.sweep);
     }
@@ -370,9 +346,9 @@ void TLinuxPlainCanvas::Pie(const TPlainPen& pen, const TPlainBrush& brush, cons
 }
 
 void TLinuxPlainCanvas::Arc(const TPlainPen& pen, const TRect& rect, TPoint start, TPoint end) try {
-    const TDrawRect frame = FrameOf(rect, 0);
+    const TDeviceBox frame = FrameOf(rect, 0);
     TOutline outline = MakeOutline();
-    if (frame.width >= 0 && frame.height >= 0) {
+    if (IsFrame(frame)) {
         const TSweep angles = SweepBetween(frame, start, end);
         outline.AddArc(frame, angles.start, angles.sweep);
     }

@@ -84,6 +84,33 @@ TArgb CombinePixel(TCombining combining, TArgb pixel, TArgb color, std::uint32_t
     return mode == kNothing ? pixel : CombineBits(mode, color, pixel);
 }
 
+/// A library surface over a tile's pixels, as long as the tile is drawn on.
+class TTileSurface {
+public:
+    TTileSurface(const TDrawingLibrary& library, TTile& tile, cairo_format_t format)
+        : library_(library),
+          surface_(library.cairo_image_surface_create_for_data(
+              tile.mask, format, tile.area.right - tile.area.left, tile.area.bottom - tile.area.top,
+              tile.mask_stride)),
+          cairo_(library.cairo_create(surface_)) {
+        tile.cairo = cairo_;
+        library_.cairo_set_source_rgba(cairo_, 1, 1, 1, 1);
+    }
+    ~TTileSurface() {
+        library_.cairo_destroy(cairo_);
+        library_.cairo_surface_flush(surface_);
+        library_.cairo_surface_destroy(surface_);
+    }
+    TTileSurface(const TTileSurface&) = delete;
+    TTileSurface& operator=(const TTileSurface&) = delete;
+    bool IsGood() const { return library_.cairo_status(cairo_) == CAIRO_STATUS_SUCCESS; }
+
+private:
+    const TDrawingLibrary& library_;
+    cairo_surface_t* surface_;
+    cairo_t* cairo_;
+};
+
 /// Whole pixels that a box touches, within a target.
 TRect PixelsOf(const TDeviceBox& box, const TDeviceBox& bounds) {
     const TDeviceBox inner = Intersect(box, bounds);
@@ -163,6 +190,15 @@ std::size_t TTargetRows::NearestEntry(TArgb color) const {
 void TTargetRows::WriteRow(std::int32_t x, std::int32_t y, std::int32_t count, const TArgb* before,
                            const TArgb* colors) {
     std::uint8_t* const row = Row(y);
+    TArgb last_color = 0;
+    std::optional<std::size_t> last_entry;  // neighbours are mostly alike, and a look-up is long
+    const auto entry_of = [&](TArgb color) {
+        if (!last_entry || color != last_color) {
+            last_color = color;
+            last_entry = NearestEntry(color);
+        }
+        return *last_entry;
+    };
     for (std::int32_t i = 0; i < count; ++i) {
         const std::int64_t column = std::int64_t{x} + i;
         const TArgb color = colors[i];
@@ -175,11 +211,11 @@ void TTargetRows::WriteRow(std::int32_t x, std::int32_t y, std::int32_t count, c
                 row[column * bytes + byte] = static_cast<std::uint8_t>(color >> (8 * byte));
             }
         } else if (target_.bits_per_pixel == 8) {
-            row[column] = static_cast<std::uint8_t>(NearestEntry(color));
+            row[column] = static_cast<std::uint8_t>(entry_of(color));
         } else {
             const auto bit = static_cast<std::uint8_t>(0x80 >> (column % 8));
             std::uint8_t& byte = row[column / 8];
-            byte = static_cast<std::uint8_t>(NearestEntry(color) != 0 ? byte | bit : byte & ~bit);
+            byte = static_cast<std::uint8_t>(entry_of(color) != 0 ? byte | bit : byte & ~bit);
         }
     }
 }
@@ -191,6 +227,11 @@ TRaster::TRaster(const TDrawTarget& target, const TDrawingLibrary& library)
 
 TDeviceBox TRaster::Bounds() const {
     return {0, 0, static_cast<double>(target_.width), static_cast<double>(target_.height)};
+}
+
+bool TRaster::DrawTile(TTile& tile, cairo_format_t format, const TDrawCoverage& draw) {
+    const TTileSurface surface(library_, tile, format);
+    return draw(tile) && surface.IsGood();
 }
 
 template <typename TCompose>
@@ -205,25 +246,16 @@ bool TRaster::PaintTiles(const TDeviceBox& box, cairo_format_t format, const TDr
             TTile tile;
             tile.area = {left, top, left + std::min(kTileWidth, pixels.right - left),
                          top + std::min(kTileHeight, pixels.bottom - top)};
-            const std::int32_t width = tile.area.right - left;
-            const std::int32_t height = tile.area.bottom - top;
-            tile.mask_stride = (width * pixel_bytes + 3) / 4 * 4;
-            buffer_.assign(
-                static_cast<std::size_t>(tile.mask_stride) * static_cast<std::size_t>(height), 0);
+            tile.mask_stride = ((tile.area.right - left) * pixel_bytes + 3) / 4 * 4;
+            buffer_.assign(static_cast<std::size_t>(tile.mask_stride) *
+                               static_cast<std::size_t>(tile.area.bottom - top),
+                           0);
             tile.mask = buffer_.data();
-            cairo_surface_t* const surface = library_.cairo_image_surface_create_for_data(
-                tile.mask, format, width, height, tile.mask_stride);
-            tile.cairo = library_.cairo_create(surface);
-            library_.cairo_set_source_rgba(tile.cairo, 1, 1, 1, 1);
-            const bool is_drawn =
-                draw(tile) && library_.cairo_status(tile.cairo) == CAIRO_STATUS_SUCCESS;
-            library_.cairo_destroy(tile.cairo);
-            library_.cairo_surface_flush(surface);
-            library_.cairo_surface_destroy(surface);
-            if (!is_drawn) {
+            if (!DrawTile(tile, format, draw)) {
                 return false;
             }
             compose(tile);
+            painted_pixels_ += std::int64_t{tile.area.right - left} * (tile.area.bottom - top);
         }
     }
     if (pixels.left < pixels.right) {
@@ -329,12 +361,12 @@ void AddFigures(const TDrawingLibrary& library, const TTile& tile,
 }
 
 bool FillFigures(const TDrawingLibrary& library, const TTile& tile,
-                 const std::vector<TPolyline>& figures, TMaskEdges edges) {
+                 const std::vector<TPolyline>& figures, TMaskEdges edges, cairo_fill_rule_t rule) {
     AddFigures(library, tile, CutPolygons(figures, Enlarge(BoxOf(tile.area), kCutMargin)),
                /*offset=*/0);
     library.cairo_set_antialias(
         tile.cairo, edges == TMaskEdges::kSmooth ? CAIRO_ANTIALIAS_GRAY : CAIRO_ANTIALIAS_NONE);
-    library.cairo_set_fill_rule(tile.cairo, CAIRO_FILL_RULE_EVEN_ODD);
+    library.cairo_set_fill_rule(tile.cairo, rule);
     library.cairo_fill(tile.cairo);
     return true;
 }

@@ -5,8 +5,8 @@
 #include <vector>
 
 #include "engine/platform/drawing.h"
+#include "engine/platform/drawing_path_p.h"
 #include "engine/platform/linux/drawing_library_p.h"
-#include "engine/platform/linux/drawing_path_p.h"
 
 /// From coverage to pixels. The library below only says how much of each pixel a shape covers;
 /// colours are laid over the target here, in exact integers, so that a straight-alpha target keeps
@@ -71,6 +71,8 @@ public:
     bool IsValid() const { return rows_.IsValid(); }
     TDeviceBox Bounds() const;
     TRect TouchedRect() const { return touched_; }
+    /// Pixels of all tiles so far, for drawings that set themselves a limit.
+    std::int64_t PaintedPixels() const { return painted_pixels_; }
     const TDrawingLibrary& Library() const { return library_; }
 
     /// Draws coverage into tiles over the part of `box` within the target, and lays the paint on
@@ -83,6 +85,7 @@ public:
                      const TDrawCoverage& draw);
 
 private:
+    bool DrawTile(TTile& tile, cairo_format_t format, const TDrawCoverage& draw);
     template <typename TCompose>
     bool PaintTiles(const TDeviceBox& box, cairo_format_t format, const TDrawCoverage& draw,
                     TCompose compose);
@@ -94,6 +97,7 @@ private:
     const TDrawingLibrary& library_;
     TTargetRows rows_;
     TRect touched_{};
+    std::int64_t painted_pixels_ = 0;
     std::vector<std::uint8_t> buffer_;
     std::vector<std::uint8_t> coverage_;
     std::vector<TArgb> colors_;
@@ -104,9 +108,10 @@ private:
 /// Puts figures on a tile's path, moved by an offset in pixels.
 void AddFigures(const TDrawingLibrary& library, const TTile& tile,
                 const std::vector<TPolyline>& figures, double offset);
-/// Fills figures, even-odd.
+/// Fills figures, even-odd unless told otherwise.
 bool FillFigures(const TDrawingLibrary& library, const TTile& tile,
-                 const std::vector<TPolyline>& figures, TMaskEdges edges);
+                 const std::vector<TPolyline>& figures, TMaskEdges edges,
+                 cairo_fill_rule_t rule = CAIRO_FILL_RULE_EVEN_ODD);
 
 /// How far outside a tile figures are kept: so far that cuts never show, yet within the range of
 /// the library's numbers.

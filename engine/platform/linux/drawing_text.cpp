@@ -183,17 +183,34 @@ void TTextEngine::MeasureFont(double em) {
     library_.pango_font_metrics_unref(metrics);
 }
 
-const TTextEngine::TFontSetup& TTextEngine::SetUpFont(const TDrawFont& font) {
+void TTextEngine::SetUpContext(const TTextRequest& request) {
+    cairo_font_options_t* const options = library_.cairo_font_options_create();
+    library_.cairo_font_options_set_antialias(
+        options, request.is_smooth ? CAIRO_ANTIALIAS_GRAY : CAIRO_ANTIALIAS_NONE);
+    library_.cairo_font_options_set_hint_style(
+        options, request.is_hinted ? CAIRO_HINT_STYLE_SLIGHT : CAIRO_HINT_STYLE_NONE);
+    library_.cairo_font_options_set_hint_metrics(
+        options, request.is_hinted ? CAIRO_HINT_METRICS_ON : CAIRO_HINT_METRICS_OFF);
+    library_.pango_cairo_context_set_font_options(context_, options);
+    library_.cairo_font_options_destroy(options);
+    library_.pango_context_set_round_glyph_positions(context_, request.is_hinted ? TRUE : FALSE);
+}
+
+const TTextEngine::TFontSetup& TTextEngine::SetUpFont(const TTextRequest& request) {
+    const TDrawFont& font = *request.font;
     const auto key = [](const TDrawFont& f) {
         return std::tie(f.family, f.height, f.bold, f.italic, f.underline, f.strike_out);
     };
-    if (setup_.description != nullptr && key(setup_.font) == key(font)) {
+    SetUpContext(request);
+    if (setup_.is_ready && setup_.is_hinted == request.is_hinted && key(setup_.font) == key(font)) {
         return setup_;
     }
+    setup_.is_ready = false;
     if (setup_.description == nullptr) {
         setup_.description = library_.pango_font_description_new();
     }
     setup_.font = font;
+    setup_.is_hinted = request.is_hinted;
     ++setups_;
     const std::string family =
         DisplayText(std::u16string_view(font.family).substr(0, kMostFamilyLength));
@@ -210,6 +227,7 @@ const TTextEngine::TFontSetup& TTextEngine::SetUpFont(const TDrawFont& font) {
     } else {
         MeasureFont(height < 0 ? -height : kDefaultEm);
     }
+    setup_.is_ready = true;
     return setup_;
 }
 
@@ -221,12 +239,11 @@ public:
     TLayouter(TTextEngine& engine, const TTextRequest& request, const TDeviceBox* visible,
               const TVisitPiece& visit)
         : library_(engine.library_),
-          setup_(engine.SetUpFont(*request.font)),
+          setup_(engine.SetUpFont(request)),
           visit_(visit),
           visible_(visible),
           max_height_(request.max_height > 0 ? request.max_height / setup_.scale : 0),
           text_(DisplayText(request.text)) {
-        SetUpContext(engine, request);
         layout_ = library_.pango_layout_new(engine.context_);
         library_.pango_layout_set_font_description(layout_, setup_.description);
         library_.pango_layout_set_auto_dir(layout_, FALSE);
@@ -255,20 +272,6 @@ public:
     }
 
 private:
-    void SetUpContext(TTextEngine& engine, const TTextRequest& request) {
-        cairo_font_options_t* const options = library_.cairo_font_options_create();
-        library_.cairo_font_options_set_antialias(
-            options, request.is_smooth ? CAIRO_ANTIALIAS_GRAY : CAIRO_ANTIALIAS_NONE);
-        library_.cairo_font_options_set_hint_style(
-            options, request.is_hinted ? CAIRO_HINT_STYLE_SLIGHT : CAIRO_HINT_STYLE_NONE);
-        library_.cairo_font_options_set_hint_metrics(
-            options, request.is_hinted ? CAIRO_HINT_METRICS_ON : CAIRO_HINT_METRICS_OFF);
-        library_.pango_cairo_context_set_font_options(engine.context_, options);
-        library_.cairo_font_options_destroy(options);
-        library_.pango_context_set_round_glyph_positions(engine.context_,
-                                                         request.is_hinted ? TRUE : FALSE);
-    }
-
     void SetAttributes(const TDrawFont& font) {
         PangoAttrList* const attributes = library_.pango_attr_list_new();
         // A word that is broken for its length stays as it is written.

@@ -6,8 +6,8 @@
 #include <string_view>
 
 #include "engine/platform/drawing.h"
+#include "engine/platform/drawing_path_p.h"
 #include "engine/platform/linux/drawing_library_p.h"
-#include "engine/platform/linux/drawing_path_p.h"
 
 /// Layout of text: shaping, fallback fonts and wrapping by Pango, over a font map that no other
 /// thread uses meanwhile.
@@ -72,8 +72,11 @@ private:
         double scale = 1;
         double ascent = 0;  ///< of a line as laid out
         double line_height = 0;
+        bool is_hinted = false;  ///< lines are fitted to pixels too
+        bool is_ready = false;   ///< whole; what failed half-way is not taken for its font
     };
-    const TFontSetup& SetUpFont(const TDrawFont& font);
+    void SetUpContext(const TTextRequest& request);
+    const TFontSetup& SetUpFont(const TTextRequest& request);
     void MeasureFont(double em);
 
     const TDrawingLibrary& library_;

@@ -11,6 +11,7 @@ namespace zm::platform {
 namespace {
 
 constexpr double kMiterLimit = 10;
+constexpr std::uint8_t kMiterJoin = 0;
 constexpr double kMostPenWidth = 100000;
 
 bool IsFinite(const TDrawRect& rect) {
@@ -109,6 +110,57 @@ std::vector<double> DashesOf(std::uint8_t dash, double width) {
         length *= width;
     }
     return dashes;
+}
+
+/// What a miter that is too long keeps: the corner up to the limit, cut across there. The library
+/// below has no such join and leaves a bevel. Nothing for other corners, and where a line turns
+/// back on itself, which has no outer side.
+std::optional<TPolyline> ClippedMiter(const TDevicePoint& before, const TDevicePoint& corner,
+                                      const TDevicePoint& after, double half_width) {
+    const double length_in = std::hypot(corner.x - before.x, corner.y - before.y);
+    const double length_out = std::hypot(after.x - corner.x, after.y - corner.y);
+    const TDevicePoint in{(corner.x - before.x) / length_in, (corner.y - before.y) / length_in};
+    const TDevicePoint out{(after.x - corner.x) / length_out, (after.y - corner.y) / length_out};
+    const double turn = in.x * out.y - in.y * out.x;
+    // The sine of half the angle between the lines.
+    const double half_sine = std::sqrt(std::max((1 + in.x * out.x + in.y * out.y) / 2, 0.0));
+    if (!(length_in > 0 && length_out > 0) || turn == 0 || half_sine * kMiterLimit >= 1) {
+        return std::nullopt;
+    }
+    const double side = turn > 0 ? half_width : -half_width;
+    const TDevicePoint first{corner.x + in.y * side, corner.y - in.x * side};
+    const TDevicePoint last{corner.x + out.y * side, corner.y - out.x * side};
+    const double across = std::hypot(in.x - out.x, in.y - out.y);
+    const TDevicePoint outward{(in.x - out.x) / across, (in.y - out.y) / across};
+    const double depth = (first.x - corner.x) * outward.x + (first.y - corner.y) * outward.y;
+    const double reach = (kMiterLimit * half_width - depth) / (in.x * outward.x + in.y * outward.y);
+    TPolyline part{{corner,
+                    first,
+                    {first.x + in.x * reach, first.y + in.y * reach},
+                    {last.x - out.x * reach, last.y - out.y * reach},
+                    last},
+                   /*is_closed=*/true};
+    if (turn < 0) {
+        std::reverse(part.points.begin(), part.points.end());
+    }
+    return part;
+}
+
+std::vector<TPolyline> ClippedMiters(const std::vector<TPolyline>& figures, double half_width) {
+    std::vector<TPolyline> parts;
+    for (const TPolyline& figure : figures) {
+        const auto& points = figure.points;
+        const std::size_t count = points.size();
+        const std::size_t first = figure.is_closed ? 0 : 1;
+        const std::size_t end = figure.is_closed ? count : count - 1;
+        for (std::size_t i = first; count > 2 && i < end; ++i) {
+            if (auto part = ClippedMiter(points[(i + count - 1) % count], points[i],
+                                         points[(i + 1) % count], half_width)) {
+                parts.push_back(std::move(*part));
+            }
+        }
+    }
+    return parts;
 }
 
 }  // namespace
@@ -229,7 +281,7 @@ TDrawMatrix TLinuxGraphics::GetTransform() const {
 
 bool TLinuxGraphics::SetClipRect(const TDrawRect& rect) try {
     TOutline outline(world_);
-    outline.AddRectangle(rect);
+    outline.AddRectangle(BoxOf(rect));
     if (!IsFinite(rect) || !outline.Bounds()) {
         return false;
     }
@@ -270,15 +322,20 @@ void TLinuxGraphics::ApplyClip(const TTile& tile) {
 // Fills.
 
 bool TLinuxGraphics::Fill(const TVectorBrush& brush, const TOutline& outline) {
+    return Fill(static_cast<const TLinuxBrush&>(brush).record, outline, CAIRO_FILL_RULE_EVEN_ODD);
+}
+
+bool TLinuxGraphics::Fill(const TVectorBrushRecord& brush, const TOutline& outline,
+                          cairo_fill_rule_t rule) {
     const auto bounds = outline.Bounds();
     if (!bounds) {
         return outline.Figures().empty();
     }
-    const auto paint = MakePaint(static_cast<const TLinuxBrush&>(brush).record, world_);
+    const auto paint = MakePaint(brush, world_);
     return paint != nullptr &&
            raster_.Paint(Intersect(*bounds, ClipBox()), *paint, combining_, [&](const TTile& tile) {
                ApplyClip(tile);
-               return FillFigures(raster_.Library(), tile, outline.Figures(), Edges());
+               return FillFigures(raster_.Library(), tile, outline.Figures(), Edges(), rule);
            });
 }
 
@@ -293,7 +350,7 @@ bool TLinuxGraphics::FillPath(const TVectorBrush& brush, const TDrawPath& path) 
 bool TLinuxGraphics::FillRectangle(const TVectorBrush& brush, const TDrawRect& rect) try {
     TOutline outline(world_);
     if (rect.width > 0 && rect.height > 0) {
-        outline.AddRectangle(rect);
+        outline.AddRectangle(BoxOf(rect));
     }
     return Fill(brush, outline);
 } catch (const std::bad_alloc&) {
@@ -303,7 +360,7 @@ bool TLinuxGraphics::FillRectangle(const TVectorBrush& brush, const TDrawRect& r
 bool TLinuxGraphics::FillEllipse(const TVectorBrush& brush, const TDrawRect& rect) try {
     TOutline outline(world_);
     if (rect.width > 0 && rect.height > 0) {
-        outline.AddEllipse(rect);
+        outline.AddEllipse(BoxOf(rect));
     }
     return Fill(brush, outline);
 } catch (const std::bad_alloc&) {
@@ -323,7 +380,7 @@ bool TLinuxGraphics::FillPie(const TVectorBrush& brush, const TDrawRect& rect, f
                              float sweep_angle) try {
     TOutline outline(world_);
     if (rect.width > 0 && rect.height > 0) {
-        outline.AddPie(rect, start_angle, sweep_angle);
+        outline.AddPie(BoxOf(rect), start_angle, sweep_angle);
     }
     return Fill(brush, outline);
 } catch (const std::bad_alloc&) {
@@ -333,7 +390,10 @@ bool TLinuxGraphics::FillPie(const TVectorBrush& brush, const TDrawRect& rect, f
 // Lines.
 
 bool TLinuxGraphics::Stroke(const TVectorPen& pen, const TOutline& outline) {
-    const TVectorPenRecord& record = static_cast<const TLinuxPen&>(pen).record;
+    return Stroke(static_cast<const TLinuxPen&>(pen).record, outline);
+}
+
+bool TLinuxGraphics::Stroke(const TVectorPenRecord& record, const TOutline& outline) {
     const auto bounds = outline.Bounds();
     if (!bounds) {
         return outline.Figures().empty();
@@ -352,8 +412,8 @@ bool TLinuxGraphics::StrokeTile(const TVectorPenRecord& pen, double width,
                                 const std::vector<TPolyline>& figures, const TTile& tile) {
     constexpr double kPixelMiddle = 0.5;
     const TDrawingLibrary& library = raster_.Library();
-    AddFigures(library, tile, CutLines(figures, Enlarge(BoxOf(tile.area), kCutMargin)),
-               kPixelMiddle);
+    const auto lines = CutLines(figures, Enlarge(BoxOf(tile.area), kCutMargin));
+    AddFigures(library, tile, lines, kPixelMiddle);
     library.cairo_set_antialias(
         tile.cairo, Edges() == TMaskEdges::kSmooth ? CAIRO_ANTIALIAS_GRAY : CAIRO_ANTIALIAS_NONE);
     library.cairo_set_line_width(tile.cairo, width);
@@ -363,6 +423,11 @@ bool TLinuxGraphics::StrokeTile(const TVectorPenRecord& pen, double width,
     const std::vector<double> dashes = DashesOf(pen.dash, width);
     library.cairo_set_dash(tile.cairo, dashes.data(), static_cast<int>(dashes.size()), 0);
     library.cairo_stroke(tile.cairo);
+    if (pen.join == kMiterJoin && dashes.empty()) {
+        AddFigures(library, tile, ClippedMiters(lines, width / 2), kPixelMiddle);
+        library.cairo_set_fill_rule(tile.cairo, CAIRO_FILL_RULE_WINDING);
+        library.cairo_fill(tile.cairo);
+    }
     return true;
 }
 
@@ -390,7 +455,7 @@ bool TLinuxGraphics::DrawPath(const TVectorPen& pen, const TDrawPath& path) try 
 bool TLinuxGraphics::DrawRectangle(const TVectorPen& pen, const TDrawRect& rect) try {
     TOutline outline(world_);
     if (rect.width >= 0 && rect.height >= 0) {
-        outline.AddRectangle(rect);
+        outline.AddRectangle(BoxOf(rect));
     }
     return Stroke(pen, outline);
 } catch (const std::bad_alloc&) {
@@ -400,7 +465,7 @@ bool TLinuxGraphics::DrawRectangle(const TVectorPen& pen, const TDrawRect& rect)
 bool TLinuxGraphics::DrawEllipse(const TVectorPen& pen, const TDrawRect& rect) try {
     TOutline outline(world_);
     if (rect.width >= 0 && rect.height >= 0) {
-        outline.AddEllipse(rect);
+        outline.AddEllipse(BoxOf(rect));
     }
     return Stroke(pen, outline);
 } catch (const std::bad_alloc&) {
@@ -420,7 +485,7 @@ bool TLinuxGraphics::DrawPie(const TVectorPen& pen, const TDrawRect& rect, float
                              float sweep_angle) try {
     TOutline outline(world_);
     if (rect.width >= 0 && rect.height >= 0) {
-        outline.AddPie(rect, start_angle, sweep_angle);
+        outline.AddPie(BoxOf(rect), start_angle, sweep_angle);
     }
     return Stroke(pen, outline);
 } catch (const std::bad_alloc&) {
@@ -431,7 +496,7 @@ bool TLinuxGraphics::DrawArc(const TVectorPen& pen, const TDrawRect& rect, float
                              float sweep_angle) try {
     TOutline outline(world_);
     if (rect.width >= 0 && rect.height >= 0) {
-        outline.AddArc(rect, start_angle, sweep_angle);
+        outline.AddArc(BoxOf(rect), start_angle, sweep_angle);
     }
     return Stroke(pen, outline);
 } catch (const std::bad_alloc&) {

@@ -6,7 +6,7 @@
 #include <vector>
 
 #include "engine/platform/drawing.h"
-#include "engine/platform/linux/drawing_path_p.h"
+#include "engine/platform/drawing_path_p.h"
 #include "engine/platform/linux/drawing_raster_p.h"
 #include "engine/platform/linux/drawing_text_p.h"
 
@@ -65,7 +65,7 @@ public:
     bool SetClipRect(const TDrawRect& rect) override;
     bool ResetClip() override;
 
-    bool DrawMetafile(const TDrawMetafile&, const TDrawRect&) override { return false; }
+    bool DrawMetafile(const TDrawMetafile& metafile, const TDrawRect& rect) override;
     bool Flush() override { return true; }
 
     std::optional<TDrawSize> MeasureString(std::u16string_view text, const TDrawFont& font,
@@ -75,7 +75,10 @@ public:
     TRect TouchedRect() const override { return raster_.TouchedRect(); }
 
 private:
+    friend class TMetafilePlayer;  // draws figures of its own making
+    bool Fill(const TVectorBrushRecord& brush, const TOutline& outline, cairo_fill_rule_t rule);
     bool Fill(const TVectorBrush& brush, const TOutline& outline);
+    bool Stroke(const TVectorPenRecord& pen, const TOutline& outline);
     bool Stroke(const TVectorPen& pen, const TOutline& outline);
     bool StrokeTile(const TVectorPenRecord& pen, double width,
                     const std::vector<TPolyline>& figures, const TTile& tile);

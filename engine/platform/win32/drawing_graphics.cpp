@@ -23,8 +23,12 @@ bool IsMode(std::int32_t value, TMode last) {
     return value >= 0 && value <= static_cast<std::int32_t>(last);
 }
 
-bool IsFinite(TPlanePoint point) {
+bool IsFinite(TDevicePoint point) {
     return std::isfinite(point.x) && std::isfinite(point.y);
+}
+
+TDeviceMatrix ToMatrix(const TDrawMatrix& matrix) {
+    return {matrix.m11, matrix.m12, matrix.m21, matrix.m22, matrix.dx, matrix.dy};
 }
 
 }  // namespace
@@ -161,34 +165,33 @@ bool TGdiPlusDrawing::SetTransform(const TDrawMatrix& matrix) {
            Call<&TGdiPlusEntries::GdipSetWorldTransform>(copy.Get()) && ReadTransform();
 }
 
-TPlanePoint TGdiPlusDrawing::ToDevice(TPlanePoint point) const {
-    return {point.x * matrix_.m11 + point.y * matrix_.m21 + matrix_.dx,
-            point.x * matrix_.m12 + point.y * matrix_.m22 + matrix_.dy};
+TDevicePoint TGdiPlusDrawing::ToDevice(TDevicePoint point) const {
+    return ToMatrix(matrix_).Map(point.x, point.y);
 }
 
-std::optional<TPlanePoint> TGdiPlusDrawing::ToWorld(TPlanePoint point) const {
-    const double determinant = static_cast<double>(matrix_.m11) * matrix_.m22 -
-                               static_cast<double>(matrix_.m12) * matrix_.m21;
-    const double x = point.x - matrix_.dx;
-    const double y = point.y - matrix_.dy;
-    const TPlanePoint world{(x * matrix_.m22 - y * matrix_.m21) / determinant,
-                            (y * matrix_.m11 - x * matrix_.m12) / determinant};
-    return determinant != 0 && IsFinite(world) ? std::optional(world) : std::nullopt;
+std::optional<TDevicePoint> TGdiPlusDrawing::ToWorld(TDevicePoint point) const {
+    const auto inverse = ToMatrix(matrix_).Inverse();
+    const TDevicePoint world = inverse ? inverse->Map(point.x, point.y) : TDevicePoint{};
+    return inverse && IsFinite(world) ? std::optional(world) : std::nullopt;
+}
+
+TOutline TGdiPlusDrawing::DeviceOutline() const {
+    return TOutline(ToMatrix(matrix_));
 }
 
 double TGdiPlusDrawing::LargestScale() const {
     return std::max(std::hypot(matrix_.m11, matrix_.m12), std::hypot(matrix_.m21, matrix_.m22));
 }
 
-TPlaneBox TGdiPlusDrawing::Neighbourhood(double margin) const {
+TDeviceBox TGdiPlusDrawing::Neighbourhood(double margin) const {
     return {-margin, -margin, target_.width + margin, target_.height + margin};
 }
 
 TGdiPlusDrawing::TReach TGdiPlusDrawing::ReachOf(std::span<const TDrawPoint> points) const {
-    const TPlaneBox box = Neighbourhood(kNearReach);
+    const TDeviceBox box = Neighbourhood(kNearReach);
     TReach reach = TReach::kNear;
     for (const TDrawPoint& point : points) {
-        const TPlanePoint device = ToDevice({point.x, point.y});
+        const TDevicePoint device = ToDevice({point.x, point.y});
         if (!IsFinite(device)) {
             return TReach::kNowhere;
         }
@@ -226,17 +229,10 @@ bool TGdiPlusDrawing::PenIsUsable(const TVectorPen& pen) const {
     return width <= kMaxPenWidth;
 }
 
-TPlaneBox TGdiPlusDrawing::SeenBox(const TDrawRect& box) const {
-    const TPlaneFigure corners = FigureOf(TPlaneBox::Of(box));
-    const TPlanePoint first = ToDevice(corners.points.front());
-    TPlaneBox hull{first.x, first.y, first.x, first.y};
-    for (const TPlanePoint& corner : corners.points) {
-        const TPlanePoint device = ToDevice(corner);
-        if (!IsFinite(device)) {
-            return {};
-        }
-        hull = {std::min(hull.left, device.x), std::min(hull.top, device.y),
-                std::max(hull.right, device.x), std::max(hull.bottom, device.y)};
+TDeviceBox TGdiPlusDrawing::SeenBox(const TDrawRect& box) const {
+    const TDeviceBox hull = MapBox(ToMatrix(matrix_), BoxOf(box));
+    if (!std::isfinite(hull.left + hull.top + hull.right + hull.bottom)) {
+        return {};
     }
     return {std::max(std::floor(hull.left), 0.0), std::max(std::floor(hull.top), 0.0),
             std::min<double>(std::ceil(hull.right), target_.width),
@@ -244,18 +240,18 @@ TPlaneBox TGdiPlusDrawing::SeenBox(const TDrawRect& box) const {
 }
 
 /// What a far clipping rectangle is cut to, so that the library's region stays small.
-std::optional<TPlaneBox> TGdiPlusDrawing::ClipBounds() const {
+std::optional<TDeviceBox> TGdiPlusDrawing::ClipBounds() const {
     if (matrix_.m12 != 0 || matrix_.m21 != 0) {
-        return TPlaneBox{-kFarthestClip, -kFarthestClip, kFarthestClip, kFarthestClip};
+        return TDeviceBox{-kFarthestClip, -kFarthestClip, kFarthestClip, kFarthestClip};
     }
-    const TPlaneBox seen = Neighbourhood(kNearReach);
+    const TDeviceBox seen = Neighbourhood(kNearReach);
     const auto first = ToWorld({seen.left, seen.top});
     const auto last = ToWorld({seen.right, seen.bottom});
     if (!first || !last) {
         return std::nullopt;
     }
-    return TPlaneBox{std::min(first->x, last->x), std::min(first->y, last->y),
-                     std::max(first->x, last->x), std::max(first->y, last->y)};
+    return TDeviceBox{std::min(first->x, last->x), std::min(first->y, last->y),
+                      std::max(first->x, last->x), std::max(first->y, last->y)};
 }
 
 bool TGdiPlusDrawing::SetClipRect(const TDrawRect& rect) {

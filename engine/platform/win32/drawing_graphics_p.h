@@ -7,7 +7,7 @@
 #include <stdexcept>
 
 #include "engine/platform/drawing.h"
-#include "engine/platform/win32/drawing_geometry_p.h"
+#include "engine/platform/drawing_path_p.h"
 #include "engine/platform/win32/gdiplus_binding_p.h"
 
 namespace zm::platform {
@@ -158,26 +158,27 @@ private:
     bool OpenContext();
     bool ReadTransform();
 
-    TPlanePoint ToDevice(TPlanePoint point) const;
-    std::optional<TPlanePoint> ToWorld(TPlanePoint point) const;
+    TDevicePoint ToDevice(TDevicePoint point) const;
+    std::optional<TDevicePoint> ToWorld(TDevicePoint point) const;
     double LargestScale() const;
-    TPlaneBox Neighbourhood(double margin) const;
+    TDeviceBox Neighbourhood(double margin) const;
     TReach ReachOf(std::span<const TDrawPoint> points) const;
     TReach ReachOf(const TDrawRect& rect) const;
     TReach ReachOf(const TDrawPath& path) const;
     bool PenIsUsable(const TVectorPen& pen) const;
-    std::optional<TPlaneBox> ClipBounds() const;
+    std::optional<TDeviceBox> ClipBounds() const;
 
-    /// Draw a shape by `call` when it is near; otherwise by the lines that `figures` makes of it.
-    template <typename TCall, typename TFigures>
-    bool Stroke(TReach reach, const TVectorPen& pen, const TCall& call, const TFigures& figures);
-    template <typename TCall, typename TFigures>
-    bool Fill(TReach reach, const TVectorBrush& brush, const TCall& call, const TFigures& figures);
-    bool StrokeFigures(const TVectorPen& pen, const TPlaneFigures& figures);
-    bool FillFigures(const TVectorBrush& brush, const TPlaneFigures& figures);
+    /// Draw a shape by `call` when it is near; otherwise by the lines that `add` makes of it.
+    template <typename TCall, typename TAdd>
+    bool Stroke(TReach reach, const TVectorPen& pen, const TCall& call, const TAdd& add);
+    template <typename TCall, typename TAdd>
+    bool Fill(TReach reach, const TVectorBrush& brush, const TCall& call, const TAdd& add);
+    /// An outline that brings what is added to it to the target's pixels, for these two.
+    TOutline DeviceOutline() const;
+    bool StrokeOutline(const TVectorPen& pen, const TOutline& outline);
+    bool FillOutline(const TVectorBrush& brush, const TOutline& outline);
     std::optional<std::vector<Gdiplus::PointF>> WorldPoints(
-        const std::vector<TPlanePoint>& points) const;
-    std::vector<TPlanePoint> DevicePoints(const TPlaneFigure& figure) const;
+        const std::vector<TDevicePoint>& points) const;
 
     /// Lines of a text that are laid out in one go.
     struct TTextPiece {
@@ -210,22 +211,22 @@ private:
     /// Ends where lines begin more than `reach` below the first.
     bool LayOut(std::u16string_view text, Gdiplus::RectF rect,
                 const Gdiplus::GpStringFormat* format, double reach, const TPieceWork& work);
-    double ReachFrom(TPlanePoint start) const;
+    double ReachFrom(TDevicePoint start) const;
     bool LayOutLine(std::u16string_view line, const Gdiplus::GpStringFormat* format, double reach,
                     TTextLayout& layout, const TPieceWork& work);
     std::u16string_view SeenPart(std::u16string_view line, const Gdiplus::GpStringFormat* format,
                                  double reach);
     /// The whole pixels of the target that a box under the world transform may touch; an empty
     /// box when there are none.
-    TPlaneBox SeenBox(const TDrawRect& box) const;
+    TDeviceBox SeenBox(const TDrawRect& box) const;
     bool DrawPiece(const TTextPiece& piece, const Gdiplus::GpStringFormat* format, TArgb color);
     bool DrawOn(const TGdiPlusGraphics& graphics, const TTextPiece& piece,
                 const Gdiplus::GpStringFormat* format, TArgb color);
     bool DrawSingleBit(const TTextPiece& piece, const Gdiplus::GpStringFormat* format, TArgb color,
-                       const TPlaneBox& seen);
+                       const TDeviceBox& seen);
     bool DrawTextLines(const TTextPiece& piece, const Gdiplus::GpStringFormat* format, TArgb color);
     bool DrawBar(Gdiplus::GpBrush* brush, float left, float width, double top, double thickness);
-    bool PlacePicture(Gdiplus::GpImage* picture, const TPlaneBox& place);
+    bool PlacePicture(Gdiplus::GpImage* picture, const TDeviceBox& place);
 
     TDrawTarget target_;
     TDrawMatrix matrix_;

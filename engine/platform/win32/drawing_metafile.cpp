@@ -1,5 +1,7 @@
+#include <algorithm>
 #include <cstring>
 
+#include "engine/foundation/zmbytereader.h"
 #include "engine/platform/win32/drawing_graphics_p.h"
 
 // Metafiles, read and played by the library.
@@ -39,6 +41,48 @@ private:
     IStream* stream_ = nullptr;
 };
 
+/// Whether the records of the extended kind in a comment have sizes that lead on.
+bool CommentLeadsOn(std::span<const std::uint8_t> comment) {
+    constexpr std::uint32_t kExtended = 0x2B464D45;
+    constexpr std::size_t kLeast = 12;
+    TZmByteReader reader(comment);
+    reader.Skip(8);
+    const std::size_t data_bytes = reader.U32LE();
+    const std::size_t end = kLeast + std::min(data_bytes, comment.size() - kLeast);
+    const bool is_extended = reader.U32LE() == kExtended;
+    for (std::size_t place = 16; is_extended && place + kLeast <= end;) {
+        reader.MoveTo(place + 4);
+        const std::size_t size = reader.U32LE();
+        if (size < kLeast || size > end - place) {
+            return false;
+        }
+        place += size;
+    }
+    return true;
+}
+
+/// Some releases of the library never end where such records have no size. What else is wrong
+/// with the bytes they find themselves.
+bool CommentsLeadOn(std::span<const std::uint8_t> bytes) {
+    constexpr std::uint32_t kComment = 70;
+    constexpr std::size_t kLeastComment = 12;
+    TZmByteReader reader(bytes);
+    for (std::size_t place = 0; bytes.size() - place >= 8;) {
+        reader.MoveTo(place);
+        const std::uint32_t type = reader.U32LE();
+        const std::size_t size = reader.U32LE();
+        if (size < 8 || size > bytes.size() - place) {
+            break;
+        }
+        if (type == kComment && size >= kLeastComment &&
+            !CommentLeadsOn(bytes.subspan(place, size))) {
+            return false;
+        }
+        place += size;
+    }
+    return true;
+}
+
 bool IsEnhanced(Gdiplus::MetafileType type) {
     return type == Gdiplus::MetafileTypeEmf || type == Gdiplus::MetafileTypeEmfPlusOnly ||
            type == Gdiplus::MetafileTypeEmfPlusDual;
@@ -66,7 +110,7 @@ TDrawMetafileHeader HeaderOf(const Gdiplus::MetafileHeader& native) {
 
 std::unique_ptr<TDrawMetafile> CreateMetafile(std::span<const std::uint8_t> bytes) {
     const TGdiPlusEntries* entries = GdiPlus();
-    if (entries == nullptr || bytes.size() < kMinMetafileBytes) {
+    if (entries == nullptr || bytes.size() < kMinMetafileBytes || !CommentsLeadOn(bytes)) {
         return nullptr;
     }
     const TMemoryStream stream(bytes);

@@ -87,25 +87,33 @@ std::vector<POINT> NativePoints(std::span<const TPoint> points) {
     return native;
 }
 
-std::vector<POINT> NativePoints(const std::vector<TPlanePoint>& points) {
+std::vector<POINT> NativePoints(const std::vector<TDevicePoint>& points) {
     std::vector<POINT> native;
     native.reserve(points.size());
-    for (const TPlanePoint& point : points) {
+    for (const TDevicePoint& point : points) {
         native.push_back({RoundHalfEven(point.x), RoundHalfEven(point.y)});
     }
     return native;
 }
 
-TPlaneFigure FigureOf(std::span<const TPoint> points) {
-    TPlaneFigure figure;
-    for (const TPoint& point : points) {
-        figure.points.push_back({static_cast<double>(point.x), static_cast<double>(point.y)});
-    }
-    return figure;
+/// The shape as lines, in the coordinates of the calls.
+template <typename TAdd>
+TOutline MakeOutline(const TAdd& add) {
+    TOutline outline({});
+    add(outline);
+    return outline;
+}
+
+TOutline LinesThrough(std::span<const TPoint> points) {
+    return MakeOutline([&](TOutline& outline) {
+        for (const TPoint& point : points) {
+            outline.AddPoint(point.x, point.y);
+        }
+    });
 }
 
 /// Pixels that an outline within the rectangle runs through.
-TPlaneBox OutlineBox(const TRect& rect) {
+TDeviceBox OutlineBox(const TRect& rect) {
     return {static_cast<double>(rect.left), static_cast<double>(rect.top), rect.right - 1.0,
             rect.bottom - 1.0};
 }
@@ -115,16 +123,9 @@ TRect Sorted(const TRect& rect) {
             std::max(rect.left, rect.right), std::max(rect.top, rect.bottom)};
 }
 
-/// The arc counter-clockwise between two rays; the same ray twice means all of it.
-TPlaneFigure ArcFigure(const TPlaneBox& box, TPoint start, TPoint end) {
-    const auto ray = [&](TPoint point) {
-        return RayAngle(box, {static_cast<double>(point.x), static_cast<double>(point.y)});
-    };
-    const double start_angle = ray(start);
-    const double turn = start_angle - ray(end);
-    TPlaneFigure figure;
-    AppendArc(figure.points, box, start_angle, -(turn > 0 ? turn : turn + 360.0), 1);
-    return figure;
+TSweep SweepBetween(const TDeviceBox& box, TPoint start, TPoint end) {
+    return platform::SweepBetween(box, {double(start.x), double(start.y)},
+                                  {double(end.x), double(end.y)});
 }
 
 /// Lack of memory draws nothing.
@@ -167,7 +168,7 @@ TGdiCanvas::TGdiCanvas(const TDrawTarget& target)
     ShowColors(target);
 }
 
-TPlaneBox TGdiCanvas::Neighbourhood(double margin) const {
+TDeviceBox TGdiCanvas::Neighbourhood(double margin) const {
     POINT origin{};
     ::GetViewportOrgEx(context_, &origin);
     return {-margin - origin.x, -margin - origin.y, target_.width + margin - origin.x,
@@ -180,14 +181,14 @@ bool TGdiCanvas::IsNear(const TRect& rect) const {
 }
 
 bool TGdiCanvas::AreNear(std::span<const TPoint> points) const {
-    const TPlaneBox box = Neighbourhood(kNearReach);
+    const TDeviceBox box = Neighbourhood(kNearReach);
     return std::all_of(points.begin(), points.end(), [&](TPoint point) {
         return box.Holds({static_cast<double>(point.x), static_cast<double>(point.y)});
     });
 }
 
 RECT TGdiCanvas::SeenPart(const TRect& rect) const {
-    const TPlaneBox box = Neighbourhood(kNearReach);
+    const TDeviceBox box = Neighbourhood(kNearReach);
     const auto limit = [](std::int32_t value, double first, double last) {
         return LONG{TruncToInt(std::clamp<double>(value, first, last))};
     };
@@ -195,16 +196,15 @@ RECT TGdiCanvas::SeenPart(const TRect& rect) const {
             limit(rect.right, box.left, box.right), limit(rect.bottom, box.top, box.bottom)};
 }
 
-void TGdiCanvas::StrokeFar(const TPlainPen& pen, const TPlaneFigure& figure) {
+void TGdiCanvas::StrokeFar(const TPlainPen& pen, const TOutline& outline) {
     const TShapeScope shape(context_, pen, kEmptyBrush);
     const double width = std::clamp(pen.width, 1, kMaxPenWidth);
-    std::vector<TPlanePoint> points = figure.points;
-    if (figure.is_closed && !points.empty()) {
-        points.push_back(points.front());
-    }
-    const TPlaneBox box = Neighbourhood(kFillMargin + width * kPenWidthsSeen);
-    for (const std::vector<TPlanePoint>& run : ClipPolyline(points, box)) {
-        const std::vector<POINT> native = NativePoints(run);
+    const TDeviceBox box = Neighbourhood(kFillMargin + width * kPenWidthsSeen);
+    for (TPolyline& run : CutLines(outline.Figures(), box)) {
+        if (run.is_closed) {
+            run.points.push_back(run.points.front());
+        }
+        const std::vector<POINT> native = NativePoints(run.points);
         if (shape.IsReady()) {
             ::Polyline(context_, native.data(), static_cast<int>(native.size()));
         }
@@ -213,13 +213,15 @@ void TGdiCanvas::StrokeFar(const TPlainPen& pen, const TPlaneFigure& figure) {
 
 /// The lines that cut a far shape lie outside the target, but its outline must not follow them:
 /// inside and outline are drawn apart.
-void TGdiCanvas::DrawFar(const TPlainPen& pen, const TPlainBrush& brush,
-                         const TPlaneFigure& figure) {
-    const auto native = NativePoints(ClipPolygon(figure.points, Neighbourhood(kFillMargin)));
-    if (const TShapeScope shape(context_, kNoPen, brush); shape.IsReady() && native.size() >= 3) {
-        ::Polygon(context_, native.data(), static_cast<int>(native.size()));
+void TGdiCanvas::DrawFar(const TPlainPen& pen, const TPlainBrush& brush, const TOutline& outline) {
+    const TShapeScope shape(context_, kNoPen, brush);
+    for (const TPolyline& figure : CutPolygons(outline.Figures(), Neighbourhood(kFillMargin))) {
+        const std::vector<POINT> native = NativePoints(figure.points);
+        if (shape.IsReady() && native.size() >= 3) {
+            ::Polygon(context_, native.data(), static_cast<int>(native.size()));
+        }
     }
-    StrokeFar(pen, figure);
+    StrokeFar(pen, outline);
 }
 
 void TGdiCanvas::MoveTo(std::int32_t x, std::int32_t y) {
@@ -236,7 +238,7 @@ void TGdiCanvas::LineTo(const TPlainPen& pen, std::int32_t x, std::int32_t y) {
             ::LineTo(context_, x, y);
         }
     } else {
-        InMemory([&] { StrokeFar(pen, FigureOf(ends)); });
+        InMemory([&] { StrokeFar(pen, LinesThrough(ends)); });
     }
     ::MoveToEx(context_, x, y, nullptr);
 }
@@ -244,7 +246,7 @@ void TGdiCanvas::LineTo(const TPlainPen& pen, std::int32_t x, std::int32_t y) {
 void TGdiCanvas::Polyline(const TPlainPen& pen, std::span<const TPoint> points) {
     InMemory([&] {
         if (!AreNear(points)) {
-            StrokeFar(pen, FigureOf(points));
+            StrokeFar(pen, LinesThrough(points));
             return;
         }
         const std::vector<POINT> native = NativePoints(points);
@@ -259,9 +261,9 @@ void TGdiCanvas::Polygon(const TPlainPen& pen, const TPlainBrush& brush,
                          std::span<const TPoint> points) {
     InMemory([&] {
         if (!AreNear(points)) {
-            TPlaneFigure figure = FigureOf(points);
-            figure.is_closed = true;
-            DrawFar(pen, brush, figure);
+            TOutline outline = LinesThrough(points);
+            outline.CloseFigure();
+            DrawFar(pen, brush, outline);
             return;
         }
         const std::vector<POINT> native = NativePoints(points);
@@ -282,7 +284,11 @@ void TGdiCanvas::FillRect(const TPlainBrush& brush, const TRect& rect) {
 
 void TGdiCanvas::Rectangle(const TPlainPen& pen, const TPlainBrush& brush, const TRect& rect) {
     if (!IsNear(rect)) {
-        InMemory([&] { DrawFar(pen, brush, zm::platform::FigureOf(OutlineBox(Sorted(rect)))); });
+        InMemory([&] {
+            DrawFar(pen, brush, MakeOutline([&](TOutline& outline) {
+                        outline.AddRectangle(OutlineBox(Sorted(rect)));
+                    }));
+        });
         return;
     }
     const TShapeScope shape(context_, pen, brush);
@@ -294,10 +300,9 @@ void TGdiCanvas::Rectangle(const TPlainPen& pen, const TPlainBrush& brush, const
 void TGdiCanvas::Ellipse(const TPlainPen& pen, const TPlainBrush& brush, const TRect& rect) {
     if (!IsNear(rect)) {
         InMemory([&] {
-            TPlaneFigure figure;
-            AppendArc(figure.points, OutlineBox(Sorted(rect)), 0, 360, 1);
-            figure.is_closed = true;
-            DrawFar(pen, brush, figure);
+            DrawFar(pen, brush, MakeOutline([&](TOutline& outline) {
+                        outline.AddEllipse(OutlineBox(Sorted(rect)));
+                    }));
         });
         return;
     }
@@ -307,32 +312,15 @@ void TGdiCanvas::Ellipse(const TPlainPen& pen, const TPlainBrush& brush, const T
     }
 }
 
-namespace {
-
-TPlaneFigure RoundRectFigure(const TPlaneBox& box, double corner_width, double corner_height) {
-    const double width = std::min(std::abs(corner_width), box.right - box.left);
-    const double height = std::min(std::abs(corner_height), box.bottom - box.top);
-    const TPlaneFigure inner = zm::platform::FigureOf(
-        TPlaneBox{box.left, box.top, box.right - width, box.bottom - height});
-    TPlaneFigure figure;
-    double angle = 180;
-    for (const TPlanePoint& corner : inner.points) {
-        AppendArc(figure.points, {corner.x, corner.y, corner.x + width, corner.y + height}, angle,
-                  90, 1);
-        angle += 90;
-    }
-    figure.is_closed = true;
-    return figure;
-}
-
-}  // namespace
-
 void TGdiCanvas::RoundRect(const TPlainPen& pen, const TPlainBrush& brush, const TRect& rect,
                            std::int32_t corner_width, std::int32_t corner_height) {
     if (!IsNear(rect)) {
         InMemory([&] {
-            DrawFar(pen, brush,
-                    RoundRectFigure(OutlineBox(Sorted(rect)), corner_width, corner_height));
+            DrawFar(pen, brush, MakeOutline([&](TOutline& outline) {
+                        outline.AddRoundRect(OutlineBox(Sorted(rect)),
+                                             std::abs(double(corner_width)),
+                                             std::abs(double(corner_height)));
+                    }));
         });
         return;
     }
@@ -354,11 +342,11 @@ void TGdiCanvas::Pie(const TPlainPen& pen, const TPlainBrush& brush, const TRect
     const std::array rays = {start, end};
     if (!IsNear(rect) || !AreNear(rays)) {
         InMemory([&] {
-            const TPlaneBox box = OutlineBox(Sorted(rect));
-            TPlaneFigure figure = ArcFigure(box, start, end);
-            figure.points.push_back({(box.left + box.right) / 2, (box.top + box.bottom) / 2});
-            figure.is_closed = true;
-            DrawFar(pen, brush, figure);
+            const TDeviceBox box = OutlineBox(Sorted(rect));
+            const TSweep angles = SweepBetween(box, start, end);
+            DrawFar(pen, brush, MakeOutline([&](TOutline& outline) {
+                        outline.AddPie(box, angles.start, angles.sweep);
+                    }));
         });
         return;
     }
@@ -372,7 +360,13 @@ void TGdiCanvas::Pie(const TPlainPen& pen, const TPlainBrush& brush, const TRect
 void TGdiCanvas::Arc(const TPlainPen& pen, const TRect& rect, TPoint start, TPoint end) {
     const std::array rays = {start, end};
     if (!IsNear(rect) || !AreNear(rays)) {
-        InMemory([&] { StrokeFar(pen, ArcFigure(OutlineBox(Sorted(rect)), start, end)); });
+        InMemory([&] {
+            const TDeviceBox box = OutlineBox(Sorted(rect));
+            const TSweep angles = SweepBetween(box, start, end);
+            StrokeFar(pen, MakeOutline([&](TOutline& outline) {
+                          outline.AddArc(box, angles.start, angles.sweep);
+                      }));
+        });
         return;
     }
     const TShapeScope shape(context_, pen, kEmptyBrush);

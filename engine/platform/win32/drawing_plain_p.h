@@ -1,8 +1,8 @@
 #pragma once
 
 #include "engine/platform/drawing.h"
+#include "engine/platform/drawing_path_p.h"
 #include "engine/platform/win32/drawing_fonts_p.h"
-#include "engine/platform/win32/drawing_geometry_p.h"
 
 namespace zm::platform {
 
@@ -43,13 +43,13 @@ public:
 
 private:
     /// What is seen of the target with a margin, in the coordinates of the calls.
-    TPlaneBox Neighbourhood(double margin) const;
+    TDeviceBox Neighbourhood(double margin) const;
     bool IsNear(const TRect& rect) const;
     bool AreNear(std::span<const TPoint> points) const;
     /// The rectangle as far as it may be seen.
     RECT SeenPart(const TRect& rect) const;
-    void StrokeFar(const TPlainPen& pen, const TPlaneFigure& figure);
-    void DrawFar(const TPlainPen& pen, const TPlainBrush& brush, const TPlaneFigure& figure);
+    void StrokeFar(const TPlainPen& pen, const TOutline& outline);
+    void DrawFar(const TPlainPen& pen, const TPlainBrush& brush, const TOutline& outline);
 
     TDrawTarget target_;
     HDC context_;

@@ -80,14 +80,14 @@ private:
 
 /// Draws the pieces of a line that may be seen, `seen` in the coordinates of the call.
 void DrawPieces(HDC context, std::int64_t x, std::int64_t y, std::u16string_view text,
-                const TPlaneBox& seen, const RECT* clip) {
+                const TDeviceBox& seen, const RECT* clip) {
     while (!text.empty() && static_cast<double>(x) <= seen.right) {
         const std::u16string_view piece = TakePiece(text);
         const SIZE size = PieceExtent(context, piece);
         // Glyphs may hang over their box, by less than its height.
-        const TPlaneBox box{static_cast<double>(x - size.cy), static_cast<double>(y),
-                            static_cast<double>(x + size.cx + size.cy),
-                            static_cast<double>(y + size.cy)};
+        const TDeviceBox box{static_cast<double>(x - size.cy), static_cast<double>(y),
+                             static_cast<double>(x + size.cx + size.cy),
+                             static_cast<double>(y + size.cy)};
         if (box.right >= seen.left && box.left <= seen.right && box.bottom >= seen.top &&
             box.top <= seen.bottom) {
             ::ExtTextOutW(context, SaturateToInt32(x), SaturateToInt32(y),

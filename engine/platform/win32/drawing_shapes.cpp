@@ -62,56 +62,6 @@ bool MakePath(const TDrawPath& parts, TGdiPlusPath& path) {
     return true;
 }
 
-// The same shapes as straight lines, for the parts of them that are near.
-
-TPlaneFigure FigureOf(std::span<const TDrawPoint> points, bool is_closed) {
-    TPlaneFigure figure;
-    figure.is_closed = is_closed;
-    for (const TDrawPoint& point : points) {
-        figure.points.push_back({point.x, point.y});
-    }
-    return figure;
-}
-
-TPlaneFigure ArcFigure(const TDrawRect& rect, double start_angle, double sweep_angle,
-                       double scale) {
-    TPlaneFigure figure;
-    AppendArc(figure.points, TPlaneBox::Of(rect), start_angle, sweep_angle, scale);
-    return figure;
-}
-
-TPlaneFigure PieFigure(const TDrawRect& rect, double start_angle, double sweep_angle,
-                       double scale) {
-    TPlaneFigure figure = ArcFigure(rect, start_angle, sweep_angle, scale);
-    figure.points.push_back({rect.x + rect.width / 2.0, rect.y + rect.height / 2.0});
-    figure.is_closed = true;
-    return figure;
-}
-
-TPlaneFigure EllipseFigure(const TDrawRect& rect, double scale) {
-    TPlaneFigure figure = ArcFigure(rect, 0, 360, scale);
-    figure.is_closed = true;
-    return figure;
-}
-
-TPlaneFigures PathFigures(const TDrawPath& path, double scale) {
-    TPlaneFigures figures(1);
-    for (const TDrawPathPart& part : path) {
-        std::vector<TPlanePoint>& points = figures.back().points;
-        if (part.kind == pkLine) {
-            points.push_back({part.from.x, part.from.y});
-            points.push_back({part.to.x, part.to.y});
-        } else if (part.kind == pkArc) {
-            AppendArc(points, TPlaneBox::Of(part.bounds), part.start_angle, part.sweep_angle,
-                      scale);
-        } else {
-            figures.back().is_closed = part.kind == pkCloseFigure;
-            figures.emplace_back();
-        }
-    }
-    return figures;
-}
-
 }  // namespace
 
 std::unique_ptr<TVectorPen> CreateVectorPen(const TVectorPenRecord& record) {
@@ -164,20 +114,11 @@ std::unique_ptr<TVectorBrush> CreateVectorBrush(const TVectorBrushRecord& record
     return IsDone(status) ? std::move(result) : nullptr;
 }
 
-std::vector<TPlanePoint> TGdiPlusDrawing::DevicePoints(const TPlaneFigure& figure) const {
-    std::vector<TPlanePoint> points;
-    points.reserve(figure.points.size() + 1);
-    for (const TPlanePoint& point : figure.points) {
-        points.push_back(ToDevice(point));
-    }
-    return points;
-}
-
 std::optional<std::vector<Gdiplus::PointF>> TGdiPlusDrawing::WorldPoints(
-    const std::vector<TPlanePoint>& points) const {
+    const std::vector<TDevicePoint>& points) const {
     std::vector<Gdiplus::PointF> world;
     world.reserve(points.size());
-    for (const TPlanePoint& point : points) {
+    for (const TDevicePoint& point : points) {
         const auto place = ToWorld(point);
         if (!place) {
             return std::nullopt;
@@ -187,35 +128,31 @@ std::optional<std::vector<Gdiplus::PointF>> TGdiPlusDrawing::WorldPoints(
     return world;
 }
 
-bool TGdiPlusDrawing::StrokeFigures(const TVectorPen& pen, const TPlaneFigures& figures) {
+bool TGdiPlusDrawing::StrokeOutline(const TVectorPen& pen, const TOutline& outline) {
     const double width = static_cast<const TGdiPlusVectorPen&>(pen).width * LargestScale();
-    const TPlaneBox box = Neighbourhood(kFillMargin + std::max(width, 1.0) * kPenWidthsSeen);
-    for (const TPlaneFigure& figure : figures) {
-        std::vector<TPlanePoint> points = DevicePoints(figure);
-        if (figure.is_closed && !points.empty()) {
-            points.push_back(points.front());
+    const TDeviceBox box = Neighbourhood(kFillMargin + std::max(width, 1.0) * kPenWidthsSeen);
+    for (TPolyline& run : CutLines(outline.Figures(), box)) {
+        if (run.is_closed) {
+            run.points.push_back(run.points.front());
         }
-        for (const std::vector<TPlanePoint>& run : ClipPolyline(points, box)) {
-            const auto world = WorldPoints(run);
-            if (!world || !Call<&TGdiPlusEntries::GdipDrawLines>(PenOf(pen), world->data(),
-                                                                 static_cast<INT>(world->size()))) {
-                return false;
-            }
+        const auto world = WorldPoints(run.points);
+        if (!world || !Call<&TGdiPlusEntries::GdipDrawLines>(PenOf(pen), world->data(),
+                                                             static_cast<INT>(world->size()))) {
+            return false;
         }
     }
     return true;
 }
 
-bool TGdiPlusDrawing::FillFigures(const TVectorBrush& brush, const TPlaneFigures& figures) {
+bool TGdiPlusDrawing::FillOutline(const TVectorBrush& brush, const TOutline& outline) {
     const TGdiPlusEntries* entries = GdiPlus();
     TGdiPlusPath path;
     if (entries == nullptr ||
         !IsDone(entries->GdipCreatePath(Gdiplus::FillModeAlternate, path.Receive()))) {
         return false;
     }
-    const TPlaneBox box = Neighbourhood(kFillMargin);
-    for (const TPlaneFigure& figure : figures) {
-        const auto world = WorldPoints(ClipPolygon(DevicePoints(figure), box));
+    for (const TPolyline& figure : CutPolygons(outline.Figures(), Neighbourhood(kFillMargin))) {
+        const auto world = WorldPoints(figure.points);
         if (!world) {
             return false;
         }
@@ -229,26 +166,37 @@ bool TGdiPlusDrawing::FillFigures(const TVectorBrush& brush, const TPlaneFigures
     return Call<&TGdiPlusEntries::GdipFillPath>(BrushOf(brush), path.Get());
 }
 
-template <typename TCall, typename TFigures>
+template <typename TCall, typename TAdd>
 bool TGdiPlusDrawing::Stroke(TReach reach, const TVectorPen& pen, const TCall& call,
-                             const TFigures& figures) {
+                             const TAdd& add) {
     if (reach == TReach::kNowhere || !PenIsUsable(pen)) {
         return false;
     }
-    return SucceedsInMemory(
-        [&] { return reach == TReach::kNear ? call(PenOf(pen)) : StrokeFigures(pen, figures()); });
+    return SucceedsInMemory([&] {
+        if (reach == TReach::kNear) {
+            return call(PenOf(pen));
+        }
+        TOutline outline = DeviceOutline();
+        add(outline);
+        return StrokeOutline(pen, outline);
+    });
 }
 
 /// Pens run through the middles of pixels, the library's own rule; fills go from edge to edge.
-template <typename TCall, typename TFigures>
+template <typename TCall, typename TAdd>
 bool TGdiPlusDrawing::Fill(TReach reach, const TVectorBrush& brush, const TCall& call,
-                           const TFigures& figures) {
+                           const TAdd& add) {
     if (reach == TReach::kNowhere ||
         !Call<&TGdiPlusEntries::GdipSetPixelOffsetMode>(Gdiplus::PixelOffsetModeHalf)) {
         return false;
     }
     const bool is_filled = SucceedsInMemory([&] {
-        return reach == TReach::kNear ? call(BrushOf(brush)) : FillFigures(brush, figures());
+        if (reach == TReach::kNear) {
+            return call(BrushOf(brush));
+        }
+        TOutline outline = DeviceOutline();
+        add(outline);
+        return FillOutline(brush, outline);
     });
     return Call<&TGdiPlusEntries::GdipSetPixelOffsetMode>(Gdiplus::PixelOffsetModeNone) &&
            is_filled;
@@ -261,7 +209,7 @@ bool TGdiPlusDrawing::DrawLine(const TVectorPen& pen, TDrawPoint from, TDrawPoin
         [&](Gdiplus::GpPen* native) {
             return Call<&TGdiPlusEntries::GdipDrawLine>(native, from.x, from.y, to.x, to.y);
         },
-        [&] { return TPlaneFigures{FigureOf(ends, false)}; });
+        [&](TOutline& outline) { outline.AddPoints(ends); });
 }
 
 bool TGdiPlusDrawing::DrawLines(const TVectorPen& pen, std::span<const TDrawPoint> points) {
@@ -272,7 +220,7 @@ bool TGdiPlusDrawing::DrawLines(const TVectorPen& pen, std::span<const TDrawPoin
             return Call<&TGdiPlusEntries::GdipDrawLines>(native, copies.data(),
                                                          static_cast<INT>(copies.size()));
         },
-        [&] { return TPlaneFigures{FigureOf(points, false)}; });
+        [&](TOutline& outline) { outline.AddPoints(points); });
 }
 
 bool TGdiPlusDrawing::DrawPath(const TVectorPen& pen, const TDrawPath& path) {
@@ -282,7 +230,7 @@ bool TGdiPlusDrawing::DrawPath(const TVectorPen& pen, const TDrawPath& path) {
             TGdiPlusPath copy;
             return MakePath(path, copy) && Call<&TGdiPlusEntries::GdipDrawPath>(native, copy.Get());
         },
-        [&] { return PathFigures(path, LargestScale()); });
+        [&](TOutline& outline) { outline.AddPath(path); });
 }
 
 bool TGdiPlusDrawing::DrawRectangle(const TVectorPen& pen, const TDrawRect& rect) {
@@ -292,7 +240,7 @@ bool TGdiPlusDrawing::DrawRectangle(const TVectorPen& pen, const TDrawRect& rect
             return Call<&TGdiPlusEntries::GdipDrawRectangle>(native, rect.x, rect.y, rect.width,
                                                              rect.height);
         },
-        [&] { return TPlaneFigures{FigureOf(TPlaneBox::Of(rect))}; });
+        [&](TOutline& outline) { outline.AddRectangle(BoxOf(rect)); });
 }
 
 bool TGdiPlusDrawing::DrawEllipse(const TVectorPen& pen, const TDrawRect& rect) {
@@ -302,7 +250,7 @@ bool TGdiPlusDrawing::DrawEllipse(const TVectorPen& pen, const TDrawRect& rect) 
             return Call<&TGdiPlusEntries::GdipDrawEllipse>(native, rect.x, rect.y, rect.width,
                                                            rect.height);
         },
-        [&] { return TPlaneFigures{EllipseFigure(rect, LargestScale())}; });
+        [&](TOutline& outline) { outline.AddEllipse(BoxOf(rect)); });
 }
 
 bool TGdiPlusDrawing::DrawPolygon(const TVectorPen& pen, std::span<const TDrawPoint> points) {
@@ -313,7 +261,10 @@ bool TGdiPlusDrawing::DrawPolygon(const TVectorPen& pen, std::span<const TDrawPo
             return Call<&TGdiPlusEntries::GdipDrawPolygon>(native, copies.data(),
                                                            static_cast<INT>(copies.size()));
         },
-        [&] { return TPlaneFigures{FigureOf(points, true)}; });
+        [&](TOutline& outline) {
+            outline.AddPoints(points);
+            outline.CloseFigure();
+        });
 }
 
 bool TGdiPlusDrawing::DrawPie(const TVectorPen& pen, const TDrawRect& rect, float start_angle,
@@ -325,9 +276,7 @@ bool TGdiPlusDrawing::DrawPie(const TVectorPen& pen, const TDrawRect& rect, floa
                    return Call<&TGdiPlusEntries::GdipDrawPie>(
                        native, rect.x, rect.y, rect.width, rect.height, start_angle, sweep_angle);
                },
-               [&] {
-                   return TPlaneFigures{PieFigure(rect, start_angle, sweep_angle, LargestScale())};
-               });
+               [&](TOutline& outline) { outline.AddPie(BoxOf(rect), start_angle, sweep_angle); });
 }
 
 bool TGdiPlusDrawing::DrawArc(const TVectorPen& pen, const TDrawRect& rect, float start_angle,
@@ -339,9 +288,7 @@ bool TGdiPlusDrawing::DrawArc(const TVectorPen& pen, const TDrawRect& rect, floa
                    return Call<&TGdiPlusEntries::GdipDrawArc>(
                        native, rect.x, rect.y, rect.width, rect.height, start_angle, sweep_angle);
                },
-               [&] {
-                   return TPlaneFigures{ArcFigure(rect, start_angle, sweep_angle, LargestScale())};
-               });
+               [&](TOutline& outline) { outline.AddArc(BoxOf(rect), start_angle, sweep_angle); });
 }
 
 bool TGdiPlusDrawing::FillPath(const TVectorBrush& brush, const TDrawPath& path) {
@@ -351,7 +298,7 @@ bool TGdiPlusDrawing::FillPath(const TVectorBrush& brush, const TDrawPath& path)
             TGdiPlusPath copy;
             return MakePath(path, copy) && Call<&TGdiPlusEntries::GdipFillPath>(native, copy.Get());
         },
-        [&] { return PathFigures(path, LargestScale()); });
+        [&](TOutline& outline) { outline.AddPath(path); });
 }
 
 bool TGdiPlusDrawing::FillRectangle(const TVectorBrush& brush, const TDrawRect& rect) {
@@ -361,7 +308,7 @@ bool TGdiPlusDrawing::FillRectangle(const TVectorBrush& brush, const TDrawRect& 
             return Call<&TGdiPlusEntries::GdipFillRectangle>(native, rect.x, rect.y, rect.width,
                                                              rect.height);
         },
-        [&] { return TPlaneFigures{FigureOf(TPlaneBox::Of(rect))}; });
+        [&](TOutline& outline) { outline.AddRectangle(BoxOf(rect)); });
 }
 
 bool TGdiPlusDrawing::FillEllipse(const TVectorBrush& brush, const TDrawRect& rect) {
@@ -371,7 +318,7 @@ bool TGdiPlusDrawing::FillEllipse(const TVectorBrush& brush, const TDrawRect& re
             return Call<&TGdiPlusEntries::GdipFillEllipse>(native, rect.x, rect.y, rect.width,
                                                            rect.height);
         },
-        [&] { return TPlaneFigures{EllipseFigure(rect, LargestScale())}; });
+        [&](TOutline& outline) { outline.AddEllipse(BoxOf(rect)); });
 }
 
 bool TGdiPlusDrawing::FillPolygon(const TVectorBrush& brush, std::span<const TDrawPoint> points) {
@@ -382,7 +329,10 @@ bool TGdiPlusDrawing::FillPolygon(const TVectorBrush& brush, std::span<const TDr
             return Call<&TGdiPlusEntries::GdipFillPolygon>(
                 native, copies.data(), static_cast<INT>(copies.size()), Gdiplus::FillModeAlternate);
         },
-        [&] { return TPlaneFigures{FigureOf(points, true)}; });
+        [&](TOutline& outline) {
+            outline.AddPoints(points);
+            outline.CloseFigure();
+        });
 }
 
 bool TGdiPlusDrawing::FillPie(const TVectorBrush& brush, const TDrawRect& rect, float start_angle,
@@ -394,9 +344,7 @@ bool TGdiPlusDrawing::FillPie(const TVectorBrush& brush, const TDrawRect& rect, 
                    return Call<&TGdiPlusEntries::GdipFillPie>(
                        native, rect.x, rect.y, rect.width, rect.height, start_angle, sweep_angle);
                },
-               [&] {
-                   return TPlaneFigures{PieFigure(rect, start_angle, sweep_angle, LargestScale())};
-               });
+               [&](TOutline& outline) { outline.AddPie(BoxOf(rect), start_angle, sweep_angle); });
 }
 
 }  // namespace zm::platform

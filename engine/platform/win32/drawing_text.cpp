@@ -314,13 +314,15 @@ bool TGdiPlusDrawing::DrawString(std::u16string_view text, const TDrawFont& font
 }
 
 /// How far the target's farthest corner is from a point, before the world transform.
-double TGdiPlusDrawing::ReachFrom(TPlanePoint start) const {
-    const TPlaneFigure corners = FigureOf(Neighbourhood(0));
+double TGdiPlusDrawing::ReachFrom(TDevicePoint start) const {
+    const TDeviceBox target = Neighbourhood(0);
     double reach = 0;
-    for (const TPlanePoint& corner : corners.points) {
-        const auto world = ToWorld(corner);
-        const double distance = world ? std::hypot(world->x - start.x, world->y - start.y) : 0;
-        reach = std::max(reach, distance);
+    for (const double x : {target.left, target.right}) {
+        for (const double y : {target.top, target.bottom}) {
+            const auto world = ToWorld({x, y});
+            const double distance = world ? std::hypot(world->x - start.x, world->y - start.y) : 0;
+            reach = std::max(reach, distance);
+        }
     }
     return reach;
 }
@@ -336,7 +338,7 @@ bool TGdiPlusDrawing::DrawPiece(const TTextPiece& piece, const Gdiplus::GpString
     const float overhang = height / static_cast<float>(std::max(piece.lines, 1));
     const TDrawRect box{piece.rect.X - overhang, piece.rect.Y - overhang,
                         piece.size.width + 2 * overhang, height + 2 * overhang};
-    const TPlaneBox seen = SeenBox(box);
+    const TDeviceBox seen = SeenBox(box);
     if (seen.left >= seen.right || seen.top >= seen.bottom) {
         return true;
     }
@@ -364,7 +366,7 @@ bool TGdiPlusDrawing::DrawOn(const TGdiPlusGraphics& graphics, const TTextPiece&
 /// Some releases of the library draw halves although single bits are asked for. The text goes to
 /// a picture of its own first, where its coverage is cut to all or nothing.
 bool TGdiPlusDrawing::DrawSingleBit(const TTextPiece& piece, const Gdiplus::GpStringFormat* format,
-                                    TArgb color, const TPlaneBox& seen) {
+                                    TArgb color, const TDeviceBox& seen) {
     const TGdiPlusEntries* entries = GdiPlus();
     const std::int32_t width = TruncToInt(seen.right - seen.left);
     const std::int32_t height = TruncToInt(seen.bottom - seen.top);
@@ -400,7 +402,7 @@ bool TGdiPlusDrawing::DrawSingleBit(const TTextPiece& piece, const Gdiplus::GpSt
 }
 
 /// Draws a picture pixel by pixel at its place on the target, whatever the transform.
-bool TGdiPlusDrawing::PlacePicture(Gdiplus::GpImage* picture, const TPlaneBox& place) {
+bool TGdiPlusDrawing::PlacePicture(Gdiplus::GpImage* picture, const TDeviceBox& place) {
     const TDrawMatrix matrix = matrix_;
     const bool is_placed =
         ResetTransform() &&

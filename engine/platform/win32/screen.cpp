@@ -31,6 +31,10 @@ TScreenTraits ScreenTraits() {
     return traits;
 }
 
+std::uint32_t SystemColor(std::uint8_t number) {
+    return GetSysColor(number);
+}
+
 bool ProcessorHasMMX() {
     return IsProcessorFeaturePresent(PF_MMX_INSTRUCTIONS_AVAILABLE) != FALSE;
 }

@@ -1,4 +1,4 @@
-#include "engine/platform/linux/drawing_path_p.h"
+#include "engine/platform/drawing_path_p.h"
 
 #include <algorithm>
 #include <cmath>
@@ -29,14 +29,9 @@ std::int32_t ChordCount(double radius, double sweep) {
     return TruncToInt(std::clamp(count, 4.0, kMostChords));
 }
 
-bool IsInside(const TDevicePoint& point, const TDeviceBox& box) {
-    return point.x >= box.left && point.x <= box.right && point.y >= box.top &&
-           point.y <= box.bottom;
-}
-
 bool IsInside(const TPolyline& figure, const TDeviceBox& box) {
     return std::all_of(figure.points.begin(), figure.points.end(),
-                       [&](const TDevicePoint& point) { return IsInside(point, box); });
+                       [&](const TDevicePoint& point) { return box.Holds(point); });
 }
 
 /// Keeps what lies on the inner side of one edge, `distance` telling how far inside a point is.
@@ -98,6 +93,10 @@ TDeviceBox Enlarge(const TDeviceBox& box, double margin) {
 TDeviceBox BoxOf(const TRect& rect) {
     return {static_cast<double>(rect.left), static_cast<double>(rect.top),
             static_cast<double>(rect.right), static_cast<double>(rect.bottom)};
+}
+
+TDeviceBox BoxOf(const TDrawRect& rect) {
+    return {rect.x, rect.y, double{rect.x} + rect.width, double{rect.y} + rect.height};
 }
 
 TDeviceMatrix TDeviceMatrix::After(const TDeviceMatrix& first) const {
@@ -162,6 +161,7 @@ void TOutline::AddPoint(double x, double y) {
     std::vector<TDevicePoint>& points = figures_.back().points;
     if (points.empty() || points.back().x != point.x || points.back().y != point.y) {
         points.push_back(point);
+        ++point_count_;
     }
 }
 
@@ -171,22 +171,37 @@ void TOutline::AddPoints(std::span<const TDrawPoint> points) {
     }
 }
 
-void TOutline::AddRectangle(const TDrawRect& rect) {
-    const double right = double{rect.x} + rect.width;
-    const double bottom = double{rect.y} + rect.height;
+void TOutline::AddRectangle(const TDeviceBox& box) {
     StartFigure();
-    AddPoint(rect.x, rect.y);
-    AddPoint(right, rect.y);
-    AddPoint(right, bottom);
-    AddPoint(rect.x, bottom);
+    AddPoint(box.left, box.top);
+    AddPoint(box.right, box.top);
+    AddPoint(box.right, box.bottom);
+    AddPoint(box.left, box.bottom);
     CloseFigure();
 }
 
-void TOutline::AddArc(const TDrawRect& bounds, double start_angle, double sweep_angle) {
-    const double radius_x = bounds.width / 2.0;
-    const double radius_y = bounds.height / 2.0;
-    const double center_x = bounds.x + radius_x;
-    const double center_y = bounds.y + radius_y;
+void TOutline::AddRoundRect(const TDeviceBox& box, double corner_width, double corner_height) {
+    const double width = std::clamp(corner_width, 0.0, std::max(box.right - box.left, 0.0));
+    const double height = std::clamp(corner_height, 0.0, std::max(box.bottom - box.top, 0.0));
+    if (!(width > 0 && height > 0)) {
+        AddRectangle(box);
+        return;
+    }
+    const double right = box.right - width;
+    const double bottom = box.bottom - height;
+    StartFigure();
+    AddArc({box.left, box.top, box.left + width, box.top + height}, 180, 90);
+    AddArc({right, box.top, box.right, box.top + height}, 270, 90);
+    AddArc({right, bottom, box.right, box.bottom}, 0, 90);
+    AddArc({box.left, bottom, box.left + width, box.bottom}, 90, 90);
+    CloseFigure();
+}
+
+void TOutline::AddArc(const TDeviceBox& bounds, double start_angle, double sweep_angle) {
+    const double radius_x = (bounds.right - bounds.left) / 2;
+    const double radius_y = (bounds.bottom - bounds.top) / 2;
+    const double center_x = bounds.left + radius_x;
+    const double center_y = bounds.top + radius_y;
     const double start = std::fmod(start_angle, 360.0) * kRadiansPerDegree;
     const double sweep = std::clamp(sweep_angle, -360.0, 360.0) * kRadiansPerDegree;
     const double first = ParameterOf(start, radius_x, radius_y);
@@ -202,17 +217,25 @@ void TOutline::AddArc(const TDrawRect& bounds, double start_angle, double sweep_
     }
 }
 
-void TOutline::AddEllipse(const TDrawRect& bounds) {
+void TOutline::AddEllipse(const TDeviceBox& bounds) {
     StartFigure();
     AddArc(bounds, 0, 360);
     CloseFigure();
 }
 
-void TOutline::AddPie(const TDrawRect& bounds, double start_angle, double sweep_angle) {
+void TOutline::AddPie(const TDeviceBox& bounds, double start_angle, double sweep_angle) {
     StartFigure();
-    AddPoint(bounds.x + bounds.width / 2.0, bounds.y + bounds.height / 2.0);
+    AddPoint((bounds.left + bounds.right) / 2, (bounds.top + bounds.bottom) / 2);
     AddArc(bounds, start_angle, sweep_angle);
     CloseFigure();
+}
+
+TSweep SweepBetween(const TDeviceBox& bounds, TDevicePoint start, TDevicePoint end) {
+    const double x = (bounds.left + bounds.right) / 2;
+    const double y = (bounds.top + bounds.bottom) / 2;
+    const double first = std::atan2(start.y - y, start.x - x) / kRadiansPerDegree;
+    const double last = std::atan2(end.y - y, end.x - x) / kRadiansPerDegree;
+    return {first, last - first >= 0 ? last - first - 360 : last - first};
 }
 
 void TOutline::AddPath(const TDrawPath& path) {
@@ -222,7 +245,7 @@ void TOutline::AddPath(const TDrawPath& path) {
                 AddPoint(part.from.x, part.from.y);
                 AddPoint(part.to.x, part.to.y);
                 break;
-            case pkArc: AddArc(part.bounds, part.start_angle, part.sweep_angle); break;
+            case pkArc: AddArc(BoxOf(part.bounds), part.start_angle, part.sweep_angle); break;
             case pkStartFigure: StartFigure(); break;
             case pkCloseFigure: CloseFigure(); break;
         }

@@ -7,7 +7,8 @@
 #include "engine/platform/drawing.h"
 
 /// Geometry of the drawing in device pixels, in double precision: paths are flattened and cut to
-/// the neighbourhood of what is drawn here, because the library below counts in 24.8 fixed point.
+/// the neighbourhood of what is drawn here. The libraries below count in narrower numbers, and
+/// some walk every row of a shape, seen or not.
 namespace zm::platform {
 
 struct TDevicePoint {
@@ -22,10 +23,15 @@ struct TDeviceBox {
     double right = 0;
     double bottom = 0;
     bool IsEmpty() const { return !(left < right && top < bottom); }
+    /// All four sides inclusive.
+    bool Holds(const TDevicePoint& point) const {
+        return point.x >= left && point.x <= right && point.y >= top && point.y <= bottom;
+    }
 };
 TDeviceBox Intersect(const TDeviceBox& a, const TDeviceBox& b);
 TDeviceBox Enlarge(const TDeviceBox& box, double margin);
 TDeviceBox BoxOf(const TRect& rect);
+TDeviceBox BoxOf(const TDrawRect& rect);
 
 /// TDrawMatrix in double precision.
 struct TDeviceMatrix {
@@ -56,16 +62,22 @@ class TOutline {
 public:
     explicit TOutline(const TDeviceMatrix& matrix) : matrix_(matrix) {}
 
+    /// For what is added from now on.
+    void SetMatrix(const TDeviceMatrix& matrix) { matrix_ = matrix; }
+    std::size_t PointCount() const { return point_count_; }
+
     void StartFigure();
     void CloseFigure();
     /// Goes on from the figure's last point, unless it is the same.
     void AddPoint(double x, double y);
     void AddPoints(std::span<const TDrawPoint> points);
-    void AddRectangle(const TDrawRect& rect);
+    void AddRectangle(const TDeviceBox& box);
+    /// Corners are quarters of an ellipse of a size, at most the box's.
+    void AddRoundRect(const TDeviceBox& box, double corner_width, double corner_height);
     /// Angles are those of the rays, in degrees, clockwise; the sweep is limited to one turn.
-    void AddArc(const TDrawRect& bounds, double start_angle, double sweep_angle);
-    void AddEllipse(const TDrawRect& bounds);
-    void AddPie(const TDrawRect& bounds, double start_angle, double sweep_angle);
+    void AddArc(const TDeviceBox& bounds, double start_angle, double sweep_angle);
+    void AddEllipse(const TDeviceBox& bounds);
+    void AddPie(const TDeviceBox& bounds, double start_angle, double sweep_angle);
     void AddPath(const TDrawPath& path);
 
     /// Nothing when it has no point, or one that is not finite.
@@ -75,8 +87,17 @@ public:
 private:
     TDeviceMatrix matrix_;
     std::vector<TPolyline> figures_;
+    std::size_t point_count_ = 0;
     bool is_open_ = false;
 };
+
+/// Angles of the part of an ellipse from the ray through one point counter-clockwise to that
+/// through another, in degrees; the same ray twice means all of it.
+struct TSweep {
+    double start = 0;
+    double sweep = 0;
+};
+TSweep SweepBetween(const TDeviceBox& bounds, TDevicePoint start, TDevicePoint end);
 
 /// The figures as closed polygons, cut at the box.
 std::vector<TPolyline> CutPolygons(const std::vector<TPolyline>& figures, const TDeviceBox& box);
