@@ -2,6 +2,7 @@
 
 #include <algorithm>
 #include <memory>
+#include <utility>
 #include <vector>
 
 #include "engine/foundation/zmdefs.h"
@@ -16,31 +17,36 @@ constexpr std::int32_t kVariableMaxLength = 1024;
 
 IHostServices* installed_services = nullptr;
 
-/// A text buffer of the host's heap. It goes back with the size that it was allocated with, also
-/// when the host has changed the size word since: a heap that trusts the size would otherwise be
-/// damaged.
+/// A text buffer of the host's heap, with the size word that goes to the host beside it.
+// Required: it goes back with what the word then holds. Hosts know their blocks by the size that
+// they wrote themselves.
 class THostTextBuffer {
 public:
-    explicit THostTextBuffer(std::int32_t size_bytes)
-        : text_(static_cast<char16_t*>(HostServices().GetMemory(size_bytes))),
-          size_bytes_(size_bytes) {
-        std::fill_n(text_, Length() < 1 ? 0 : 1, u'\0');
+    explicit THostTextBuffer(std::int32_t room_bytes)
+        : size_bytes(room_bytes),
+          text_(static_cast<char16_t*>(HostServices().GetMemory(room_bytes))),
+          length_(static_cast<std::size_t>(room_bytes) / sizeof(char16_t)) {
+        std::fill_n(text_, std::min<std::size_t>(length_, 1), u'\0');
     }
-    ~THostTextBuffer() { HostServices().FreeMemory(text_, size_bytes_); }
+    ~THostTextBuffer() { HostServices().FreeMemory(text_, size_bytes); }
     THostTextBuffer(const THostTextBuffer&) = delete;
     THostTextBuffer& operator=(const THostTextBuffer&) = delete;
 
-    char16_t* Text() { return text_; }
+    /// Lets the host expand a text into the buffer; its status.
+    std::int32_t Fill(const std::u16string& text, std::int32_t status) {
+        HostServices().ExpandText(text.c_str(), text_, &size_bytes, &status);
+        return status;
+    }
     /// The text up to its terminator, never read past the buffer's end.
     std::u16string Value() const {
-        return std::u16string(text_, std::find(text_, text_ + Length(), u'\0'));
+        return std::u16string(text_, std::find(text_, text_ + length_, u'\0'));
     }
 
-private:
-    std::size_t Length() const { return static_cast<std::size_t>(size_bytes_) / sizeof(char16_t); }
+    std::int32_t size_bytes;
 
+private:
     char16_t* text_;
-    std::int32_t size_bytes_;
+    std::size_t length_;
 };
 
 }  // namespace
@@ -70,18 +76,16 @@ std::u16string ExpandVariables(const std::u16string& text) {
     if (text.find(u'{') == std::u16string::npos) {
         return text;
     }
-    IHostServices& host = HostServices();
-    std::int32_t size_bytes = kFirstExpansionBytes;
-    std::int32_t status = 0;
-    auto buffer = std::make_unique<THostTextBuffer>(size_bytes);
-    host.ExpandText(text.c_str(), buffer->Text(), &size_bytes, &status);
+    auto buffer = std::make_unique<THostTextBuffer>(kFirstExpansionBytes);
+    const std::int32_t status = buffer->Fill(text, 0);
     if (status != 0) {
+        const std::int32_t wanted_bytes = std::exchange(buffer->size_bytes, kFirstExpansionBytes);
         buffer.reset();
-        if (size_bytes < 1) {
+        if (wanted_bytes < 1) {
             return {};  // no buffer of that size exists
         }
-        buffer = std::make_unique<THostTextBuffer>(size_bytes);
-        host.ExpandText(text.c_str(), buffer->Text(), &size_bytes, &status);
+        buffer = std::make_unique<THostTextBuffer>(wanted_bytes);
+        buffer->Fill(text, status);
     }
     return buffer->Value();
 }

@@ -12,7 +12,7 @@ namespace zm::qvrun {
 namespace {
 
 constexpr char16_t kHostVersion[] = u"8.3";
-constexpr char16_t kSilentFailure[] = u"the action failed without telling why";
+constexpr char16_t kSilentFailure[] = u"the action failed without telling why: ";
 
 // The callbacks carry no job, and every job has a thread of its own.
 thread_local THostJob* current_job = nullptr;
@@ -209,7 +209,10 @@ bool THostJob::RunStep(std::int32_t action_index, std::int32_t step_number,
     if (!returned) {
         SetError(0, exception_text);
     } else if (result == kLongFalse && error_text_.empty()) {
-        SetError(error_code_, kSilentFailure);
+        // What the step was to do, with its values, often shows the reason.
+        SetError(
+            error_code_,
+            kSilentFailure + ExpandJobText(host_.Describe(action_index, step_text), variables_));
     }
     return returned && result != kLongFalse;
 }

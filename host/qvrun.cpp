@@ -1,4 +1,7 @@
 #include <CLI/CLI.hpp>
+#include <algorithm>
+#include <array>
+#include <fstream>
 #include <iostream>
 #include <optional>
 #include <sstream>
@@ -46,22 +49,38 @@ int JobFileError(const std::string& job_file, const TJobFileError& error) {
     return kExitUsage;
 }
 
+/// Text of a pipe or device, which have no size to ask for; the limit cuts it off.
+std::string ReadPipe(const std::string& name) {
+    std::ifstream stream(name, std::ios::binary);
+    std::string text;
+    std::array<char, 1 << 16> block{};
+    while (stream && static_cast<std::int64_t>(text.size()) <= kMaxJobFileBytes) {
+        stream.read(block.data(), static_cast<std::streamsize>(block.size()));
+        text.append(block.data(), static_cast<std::size_t>(stream.gcount()));
+    }
+    return text;
+}
+
 /// Whole text of a file; nothing, with the reason, when it cannot be read.
 std::optional<std::string> ReadTextFile(const std::string& name, std::string& error_text) {
     try {
-        TFileStream stream(Utf16FromUtf8(name), fmOpenRead);
-        const std::int64_t size = stream.GetSize();
-        if (size > kMaxJobFileBytes) {
-            error_text = "the file is too large";
-            return std::nullopt;
+        std::string text;
+        if (platform::GetFileKind(Utf16FromUtf8(name)) == platform::fkOther) {
+            text = ReadPipe(name);
+        } else {
+            TFileStream stream(Utf16FromUtf8(name), fmOpenRead);
+            const std::int64_t size = std::min(stream.GetSize(), kMaxJobFileBytes + 1);
+            text.resize(static_cast<std::size_t>(size));
+            stream.ReadBuffer(text.data(), text.size());
         }
-        std::string text(static_cast<std::size_t>(size), '\0');
-        stream.ReadBuffer(text.data(), text.size());
-        return text;
+        if (static_cast<std::int64_t>(text.size()) <= kMaxJobFileBytes) {
+            return text;
+        }
+        error_text = "the file is too large";
     } catch (const std::exception& error) {
         error_text = error.what();
-        return std::nullopt;
     }
+    return std::nullopt;
 }
 
 void AddNames(std::string_view text, char separator, std::vector<std::u16string>& files) {

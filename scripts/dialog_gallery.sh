@@ -13,11 +13,9 @@ max_bytes=30000
 [ $# -ge 1 ] && [ -x "$1/gtk_gallery" ] || Fail "there is no gtk_gallery in ${1:-.}"
 output=${2:-$source_dir/docs/gallery/dialogs}
 mkdir -p "$output"
-export GDK_BACKEND=x11 GDK_SCALE=1 GTK_THEME=Adwaita GTK_USE_PORTAL=0 NO_AT_BRIDGE=1 \
-    GSETTINGS_BACKEND=memory
 
 for percent in 100 150; do
-    xvfb-run -a -s "-screen 0 1280x1024x24" "$1/gtk_gallery" "$percent" "$output" ||
+    "$source_dir/tests/build/with_display.py" "$1/gtk_gallery" "$percent" "$output" linux- ||
         Fail "the dialogs could not be shown"
 done
 for picture in "$output"/linux-*.png; do

@@ -19,7 +19,7 @@ output=$(cd "$output" && pwd)
 
 StartWineDisplay 1280x1024
 for percent in 100 150; do
-    "$source_dir/scripts/run-wine.sh" "$program" "$percent" "Z:$output" </dev/null ||
+    "$source_dir/scripts/run-wine.sh" "$program" "$percent" "Z:$output" windows- </dev/null ||
         Fail "the dialogs could not be shown"
 done
 for picture in "$output"/windows-*.png; do

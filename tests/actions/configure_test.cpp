@@ -38,14 +38,7 @@ IActionFormToolkit* FindToolkit(std::u16string& reason) {
 }
 
 std::int32_t FindControl(const IActionForm& form, const char16_t* name) {
-    std::int32_t index = 0;
-    for (const TFormControl& control : form.Design().controls) {
-        if (control.name == name) {
-            return index;
-        }
-        ++index;
-    }
-    return -1;
+    return static_cast<const TActionForm&>(form).IndexOf(name);
 }
 
 void PressOk(IActionForm& form) {

@@ -75,6 +75,20 @@ TEST_F(QvRun, TakesNamesFromStandardInput) {
     EXPECT_FALSE(Exists("out/a-3.bmp"));
 }
 
+TEST_F(QvRun, AJobFileMayBeAPipe) {
+    if (std::filesystem::path::preferred_separator != '/') {
+        GTEST_SKIP() << "the shell of this system names no pipes";
+    }
+    SavePicture("a.png", 8, 8);
+    const std::string job = WriteText("small.qvjob", kSmallJob);
+    const TProcessResult result =
+        RunProcess("cat " + job + " | " + Program() + " run /dev/stdin --set side=4 -o " +
+                       Path("out") + " " + Path("a.png"),
+                   folder_.Path());
+    EXPECT_EQ(result.exit_status, 0) << result.standard_error;
+    EXPECT_TRUE(Exists("out/a-1.bmp"));
+}
+
 TEST_F(QvRun, AFailedStepIsShownAndTheOthersGoOn) {
     SavePicture("good.png", 8, 8);
     WriteText("bad.png", "no picture at all");
@@ -98,7 +112,8 @@ TEST_F(QvRun, ShowsStepsThatFailSilentlyAndThoseThatRaise) {
         WriteText("silent.qvjob", "[Open Image]\nimage_file={file}\n[Resize Image]\nimage_w=5\n");
     TProcessResult result = Run("run " + silent + " " + Path("a.png"));
     EXPECT_EQ(result.exit_status, 1);
-    EXPECT_NE(result.standard_error.find("step 2 (Resize Image, line 3) failed: "),
+    EXPECT_NE(result.standard_error.find("step 2 (Resize Image, line 3) failed: the action failed "
+                                         "without telling why: Resize image to 5px x ?px"),
               std::string::npos)
         << result.standard_error;
     const std::string raising =

@@ -110,23 +110,11 @@ TEST_F(ComponentTest, RecordsTellTheDeclarationAndGoBack) {
     EXPECT_EQ(functions.GetActionInfo(0), nullptr) << "a function after the component's end";
 }
 
-TEST_F(ComponentTest, ASecondInitializeIsRefused) {
-    plugin->Initialize(host.app_info);
-    TAFPlugin second;
-    try {
-        second.Initialize(host.app_info);
-        FAIL() << "accepted";
-    } catch (const EPluginException& error) {
-        EXPECT_STREQ(error.what(), "Project can have only one component TAFPlugin");
-    }
-    EXPECT_EQ(PluginInstance(), plugin.get());
-}
-
-/// Name of the handler that each function of the record ran, with its item's index.
-TEST_F(ComponentTest, EachActionFunctionRunsItsOwnHandler) {
+/// Names of the handlers that the functions of the records ran, with their items' indexes.
+TEST_F(ComponentTest, EachFunctionRunsItsOwnHandler) {
     std::vector<std::string> ran;
     const auto note = [&ran](const char* name) {
-        return [&ran, name](TAction* sender, TAFActionParams&) {
+        return [&ran, name](auto* sender, auto&) {
             ran.push_back(name + std::to_string(sender->GetIndex()));
             return TLongBool{5};
         };
@@ -137,53 +125,42 @@ TEST_F(ComponentTest, EachActionFunctionRunsItsOwnHandler) {
     action.OnConfigAction = note("config");
     action.OnActionDelete = note("delete");
     action.OnJobStop = note("stop");
+    TEvent& event = plugin->GetEvents().Add();
+    event.OnConfigEvent = note("event config");
+    event.OnStartEvent = note("event start");
+    event.OnStopEvent = note("event stop");
+    event.OnDeleteEvent = note("event delete");
+    event.OnDuplicateEvent = note("event duplicate");
+    event.OnEventDescr = [](TEvent*, TAFEventParams&, std::u16string& Descr) { Descr += u"!"; };
+    plugin->GetEvents().Add();
     plugin->OnAbout = [&ran] { ran.push_back("about"); };
     plugin->OnPluginConfig = [&ran] { ran.push_back("plugin"); };
     plugin->OnShutdownPlugin = [&ran] { ran.push_back("shutdown"); };
     const TAFPluginInfo* info = plugin->Initialize(host.app_info);
-    const TAFActionsInfo& actions = *info->ActionsInfo;
+
     TAFActionParams params{};
-    EXPECT_EQ(actions.ExecAction(1, &params), 5);
-    EXPECT_EQ(actions.ConfigAction(1, &params), 5);
-    actions.DeleteAction(1, &params);
-    actions.JobStop(1, &params);
+    EXPECT_EQ(info->ActionsInfo->ExecAction(1, &params), 5);
+    EXPECT_EQ(info->ActionsInfo->ConfigAction(1, &params), 5);
+    info->ActionsInfo->DeleteAction(1, &params);
+    info->ActionsInfo->JobStop(1, &params);
+    const TAFEventsInfo& events = *info->EventsInfo;
+    TAFEventParams event_params{};
+    EXPECT_EQ(events.ConfigEvent(0, &event_params), 5);
+    EXPECT_EQ(events.StartEvent(0, &event_params), 5);
+    EXPECT_EQ(events.StartEvent(1, &event_params), kLongFalse);
+    events.StopEvent(0, &event_params);
+    events.DeleteEvent(0, &event_params);
+    events.DuplicateEvent(0, &event_params);
     info->About();
     info->PluginConfig();
     info->ShutdownPlugin();
-    EXPECT_EQ(ran, (std::vector<std::string>{"exec1", "config1", "delete1", "stop1", "about",
-                                             "plugin", "shutdown"}));
-}
-
-TEST_F(ComponentTest, EachEventFunctionRunsItsOwnHandler) {
-    std::vector<std::string> ran;
-    const auto note = [&ran](const char* name) {
-        return [&ran, name](TEvent*, TAFEventParams& params) {
-            ran.push_back(name + std::to_string(params.JobID));
-            return kLongTrue;
-        };
-    };
-    TEvent& event = plugin->GetEvents().Add();
-    event.OnConfigEvent = note("config");
-    event.OnStartEvent = note("start");
-    event.OnStopEvent = note("stop");
-    event.OnDeleteEvent = note("delete");
-    event.OnDuplicateEvent = note("duplicate");
-    event.OnEventDescr = [](TEvent*, TAFEventParams&, std::u16string& Descr) { Descr += u"!"; };
-    plugin->GetEvents().Add();
-    const TAFEventsInfo& events = *plugin->Initialize(host.app_info)->EventsInfo;
-    TAFEventParams params{};
-    params.JobID = 3;
-    EXPECT_EQ(events.ConfigEvent(0, &params), kLongTrue);
-    EXPECT_EQ(events.StartEvent(0, &params), kLongTrue);
-    events.StopEvent(0, &params);
-    events.DeleteEvent(0, &params);
-    events.DuplicateEvent(0, &params);
     EXPECT_EQ(ran,
-              (std::vector<std::string>{"config3", "start3", "stop3", "delete3", "duplicate3"}));
+              (std::vector<std::string>{"exec1", "config1", "delete1", "stop1", "event config0",
+                                        "event start0", "event stop0", "event delete0",
+                                        "event duplicate0", "about", "plugin", "shutdown"}));
     char16_t buffer[kDescriptionBufferLength];
-    events.EventDescr(0, &params, buffer);
+    events.EventDescr(0, &event_params, buffer);
     EXPECT_EQ(std::u16string(buffer), u"New Event!");
-    EXPECT_EQ(events.StartEvent(1, &params), kLongFalse);
 }
 
 TEST_F(ComponentTest, WithoutHandlerItemOrParametersNothingRuns) {
@@ -245,6 +222,7 @@ TEST_F(ComponentTest, HostWindowAnswersScaleAndSettings) {
     ReadPluginSettings(settings, *plugin);
     EXPECT_EQ(settings.RegKey, u"");
 
+    EXPECT_EQ(TAFPlugin().DefaultScale(), 100) << "without a window";
     constexpr std::int32_t kScales[][2] = {{99, 100},  {100, 100}, {125, 125}, {250, 250},
                                            {251, 100}, {-1, 100},  {0, 100}};
     for (const auto& row : kScales) {
@@ -252,16 +230,6 @@ TEST_F(ComponentTest, HostWindowAnswersScaleAndSettings) {
         EXPECT_EQ(plugin->DefaultScale(), row[1]);
     }
     EXPECT_EQ(asked[9], 7);
-}
-
-TEST_F(ComponentTest, WithoutAWindowEverythingIsEmpty) {
-    plugin->Initialize(host.app_info);
-    TQVPluginSettings settings;
-    settings.AppPath = u"old";
-    ReadPluginSettings(settings, *plugin);
-    EXPECT_EQ(settings.AppPath, u"");
-    EXPECT_EQ(settings.RegKey, u"");
-    EXPECT_EQ(plugin->DefaultScale(), 100);
 }
 
 TEST(PluginTexts, TrailingSlash) {

@@ -126,43 +126,20 @@ TEST_F(ContractTest, EmptyTextRunsEveryActionWithDefaults) {
     }
 }
 
-// Within the table the module may show its form, which waits for a user.
-TEST_F(ContractTest, ConfigWithoutAFormLeavesTheBlockAlone) {
+// Within the table ConfigAction may show a form, which waits for a user.
+TEST_F(ContractTest, IndexOutsideTheTableRunsNothing) {
     for (const std::int32_t index : {kGraphicsActionCount, -1, 1000000, -1000000}) {
         TTestStep step(Host(), u"image_file=a\r\nb");
         const TAFActionParams before = step.params;
+        EXPECT_EQ(Caller().Actions().ExecAction(index, &step.params), 0);
         EXPECT_EQ(Caller().Actions().ConfigAction(index, &step.params), 0);
         EXPECT_EQ(step.params.PPtr, before.PPtr);
         EXPECT_EQ(step.params.Size, before.Size);
         EXPECT_EQ(step.Text(), u"image_file=a\r\nb");
-    }
-}
-
-TEST_F(ContractTest, IndexOutsideTheTableRunsNothing) {
-    for (const std::int32_t index : {8, -1, 1000000, -1000000}) {
-        EXPECT_FALSE(Caller().Exec(index, u""));
         EXPECT_EQ(Caller().Describe(index, u""), u"");
         EXPECT_EQ(Caller().Actions().GetActionInfo(index), nullptr);
         Caller().JobStop(index);
     }
-}
-
-TEST_F(ContractTest, DescriptionsOfAllActions) {
-    constexpr const char16_t* kDefaults[] = {
-        u"Open image from '<empty>'",
-        u"Save image to '<empty>'",
-        u"Resize image to ?px x ?px (keep aspect ratio)",
-        u"Crop image (?px, ?px) - (?px, ?px)",
-        u"Rotate image by ? degrees",
-        u"Draw \"?\" on image",
-        u"Draw \"?\" on image",
-        u"Add black border (width: ?px)",
-    };
-    for (std::int32_t index = 0; index < kGraphicsActionCount; ++index) {
-        EXPECT_EQ(Caller().Describe(index, u""), kDefaults[index]);
-    }
-    EXPECT_EQ(Caller().Describe(gaTextOnImage, u"text=" + std::u16string(300, u'q')),
-              u"Draw \"" + std::u16string(247, u'q') + u"...");
 }
 
 TEST_F(ContractTest, DeletingStepsAndShutdownAreHarmless) {

@@ -157,7 +157,11 @@ void TTestHost::Expand(const char16_t* text, char16_t* buffer, std::int32_t* siz
     const auto needed = static_cast<std::int32_t>((expanded.size() + 1) * sizeof(char16_t));
     *status = needed > *size_bytes || always_more_bytes != 0 ? 1 : 0;
     if (*status != 0) {
-        *size_bytes = needed + always_more_bytes;
+        const bool second_call = *size_bytes != expand_sizes.front();
+        *size_bytes = needed + always_more_bytes * static_cast<std::int32_t>(expand_sizes.size());
+        if (second_call) {
+            blocks_[buffer] = *size_bytes;  // the size that the block must come back with
+        }
     }
 }
 

@@ -62,8 +62,8 @@ public:
 
     // Variables: "{name}" in a text. What `variables` lacks stays as it is.
     std::map<std::u16string, std::u16string> variables;
-    /// Bytes that every call asks for beyond what the text takes; makes a host that is never
-    /// content.
+    /// Bytes that every call asks for beyond what the text takes, each call once more; makes a
+    /// host that is never content.
     std::int32_t always_more_bytes = 0;
     std::vector<std::int32_t> expand_sizes;  ///< size word of each call of ExpandText
     void Expand(const char16_t* text, char16_t* buffer, std::int32_t* size_bytes,

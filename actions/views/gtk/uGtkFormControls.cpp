@@ -1,11 +1,12 @@
 #include <algorithm>
-#include <array>
 
 #include "actions/uActionFormLayout.h"
 #include "actions/uColorNames.h"
 #include "actions/views/gtk/uGtkFormView_p.h"
 #include "actions/views/gtk/uGtkTexts.h"
+#include "actions/views/uFormViewParts_p.h"
 #include "engine/foundation/zmnumbers.h"
+#include "engine/platform/screen.h"
 
 /// Making the widgets of the controls, their look, and what they draw themselves.
 namespace zm {
@@ -26,24 +27,19 @@ constexpr char kFormStyle[] =
     ".zalmo-form radio + label, .zalmo-form check + label { margin-left: 0.1em; }";
 
 constexpr int kSwatchSize = 14;
-/// More than any panel shows; a layout of a whole long text would cost seconds.
-constexpr std::size_t kMaxSampleLength = 500;
 
 /// Columns of a colour box's model.
 enum TColorColumn : std::uint8_t { ccSwatch, ccName, ccCount };
 
-/// The system colours by number, as Windows has them before a user changes any; red is lowest.
-constexpr std::array<std::uint32_t, 25> kSystemColors{
-    0xC8C8C8, 0x000000, 0xD1B499, 0xDBCDBF, 0xF0F0F0, 0xFFFFFF, 0x646464, 0x000000, 0x000000,
-    0x000000, 0xB4B4B4, 0xFCF7F4, 0xABABAB, 0xD77800, 0xFFFFFF, 0xF0F0F0, 0xA0A0A0, 0x6D6D6D,
-    0x000000, 0x000000, 0xFFFFFF, 0x696969, 0xE3E3E3, 0x000000, 0xE1FFFF};
 constexpr std::uint32_t kSystemColorMark = 0xFF000000;
 
 std::uint32_t PlainColor(TColor color) {
     const auto value = static_cast<std::uint32_t>(color);
     const std::uint32_t number = value & ~kSystemColorMark;
     const bool is_system = (value & kSystemColorMark) == kSystemColorMark;
-    return is_system && number < kSystemColors.size() ? kSystemColors[number] : number;
+    // Numbers beyond those of the system's have no colour.
+    return is_system ? platform::SystemColor(static_cast<std::uint8_t>(std::min(number, 0xFFU)))
+                     : number;
 }
 
 GdkPixbuf* NewSwatch(TColor color) {

@@ -4,30 +4,16 @@
 
 #include "actions/uActionFormLayout.h"
 #include "actions/views/gtk/uGtkTexts.h"
+#include "actions/views/uFormViewParts_p.h"
 
 namespace zm {
 namespace {
 
-// What a plain window of the design's system adds to its client area: sizes of whole windows
-// include it, while the window manager here adds frames of its own.
-constexpr std::int32_t kDesignFrameWidth = 16;
-constexpr std::int32_t kDesignFrameHeight = 39;
 /// Pixels that a label may be higher than its row has it: the gap to its field.
 constexpr std::int32_t kLabelSlack = 2;
 constexpr char kControlKey[] = "zalmo-control";
 /// The toolkit's entries hold no more bytes than this.
 constexpr std::size_t kMaxEntryBytes = 65534;
-
-class TSyncGuard {
-public:
-    explicit TSyncGuard(int& depth) : depth_(depth) { ++depth_; }
-    ~TSyncGuard() { --depth_; }
-    TSyncGuard(const TSyncGuard&) = delete;
-    TSyncGuard& operator=(const TSyncGuard&) = delete;
-
-private:
-    int& depth_;
-};
 
 TGtkFormView& ViewOf(gpointer user) {
     return *static_cast<TGtkFormView*>(user);
@@ -168,7 +154,7 @@ void TGtkFormView::BuildControl(std::int32_t control) {
         gtk_fixed_put(GTK_FIXED(area_), widget, 0, 0);
     }
     ConnectControl(control);
-    ShowControl(control, fchText | fchIndex | fchChecked | fchEnabled | fchColor | fchFont);
+    ShowControl(control, kAllFormChanges);
     if (Control(control).button == fbOk) {
         gtk_window_set_default(GTK_WINDOW(window_), widgets.main);
     }
@@ -428,16 +414,6 @@ void TGtkFormView::ShowHelp() {
                    u"place of the caret. Variables get their values when the job runs.");
 }
 
-void TGtkFormView::PressButtonOf(TFormButton button) {
-    const std::vector<TFormControl>& controls = form_.Design().controls;
-    for (std::size_t index = 0; index < controls.size(); ++index) {
-        if (controls[index].button == button) {
-            form_.PressButton(static_cast<std::int32_t>(index));
-            return;
-        }
-    }
-}
-
 void TGtkFormView::InsertVariable() {
     const std::int32_t active = ControlOf(gtk_window_get_focus(GTK_WINDOW(window_)));
     const bool is_edit = active >= 0 && Control(active).kind == fcEdit;
@@ -537,7 +513,7 @@ gboolean TGtkFormView::OnDrawSample(GtkWidget* panel, cairo_t* context, gpointer
 
 gboolean TGtkFormView::OnKeyPress(GtkWidget*, GdkEventKey* event, gpointer user) {
     if (event->keyval == GDK_KEY_Escape) {
-        ViewOf(user).PressButtonOf(fbCancel);
+        PressFormButton(ViewOf(user).form_, fbCancel);
         return GDK_EVENT_STOP;
     }
     if (event->keyval == GDK_KEY_F1) {
@@ -548,7 +524,7 @@ gboolean TGtkFormView::OnKeyPress(GtkWidget*, GdkEventKey* event, gpointer user)
 }
 
 gboolean TGtkFormView::OnDelete(GtkWidget*, GdkEvent*, gpointer user) {
-    ViewOf(user).PressButtonOf(fbCancel);
+    PressFormButton(ViewOf(user).form_, fbCancel);
     return GDK_EVENT_STOP;
 }
 

@@ -65,7 +65,6 @@ private:
     void ShowIndex(std::int32_t control);
     void ShowColorBox(std::int32_t control);
     void ShowHelp();
-    void PressButtonOf(TFormButton button);
     void InsertVariable();
 
     // Signals of the toolkit; `user` is the view.

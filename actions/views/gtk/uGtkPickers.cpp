@@ -69,7 +69,10 @@ std::uint8_t StyleBit(GtkWidget* check_button, TFormFontStyle style) {
     return static_cast<std::uint8_t>(set ? style : 0);
 }
 
+/// What the dialog gave back, for what it was shown. A part that the user left alone stays as it
+/// was stored, even where the dialog could not show it.
 TFormFont ChosenFont(GtkWidget* dialog, const TFontExtras& extras, const TFormFont& before) {
+    const TFormFont shown = FontToShow(before);
     TFormFont font = before;
     font.styles = static_cast<std::uint8_t>(StyleBit(extras.underline, ffUnderline) |
                                             StyleBit(extras.strike_out, ffStrikeOut));
@@ -81,11 +84,15 @@ TFormFont ChosenFont(GtkWidget* dialog, const TFontExtras& extras, const TFormFo
     if (chosen == nullptr) {
         return font;
     }
-    if (const char* family = pango_font_description_get_family(chosen)) {
+    const char* const family = pango_font_description_get_family(chosen);
+    if (family != nullptr && ModelText(family) != shown.name) {
         font.name = ModelText(family);
     }
-    font.size =
+    const int size =
         std::max((pango_font_description_get_size(chosen) + PANGO_SCALE / 2) / PANGO_SCALE, 1);
+    if (size != shown.size) {
+        font.size = size;
+    }
     const bool bold = pango_font_description_get_weight(chosen) >= PANGO_WEIGHT_SEMIBOLD;
     const bool italic = pango_font_description_get_style(chosen) != PANGO_STYLE_NORMAL;
     font.styles =

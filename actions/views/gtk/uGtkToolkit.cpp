@@ -1,18 +1,14 @@
 #include <gtk/gtk.h>
 
-#include <algorithm>
-
 #include "actions/views/gtk/uGtkFormView_p.h"
 #include "actions/views/gtk/uGtkModule.h"
 #include "actions/views/gtk/uGtkStart.h"
+#include "actions/views/uFormViewParts_p.h"
 #include "engine/platform/callconv.h"
 
 /// The module's entry and the toolkit behind it.
 namespace zm {
 namespace {
-
-constexpr std::int32_t kMinScalePercent = 100;
-constexpr std::int32_t kMaxScalePercent = 250;
 
 class TGtkToolkit : public IActionFormToolkit {
 public:
@@ -26,9 +22,7 @@ bool TGtkToolkit::ShowModal(IActionForm& form, const TFormShowOptions& options,
         reason = u"the display has gone.";
         return false;
     }
-    TFormShowOptions bounded = options;
-    bounded.scale_percent = std::clamp(options.scale_percent, kMinScalePercent, kMaxScalePercent);
-    TGtkFormView view(form, bounded);
+    TGtkFormView view(form, BoundedOptions(options));
     view.Run();
     return true;
 }

@@ -7,6 +7,7 @@
 
 #include "actions/uActionFormLayout.h"
 #include "actions/uColorNames.h"
+#include "actions/views/uFormViewParts_p.h"
 #include "actions/views/win32/uWin32FormIds.h"
 #include "actions/views/win32/uWin32FormView_p.h"
 
@@ -17,8 +18,6 @@ namespace {
 /// Of the form's font, in pixels at 100 percent: rows and widths of the design are made for it.
 constexpr std::int32_t kFontHeight = 12;
 constexpr std::int32_t kPointsPerInch = 72;
-/// More than any panel shows; drawing the whole of a long text would take long.
-constexpr std::size_t kMaxSampleLength = 500;
 constexpr LONG kSwatchGap = 2;
 
 /// What makes a window of the system a control of a kind.

@@ -2,6 +2,7 @@
 #include <exception>
 
 #include "actions/uActionFormLayout.h"
+#include "actions/views/uFormViewParts_p.h"
 #include "actions/views/win32/uWin32FormView_p.h"
 #include "engine/foundation/zmstrings.h"
 
@@ -29,7 +30,7 @@ std::int32_t CaretOf(HWND edit) {
 void TWin32FormView::OnCommand(HWND window, int id, int code) {
     if (id == IDOK || id == IDCANCEL) {
         // From the keyboard too, and from the close box.
-        PressButtonOf(id == IDOK ? fbOk : fbCancel);
+        PressFormButton(form_, id == IDOK ? fbOk : fbCancel);
         return;
     }
     const std::int32_t control = ControlOf(window);
@@ -106,16 +107,6 @@ void TWin32FormView::OnButtonClicked(std::int32_t control, HWND window) {
         case fcSpeedButton: InsertVariable(); break;
         case fcButton: form_.PressButton(control); break;
         default: break;
-    }
-}
-
-void TWin32FormView::PressButtonOf(TFormButton button) {
-    const std::vector<TFormControl>& controls = form_.Design().controls;
-    for (std::size_t index = 0; index < controls.size(); ++index) {
-        if (controls[index].button == button) {
-            form_.PressButton(static_cast<std::int32_t>(index));
-            return;
-        }
     }
 }
 

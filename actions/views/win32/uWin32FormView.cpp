@@ -5,35 +5,18 @@
 #include <algorithm>
 
 #include "actions/uActionFormLayout.h"
+#include "actions/views/uFormViewParts_p.h"
 
 /// The dialog itself: its making, places and states. What its user does is in
 /// uWin32FormEvents.cpp.
 namespace zm {
 namespace {
 
-// What a plain frame adds to a client area in the design: sizes of whole windows include it. The
-// frame does not scale with the form.
-constexpr std::int32_t kDesignFrameWidth = 16;
-constexpr std::int32_t kDesignFrameHeight = 39;
 /// Above and below the text of an edit or list, frame included.
 constexpr std::int32_t kFieldPadding = 4;
 /// Frame around the chosen item of a list.
 constexpr std::int32_t kListFrame = 3;
 constexpr std::int32_t kListedItems = 10;
-
-constexpr std::uint8_t kAllChanges =
-    fchText | fchIndex | fchChecked | fchEnabled | fchColor | fchFont;
-
-class TSyncGuard {
-public:
-    explicit TSyncGuard(int& depth) : depth_(depth) { ++depth_; }
-    ~TSyncGuard() { --depth_; }
-    TSyncGuard(const TSyncGuard&) = delete;
-    TSyncGuard& operator=(const TSyncGuard&) = delete;
-
-private:
-    int& depth_;
-};
 
 /// A dialog template without controls; its menu, class and title are empty texts. The system reads
 /// it as one run of words that begins at a double word.
@@ -201,7 +184,7 @@ void TWin32FormView::Open() {
     PlaceControls();
     form_.AttachView(this);
     for (std::size_t control = 0; control < windows_.size(); ++control) {
-        ControlChanged(static_cast<std::int32_t>(control), kAllChanges);
+        ControlChanged(static_cast<std::int32_t>(control), kAllFormChanges);
     }
     opened_ = true;
     FocusFirst();

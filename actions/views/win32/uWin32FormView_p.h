@@ -88,7 +88,6 @@ private:
     void OnListEvent(std::int32_t control, int code);
     void OnColorChosen(std::int32_t control);
     void OnButtonClicked(std::int32_t control, HWND window);
-    void PressButtonOf(TFormButton button);
     void InsertVariable();
     void SendHelp();
     INT_PTR OnControlColor(HDC device, HWND window);

@@ -2,19 +2,16 @@
 
 #include <commctrl.h>
 
-#include <algorithm>
 #include <exception>
 
 #include "actions/views/uFormToolkit.h"
+#include "actions/views/uFormViewParts_p.h"
 #include "actions/views/win32/uWin32FormView_p.h"
 #include "engine/foundation/zmstrings.h"
 
 /// The toolkit of Windows: linked into the plug-in, its libraries loaded with the first form.
 namespace zm {
 namespace {
-
-constexpr std::int32_t kMinScalePercent = 100;
-constexpr std::int32_t kMaxScalePercent = 250;
 
 class TWin32Toolkit : public IActionFormToolkit {
 public:
@@ -43,9 +40,7 @@ bool TWin32Toolkit::ShowModal(IActionForm& form, const TFormShowOptions& options
         reason = Utf16FromUtf8(error.what());
         return false;
     }
-    TFormShowOptions bounded = options;
-    bounded.scale_percent = std::clamp(options.scale_percent, kMinScalePercent, kMaxScalePercent);
-    TWin32FormView view(form, bounded);
+    TWin32FormView view(form, BoundedOptions(options));
     return view.Run(reason);
 }
 
