@@ -22,7 +22,8 @@ class TStream;
 class TZmBitmap;
 class TZmMask;
 struct TZmFileFormatInfo;
-struct TZmLoadCodec;
+struct TZmLoadCall;
+using TZmReadFunction = std::function<void(TZmLoadCall&)>;
 struct TZmSaveCodec;
 
 using TZmFinishWorkEvent = std::function<void(void* sender)>;
@@ -106,6 +107,11 @@ public:
     /// Fetches http, https or ftp with the proxy of the settings; type by content, else by the
     /// extension in the URL.
     bool LoadFromURL(const std::u16string& url);
+    /// Draws a metafile in zm24RGB at a size in pixels: a side below 1 follows the other one, with
+    /// both below 1 it has its own size. The limits of the settings hold. `with_alpha`: what is not
+    /// drawn on is transparent instead of white. Fails where the system cannot play the file.
+    bool ImportMetafile(const std::u16string& file_name, std::int32_t width, std::int32_t height,
+                        bool with_alpha);
     /// Moves the image index within the images of the file and loads that one; the new index, or
     /// -1. The stream starts at its present position.
     std::int32_t Seek(TZmIOSeekDestination destination, const std::u16string& file_name);
@@ -248,10 +254,10 @@ private:
 
     bool LoadFileNow(std::int32_t type, const std::u16string& name);
     bool LoadStreamNow(std::int32_t type, TStream& stream);
-    bool RunLoad(const TZmLoadCodec& codec, TStream& stream, const std::u16string& name,
-                 bool with_header);
-    void LoadSteps(const TZmLoadCodec& codec, TStream& stream, const std::u16string& name,
-                   bool with_header, bool& aborting);
+    bool RunLoad(std::int32_t type, const TZmReadFunction& read, TStream& stream,
+                 const std::u16string& name, bool with_header);
+    void LoadSteps(std::int32_t type, const TZmReadFunction& read, TStream& stream,
+                   const std::u16string& name, bool with_header, bool& aborting);
     void ApplyResolutionDefaults();
     void TakeAlpha(TZmMask& alpha);
     void AdjustDPI(std::int64_t file_bytes);

@@ -7,6 +7,7 @@
 #include "engine/codecs/pngfilt.h"
 #include "engine/codecs/wbmpfilt.h"
 #include "engine/io/zalmoio_codecs_p.h"
+#include "engine/io/zalmoio_metafile_p.h"
 #include "engine/io/zmfiletypes.h"
 #include "engine/io/zmioparams.h"
 #include "engine/metadata/zmmetahooks.h"
@@ -66,6 +67,10 @@ void WriteWBMP(TZmSaveCall& call) {
     WriteWBMPStream(call.stream, call.bitmap, call.progress);
 }
 
+void ReadMetafileAtItsSize(TZmLoadCall& call) {
+    ReadMetafile(call, TMetafileImport{});
+}
+
 constexpr TZmPixelFormatSet kAllFormats;
 
 constexpr TZmLoadCodec kLoadCodecs[] = {
@@ -73,6 +78,8 @@ constexpr TZmLoadCodec kLoadCodecs[] = {
     {ioJPEG, ReadJPEG},
     {ioPNG, ReadPNG},
     {ioWBMP, ReadWBMP},
+    {ioWMF, ReadMetafileAtItsSize},
+    {ioEMF, ReadMetafileAtItsSize},
 };
 
 constexpr TZmSaveCodec kSaveCodecs[] = {

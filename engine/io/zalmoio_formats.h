@@ -154,7 +154,7 @@ public:
     bool SaveToFileSVG(const TName& name) { return SaveFileAs(ioSVG, name); }
     bool SaveToStreamSVG(TStream& stream) { return SaveStreamAs(ioSVG, stream); }
 
-    // Video, metafiles and the screen: there is no player and no screen behind this engine.
+    // Video and the screen: there is no player and no screen behind this engine.
     bool OpenAVIFile(const TName&) { return Refuse(); }
     bool LoadFromAVI(std::int32_t) { return Refuse(); }
     void CloseAVIFile() {}
@@ -165,7 +165,6 @@ public:
     bool LoadFromMediaFile(std::int32_t) { return Refuse(); }
     void CloseMediaFile() {}
     bool IsOpenMediaFile() const { return false; }
-    bool ImportMetafile(const TName&, std::int32_t, std::int32_t, bool) { return Refuse(); }
     bool CaptureFromScreen() { return Refuse(); }
     bool LoadThumbnailFromExplorer(const TName&) { return Refuse(); }
     bool Acquire() { return Refuse(); }

@@ -9,6 +9,7 @@
 #include "engine/io/zalmoio.h"
 #include "engine/io/zalmoio_codecs_p.h"
 #include "engine/io/zalmoio_headers_p.h"
+#include "engine/io/zalmoio_metafile_p.h"
 #include "engine/io/zmfileformats.h"
 #include "engine/io/zmformatdetect.h"
 #include "engine/platform/urlclient.h"
@@ -95,7 +96,21 @@ bool TZalmoIO::LoadFileNow(std::int32_t type, const std::u16string& name) {
     }
     fAborting = true;  // stands when the file cannot be opened
     TFileStream stream(name, fmOpenRead);
-    return RunLoad(*codec, stream, name, /*with_header=*/false);
+    return RunLoad(type, codec->read, stream, name, /*with_header=*/false);
+}
+
+bool TZalmoIO::ImportMetafile(const std::u16string& file_name, std::int32_t width,
+                              std::int32_t height, bool with_alpha) {
+    const TMetafileImport import{width, height, with_alpha};
+    return RunOrFail([&] {
+        return RunOrStart([this, file_name, import] {
+            fAborting = true;  // stands when the file cannot be opened
+            TFileStream stream(file_name, fmOpenRead);
+            const auto read = [&import](TZmLoadCall& call) { ReadMetafile(call, import); };
+            const bool is_wmf = FindFileFormat(file_name, zmfmContentOnly) == ioWMF;
+            return RunLoad(is_wmf ? ioWMF : ioEMF, read, stream, file_name, /*with_header=*/false);
+        });
+    });
 }
 
 bool TZalmoIO::LoadStreamNow(std::int32_t type, TStream& stream) {
@@ -104,17 +119,18 @@ bool TZalmoIO::LoadStreamNow(std::int32_t type, TStream& stream) {
     if (codec == nullptr || (row != nullptr && !row->InternalFormat)) {
         return LoadStreamByRow(row, stream);
     }
-    return RunLoad(*codec, stream, {}, fStreamHeaders);
+    return RunLoad(type, codec->read, stream, {}, fStreamHeaders);
 }
 
-bool TZalmoIO::RunLoad(const TZmLoadCodec& codec, TStream& stream, const std::u16string& name,
-                       bool with_header) {
-    return RunToNotice(
-        kAfterLoad, [&](bool& aborting) { LoadSteps(codec, stream, name, with_header, aborting); });
+bool TZalmoIO::RunLoad(std::int32_t type, const TZmReadFunction& read, TStream& stream,
+                       const std::u16string& name, bool with_header) {
+    return RunToNotice(kAfterLoad, [&](bool& aborting) {
+        LoadSteps(type, read, stream, name, with_header, aborting);
+    });
 }
 
-void TZalmoIO::LoadSteps(const TZmLoadCodec& codec, TStream& stream, const std::u16string& name,
-                         bool with_header, bool& aborting) {
+void TZalmoIO::LoadSteps(std::int32_t type, const TZmReadFunction& read, TStream& stream,
+                         const std::u16string& name, bool with_header, bool& aborting) {
     TProgressRec progress = MakeProgress(aborting);
     if (!PrepareBitmap()) {
         aborting = true;
@@ -125,14 +141,14 @@ void TZalmoIO::LoadSteps(const TZmLoadCodec& codec, TStream& stream, const std::
     fZmBitmap->RemoveAlphaChannel(/*merge=*/false, /*background=*/0);
     TZmStreamHeaderFind header;
     if (with_header) {
-        header = SkipStreamHeader(codec.type, stream);
+        header = SkipStreamHeader(type, stream);
     }
     const std::int64_t file_bytes = stream.GetSize();
     TZmMask alpha;
     if (header.is_acceptable) {
         TZmLoadCall call{stream, *fZmBitmap, params, progress, fBackground, /*params_only=*/false,
                          alpha};
-        codec.read(call);
+        read(call);
     } else {
         aborting = true;
     }
@@ -141,7 +157,7 @@ void TZalmoIO::LoadSteps(const TZmLoadCodec& codec, TStream& stream, const std::
     if (!aborting) {
         AdjustDPI(file_bytes);
         params.fFileName = name;
-        params.fFileType = codec.type;
+        params.fFileType = type;
     }
     if (header.next >= 0) {
         stream.SetPosition(header.next);

@@ -2,17 +2,11 @@
 // own, so that a damaged block changes nothing.
 
 #include <algorithm>
-#include <cmath>
 #include <cstdint>
 #include <memory>
 #include <new>
 #include <span>
 
-#include "engine/bitmap/zmplatformbitmap.h"
-#include "engine/canvas/zmgdiplus.h"
-#include "engine/foundation/zmnumbers.h"
-#include "engine/foundation/zmsettings.h"
-#include "engine/foundation/zmstreams.h"
 #include "engine/io/zalmoio.h"
 #include "engine/io/zmfiletypes.h"
 #include "engine/io/zmimagelimits.h"
@@ -22,8 +16,6 @@
 
 namespace zm {
 namespace {
-
-constexpr TColor kWhite = 0xFFFFFF;
 
 using TBlock = std::span<const std::uint8_t>;
 
@@ -35,55 +27,16 @@ bool LoadRaw(TBlock block, TZmBitmap& picture) {
     return picture.LoadRAWFromBufferOrStream(block.data(), SizeOf(block), nullptr);
 }
 
-bool LoadPng(TBlock block, TZmBitmap& picture) {
+/// By the driver, as a file of the type.
+template <std::int32_t kFileType>
+bool LoadFileOf(TBlock block, TZmBitmap& picture) {
     return TZalmoIO::CreateFromBitmap(&picture)->LoadFromBuffer(block.data(), SizeOf(block),
-                                                                ioPNG) &&
+                                                                kFileType) &&
            !picture.IsEmpty();
 }
 
 bool LoadDib(TBlock block, TZmBitmap& picture) {
     return picture.CopyFromDIB(block.data(), SizeOf(block));
-}
-
-/// A size in pixels within the limits that the settings put on metafiles, its proportions kept.
-TPoint LimitMetafileSize(std::int32_t width, std::int32_t height) {
-    const TZmZalmoGlobalSettings& settings = ZmGlobalSettings();
-    const double side = std::max(settings.fMaxImageEMFSize, 1);
-    const double area = std::max(settings.fMaxImageEMFMatrixSize, 1);
-    const double scale = std::min({1.0, side / width, side / height,
-                                   std::sqrt(area / (static_cast<double>(width) * height))});
-    return {std::max(TruncToInt(width * scale), 1), std::max(TruncToInt(height * scale), 1)};
-}
-
-/// Draws a metafile at its own size on white, where the system can.
-bool LoadMetafile(TBlock block, TZmBitmap& picture) {
-    TBorrowedMemoryStream stream(block.data(), SizeOf(block));
-    const TZmMetafile metafile(stream);
-    const TZmMetafileHeader& header = metafile.GetHeader();
-    if (header.type == 0 || header.width < 1 || header.height < 1) {
-        return false;
-    }
-    const TPoint size = LimitMetafileSize(header.width, header.height);
-    TZmBitmap paper;
-    if (!paper.Allocate(size.x, size.y, kWhite, /*alpha=*/255)) {
-        return false;
-    }
-    paper.RemoveAlphaChannel(/*merge=*/false, kWhite);
-    TBitmap sheet;
-    paper.CopyToTBitmap(&sheet);
-    if (sheet.GetWidth() != size.x) {
-        return false;
-    }
-    try {
-        TCanvas canvas(sheet);
-        TZmCanvas drawing(canvas, /*AntiAlias=*/true, /*UseGDIPlus=*/true, &sheet);
-        drawing.Draw(metafile, 0, 0, size.x, size.y);
-        drawing.Flush();
-    } catch (const EZmException&) {
-        return false;  // no drawing library
-    }
-    picture.CopyFromTBitmap(&sheet);
-    return !picture.IsEmpty();
 }
 
 struct TPasteForm {
@@ -95,9 +48,9 @@ struct TPasteForm {
 std::unique_ptr<TZmBitmap> ReadPicture(platform::TClipboard& clipboard, TZmBitmap& owner) {
     const TPasteForm forms[] = {
         {ClipboardRawFormat(), LoadRaw},
-        {ClipboardPngFormat(), LoadPng},
+        {ClipboardPngFormat(), LoadFileOf<ioPNG>},
         {platform::kClipboardDib, LoadDib},
-        {platform::kClipboardEnhMetafile, LoadMetafile},
+        {platform::kClipboardEnhMetafile, LoadFileOf<ioEMF>},
     };
     for (const TPasteForm& form : forms) {
         if (!clipboard.IsAvailable(form.format)) {

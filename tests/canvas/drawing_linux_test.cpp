@@ -6,9 +6,9 @@
 #include <utility>
 #include <vector>
 
-#include "engine/foundation/zmbytereader.h"
 #include "engine/foundation/zmstreams.h"
 #include "tests/canvas/drawing.h"
+#include "tests/support/testmetafile.h"
 
 // What the library below does not do by itself: long miters, and playing enhanced metafiles.
 namespace zm::test {
@@ -28,41 +28,6 @@ TEST(CanvasPen, LongMitersAreCutOrBevelled) {
     }
 }
 
-/// A metafile of 20 by 10 millimetres, recorded for a device of 4 pixels per millimetre: 80 by 40.
-class TRecorder {
-public:
-    TRecorder() {
-        Add(1, {0, 0, 80,       40, 0, 0, 2000, 1000, 0x464D4520, 0x10000,
-                0, 0, kHandles, 0,  0, 0, 1000, 1000, 250,        250});
-    }
-    void Add(std::uint32_t type, std::initializer_list<std::int64_t> words) {
-        Put(type);
-        Put(static_cast<std::int64_t>(words.size() + 2) * 4);
-        for (const std::int64_t word : words) {
-            Put(word);
-        }
-    }
-    /// A solid brush of a colour, and no pen.
-    void SelectBrush(std::uint32_t color) {
-        Add(39, {1, 0, color, 0});
-        Add(37, {1});
-        Add(37, {0x80000008});
-    }
-    std::vector<std::uint8_t> Finish() {
-        Add(14, {0, 16, 20});
-        PutU32LE(bytes_.data() + 48, static_cast<std::uint32_t>(bytes_.size()));
-        return bytes_;
-    }
-
-private:
-    static constexpr std::int64_t kHandles = 4;
-    void Put(std::int64_t word) {
-        bytes_.resize(bytes_.size() + 4);
-        PutU32LE(bytes_.data() + bytes_.size() - 4, static_cast<std::uint32_t>(word));
-    }
-    std::vector<std::uint8_t> bytes_;
-};
-
 /// Drawn at its own size on a picture with ten pixels around it.
 void Play(TDrawing& drawing, std::vector<std::uint8_t> bytes, std::int32_t width = 80) {
     TBorrowedMemoryStream stream(bytes.data(), static_cast<std::int32_t>(bytes.size()));
@@ -71,7 +36,7 @@ void Play(TDrawing& drawing, std::vector<std::uint8_t> bytes, std::int32_t width
 }
 
 TEST(Metafile, TheHeaderTellsKindAndSize) {
-    TRecorder recorder;
+    TMetafileRecorder recorder;
     auto bytes = recorder.Finish();
     TBorrowedMemoryStream stream(bytes.data(), static_cast<std::int32_t>(bytes.size()));
     const TZmMetafile metafile(stream);
@@ -82,7 +47,7 @@ TEST(Metafile, TheHeaderTellsKindAndSize) {
     EXPECT_FLOAT_EQ(metafile.GetHeader().dpi_x, 101.6F);  // 4 x 25.4
     EXPECT_EQ(metafile.GetHeader().frame.right, 2000);
     for (const std::int64_t flags : {0, 1}) {
-        TRecorder extended;
+        TMetafileRecorder extended;
         extended.Add(70, {16, 0x2B464D45, 0x4001 | flags << 16, 0, 0});
         bytes = extended.Finish();
         TBorrowedMemoryStream other(bytes.data(), static_cast<std::int32_t>(bytes.size()));
@@ -94,7 +59,7 @@ TEST(Metafile, TheHeaderTellsKindAndSize) {
 
 TEST(Metafile, ShapesFollowThePageAndTheRectangle) {
     TDrawing drawing(180, 60);
-    TRecorder recorder;
+    TMetafileRecorder recorder;
     recorder.Add(17, {8});  // a page of 800 by 400 from 100, 0, over all 80 by 40 pixels
     recorder.Add(9, {800, 400});
     recorder.Add(10, {100, 0});
@@ -112,7 +77,7 @@ TEST(Metafile, ShapesFollowThePageAndTheRectangle) {
 
 TEST(Metafile, StatesClipsAndPathsComeAndGo) {
     TDrawing drawing(100, 60);
-    TRecorder recorder;
+    TMetafileRecorder recorder;
     recorder.SelectBrush(0x00FF00);
     recorder.Add(33, {});
     recorder.Add(30, {0, 0, 5, 5});
@@ -133,7 +98,7 @@ TEST(Metafile, StatesClipsAndPathsComeAndGo) {
 
 TEST(Metafile, PicturesAndTexts) {
     TDrawing drawing(100, 60);
-    TRecorder recorder;
+    TMetafileRecorder recorder;
     // Two by two pixels of 24 bits, bottom row first, over 20 by 20.
     recorder.Add(
         81,
@@ -157,7 +122,7 @@ TEST(Metafile, PicturesAndTexts) {
 }
 
 TEST(Metafile, BytesOfAnyKindEndCleanly) {
-    TRecorder recorder;
+    TMetafileRecorder recorder;
     recorder.SelectBrush(kRed);
     recorder.Add(17, {8});
     recorder.Add(9, {800, 400});
