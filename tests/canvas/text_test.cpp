@@ -253,12 +253,13 @@ TEST(CanvasText, MissingFontsAreReplaced) {
 TEST(CanvasText, SizesAndPlacesWithoutBounds) {
     constexpr std::int32_t kLow = std::numeric_limits<std::int32_t>::min();
     constexpr std::int32_t kHigh = std::numeric_limits<std::int32_t>::max();
-    for (const std::int32_t height : {kLow, kHigh, 1, -1, 0, -100000}) {
+    for (const std::int32_t height : {kLow, kHigh, 1, -1, 0, -80000, -100000}) {
         TDrawing drawing(50, 50);
         SetFont(*drawing.zm_canvas, kEm);
         drawing.zm_canvas->GetFont().Height = height;
         EXPECT_GE(drawing.zm_canvas->MeasureText(u"Text").x, 0);
         drawing.zm_canvas->DrawText(u"Text", 0, 0, 0);
+        drawing.zm_canvas->DrawText(u"Text", -20000, -60000, 0);
         drawing.zm_canvas->DrawText(u"Text", TRect{kLow, kLow, kHigh, kHigh}, 33);
     }
     for (const std::int32_t place : {kLow, kHigh}) {

@@ -18,8 +18,11 @@ constexpr std::size_t kMostFamilyLength = 256;
 /// Glyphs above this size are drawn as outlines: as pictures they would stay in memory.
 constexpr double kMostPictureEm = 512;
 constexpr double kMostColorPictureEm = 4096;
-/// Glyphs above this size are not drawn: no coordinate of theirs fits the library.
-constexpr double kMostDrawnEm = 1e6;
+/// Glyphs above this size are not drawn: the font layer has 16 bits for it, and each failure of
+/// its leaves memory behind.
+constexpr double kMostDrawnEm = 65535;
+/// And below this nothing of them can be seen.
+constexpr double kLeastDrawnEm = 1.0 / 64;
 /// A limit beyond this is none: no line reaches it.
 constexpr double kMostWrapWidth = 1e6;
 constexpr std::size_t kMostWrapWindow = 65536;
@@ -428,7 +431,10 @@ TDrawSize TTextEngine::LayOut(const TTextRequest& request, const TDeviceBox* vis
 void TTextEngine::DrawPiece(cairo_t* cairo, const TTextPiece& piece,
                             const TDeviceMatrix& to_surface) {
     const double em = piece.em * std::sqrt(std::abs(to_surface.Determinant()));
-    if (!(em > 0 && em <= kMostDrawnEm)) {
+    const double em_across = piece.em * std::hypot(to_surface.m11, to_surface.m12);
+    const double em_down = piece.em * std::hypot(to_surface.m21, to_surface.m22);
+    if (!(std::min({em, em_across, em_down}) >= kLeastDrawnEm &&
+          std::max(em_across, em_down) <= kMostDrawnEm)) {
         return;
     }
     const cairo_matrix_t matrix{to_surface.m11 * piece.scale,
