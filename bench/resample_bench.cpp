@@ -70,6 +70,7 @@ constexpr TZmImageSize kLarge{kLargeWidth, kLargeHeight};
 constexpr TZmImageSize kSmall{kSmallWidth, kSmallHeight};
 constexpr TZmImageSize kDyadic{1024, 768};
 constexpr TZmImageSize kUneven{1111, 833};
+constexpr TZmImageSize kIcon{32, 24};
 constexpr TZmImageSize kUnevenLarge{3777, 2833};
 constexpr TZmImageSize kNarrowHigh{1000, 4000};
 constexpr TZmImageSize kWideLow{5000, 1000};
@@ -79,6 +80,8 @@ BENCHMARK_CAPTURE(Resample, BilinearShrink, kLarge, kSmall, rfBilinear)
 BENCHMARK_CAPTURE(Resample, BilinearShrink1024, kLarge, kDyadic, rfBilinear)
     ->Unit(benchmark::kMillisecond);
 BENCHMARK_CAPTURE(Resample, BilinearShrinkUneven, kLarge, kUneven, rfBilinear)
+    ->Unit(benchmark::kMillisecond);
+BENCHMARK_CAPTURE(Resample, BilinearShrinkIcon, kLarge, kIcon, rfBilinear)
     ->Unit(benchmark::kMillisecond);
 BENCHMARK_CAPTURE(Resample, BilinearEnlarge, kSmall, kLarge, rfBilinear)
     ->Unit(benchmark::kMillisecond);
