@@ -199,9 +199,11 @@ public:
     /// Colour of what a growing image leaves free; black at first.
     void SetBackground(TColor color) { fBackground = color; }
 
-    // Text, of any format, over pixels and alpha plane. The canvas font keeps what was asked for,
-    // all but its colour. Selections are ignored. Raises EZmException "Cannot create TZmCanvas.
-    // Ensure GDI+ is installed on system." where the platform's drawing library is missing.
+    // Text over pixels and alpha plane. The image moves to the place zmTBitmap, where its canvas
+    // is, with that place's formats: zm16g becomes zm8g, deeper ones raise EZmException and stay.
+    // The canvas font keeps what was asked for, all but its colour. Selections are ignored. Raises
+    // EZmException "Cannot create TZmCanvas. Ensure GDI+ is installed on system." where the
+    // platform's drawing library is missing.
     /// From the top left corner (or keywords) of the text's box on, turned about that corner by
     /// degrees counter-clockwise. `bAntiAlias`: glyphs have coverage; otherwise whole pixels, and
     /// the plane stays. `bAutoEnlarge`: an image that is smaller than the turned box grows to its

@@ -91,7 +91,6 @@ double FillValueOf(TZmBitmap& bitmap, TColor color) {
         case zm8p:
         case zm8g: return pixel.GetPixels_zm8(0, 0);
         case zm16g: return pixel.GetPixels_zm16g(0, 0);
-        case zm32f: return static_cast<double>(pixel.GetPixels_zm32f(0, 0));
         default: return color;
     }
 }
@@ -246,8 +245,10 @@ void TZalmoProc::DrawTextRequest(TZmTextRequest& request) {
         return;
     }
     {
-        // Only the font of the platform canvas is used, which lies beside the pixels: the canvas
-        // itself would move the whole image to a platform bitmap, and no deep format fits in one.
+        // Required: the font is that of the platform canvas, which lies on a platform bitmap: the
+        // image moves to one, and the formats that none has raise. Where there is no room for one
+        // the image stays, and takes the text all the same.
+        image->GetCanvas();
         const TFontColorKeeper keeper(image->GetCanvasFont());
         image->GetCanvasFont() = request.font;
         TZmEmptyCanvas measuring;
